@@ -1,0 +1,73 @@
+// The base of every proxy of the library. A proxy holds one global reference to a Java object of
+// the replica package (its handle) and forwards each operation to one method of that object.
+//
+// Every operation of a proxy returns a result code: VLX_S_OK (0) on success, a negative code on
+// failure, with the failure described by the calling thread's last error (VLXError::VLXGetLastError).
+// A failing operation leaves its out-parameters as they were.
+#pragma once
+
+#include <atomic>
+#include <jni.h>
+
+#include "CorvexaExport.h"
+#include "VLXJBXJavaObject.h"
+
+class ReplicaStubs;
+class VLXMutex;
+namespace corvexa {
+class FrameAccess;
+}
+
+class CORVEXA_API VLXKDMJavaObject : public VLXJBXJavaObject {
+ public:
+  // A new proxy is not built: its handle is null.
+  VLXKDMJavaObject();
+  // A copy refers to the same Java object through a global reference of its own, so it stays
+  // valid after the source is destroyed.
+  VLXKDMJavaObject(const VLXKDMJavaObject& other);
+  VLXKDMJavaObject& operator=(const VLXKDMJavaObject& other);
+  // Releases the proxy's global reference.
+  virtual ~VLXKDMJavaObject();
+
+  // The handle: the global reference to the Java object, or null when the proxy is not built.
+  // Starts nothing and reports nothing.
+  jobject GetHandle() const;
+  // Attaches the proxy to object through a new global reference of its own (null detaches it). The
+  // caller keeps and releases its own reference to object.
+  long SetHandle(JNIEnv* env, jobject object);
+
+  // The error translation: turns the outcome of an operation into its result code and the thread's
+  // last error. A pending Java exception is cleared and reported; a success status gives VLX_S_OK;
+  // any other failure re-raises the pending last error or raises one naming methodName.
+  static long HandleReplicaError(JNIEnv* env, long status, const char* methodName);
+
+ protected:
+  // Fills env with the calling thread's Java environment and, on the first call of the process,
+  // starts the Java side: creates and fills the binding table.
+  static long InitJava(JNIEnv*& env, const char* methodName);
+  // InitJava, then fails unless this proxy is built.
+  long InitJavaAndTestIsBuilt(JNIEnv*& env, const char* methodName);
+
+  // The binding table of the process: null until the Java side is first started.
+  static std::atomic<ReplicaStubs*> _st;
+
+ private:
+  friend class corvexa::FrameAccess;
+
+  static long StartJavaSide(JNIEnv* env);
+
+  static std::atomic<int> _javaInitDone;
+  static VLXMutex* _mutex;
+};
+
+// Returns 1. Marks the library; does nothing else.
+extern "C" CORVEXA_API int VELMORA_QKA2_INTERNAL_Corvexa();
+
+// The special members every proxy class has: those of the base. A proxy class adds no data and no
+// virtual function.
+#define VLXKDM_PROXY_SPECIAL_MEMBERS(Class) \
+ public:                                    \
+  Class();                                  \
+  Class(const Class& other);                \
+  Class& operator=(const Class& other);     \
+  virtual ~Class();

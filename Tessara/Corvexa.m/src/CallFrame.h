@@ -1,0 +1,340 @@
+// The call frame: the one sequence that every proxy operation runs around its Java call.
+//
+//   1. env: the calling thread's environment            (FrameAccess::Start)
+//   2. start the Java side once; test the proxy is built (skipped for static and constructor calls)
+//   3. a failed start goes to the error translation
+//   4. no binding table: VLX_E_FAIL at once; a table that could not be bound: VLX_E_FAIL with a last
+//      error naming the missing Java member, and no Java call
+//   5. convert the arguments (enumeration constants first, then the rest in parameter order); a
+//      failure goes to the error translation (or is returned raw), with no Java call
+//   6. call the Java method of the slot (instance, static, or constructor)
+//   7. release the arguments' local references
+//   8. no exception pending: land the result in the out-parameter (converter, SetHandle, or a
+//      primitive written as it came) and release it; an exception pending: leave it alone
+//   9. the error translation of the status
+//
+// An operation declares its slot, method name text, arguments and out-parameter:
+//
+//   return Call(*this, "VLXKDMReplica::GetName(VLXUnicodeString&)", Replica_getName).returning(name);
+//
+// How each native type crosses is said once, by the ArgOf and ResultOf tables below.
+#pragma once
+
+#include <cstddef>
+#include <tuple>
+#include <type_traits>
+#include <utility>
+
+#include <jni.h>
+
+#include "ReplicaStubs.h"
+#include "VLXBinary.h"
+#include "VLXJBXJNIConverter.h"
+#include "VLXJBXJNIHelper.h"
+#include "VLXKDMJavaObject.h"
+#include "VLXListValVLXUnicodeString.h"
+#include "VLXResult.h"
+#include "VLXUnicodeString.h"
+
+namespace corvexa {
+
+// Owns one local reference and deletes it on every path.
+class LocalRef {
+ public:
+  LocalRef(JNIEnv* env, jobject ref) : _env(env), _ref(ref) {}
+  ~LocalRef() { reset(); }
+  LocalRef(const LocalRef&) = delete;
+  LocalRef& operator=(const LocalRef&) = delete;
+  jobject get() const { return _ref; }
+  void reset() {
+    if (_ref) VLXJBXJNIHelper::DeleteLocalRef(_env, _ref);
+    _ref = nullptr;
+  }
+
+ private:
+  JNIEnv* _env;
+  jobject _ref;
+};
+
+// The frame's access to the proxy base's start-up and binding table.
+class FrameAccess {
+ public:
+  // Steps 1 to 3: the environment, the start of the Java side and, for a proxy, the built test.
+  static long Start(VLXKDMJavaObject* self, JNIEnv*& env, const char* name) {
+    return self ? self->InitJavaAndTestIsBuilt(env, name) : VLXKDMJavaObject::InitJava(env, name);
+  }
+  static ReplicaStubs* Table() { return VLXKDMJavaObject::_st.load(std::memory_order_acquire); }
+};
+
+// ---- How a native argument reaches Java ------------------------------------------------------
+// J: the JNI type passed; To: the conversion; kOwnsRef: To makes a local reference that the frame
+// releases; kEarly: converted before the other arguments (enumeration constants).
+
+template <class T, class = void>
+struct ArgOf;
+
+template <class Native, class Java>
+struct ConvertedArg {  // converted by the platform converter into a new local reference
+  using J = Java;
+  static constexpr bool kOwnsRef = true;
+  static constexpr bool kEarly = false;
+  static long To(JNIEnv* env, const Native& value, J& out) {
+    return VLXJBXJNIConverter::ConvertToJavaType(env, value, out);
+  }
+};
+
+template <class T>
+struct PassedArg {  // passed as it is
+  using J = T;
+  static constexpr bool kOwnsRef = false;
+  static constexpr bool kEarly = false;
+  static long To(JNIEnv*, T value, J& out) {
+    out = value;
+    return VLX_S_OK;
+  }
+};
+
+template <> struct ArgOf<VLXUnicodeString> : ConvertedArg<VLXUnicodeString, jstring> {};
+template <> struct ArgOf<VLXListValVLXUnicodeString> : ConvertedArg<VLXListValVLXUnicodeString, jobjectArray> {};
+template <> struct ArgOf<VLXBinary> : ConvertedArg<VLXBinary, jbyteArray> {};
+template <> struct ArgOf<int> : PassedArg<jint> {};
+template <> struct ArgOf<VLXBoolean> : PassedArg<jboolean> {};  // the byte as it is
+template <> struct ArgOf<jobject> : PassedArg<jobject> {};
+
+// A proxy argument goes as its handle, without a built test.
+template <class P>
+struct ArgOf<P, std::enable_if_t<std::is_base_of_v<VLXKDMJavaObject, P>>> {
+  using J = jobject;
+  static constexpr bool kOwnsRef = false;
+  static constexpr bool kEarly = false;
+  static long To(JNIEnv*, const P& proxy, J& out) {
+    out = proxy.GetHandle();
+    return VLX_S_OK;
+  }
+};
+
+// ---- How a Java result lands in a native out-parameter ---------------------------------------
+// Raw: the JNI result type, which picks the Call*Method; Land: stores it and gives the new status
+// (an object result's local reference is released here).
+
+template <class T, class = void>
+struct ResultOf;
+
+template <class Native>
+struct ConvertedResult {  // read by the platform converter
+  using Raw = jobject;
+  static long Land(JNIEnv* env, jobject result, Native& out, long) {
+    LocalRef owned(env, result);
+    return VLXJBXJNIConverter::BuildFromJavaType(env, result, out);
+  }
+};
+
+template <class Native, class Java>
+struct PrimitiveResult {  // written as it came; the status stays
+  using Raw = Java;
+  static long Land(JNIEnv*, Java result, Native& out, long status) {
+    out = result;
+    return status;
+  }
+};
+
+template <> struct ResultOf<VLXUnicodeString> : ConvertedResult<VLXUnicodeString> {};
+template <> struct ResultOf<VLXListValVLXUnicodeString> : ConvertedResult<VLXListValVLXUnicodeString> {};
+template <> struct ResultOf<VLXBinary> : ConvertedResult<VLXBinary> {};
+template <> struct ResultOf<int> : PrimitiveResult<int, jint> {};
+template <> struct ResultOf<VLXBoolean> : PrimitiveResult<VLXBoolean, jboolean> {};
+
+// A returned Java object is attached to the out-proxy, even when it is null.
+template <class P>
+struct ResultOf<P, std::enable_if_t<std::is_base_of_v<VLXKDMJavaObject, P>>> {
+  using Raw = jobject;
+  static long Land(JNIEnv* env, jobject result, P& out, long) {
+    LocalRef owned(env, result);
+    return out.SetHandle(env, result);
+  }
+};
+
+// A void method: nothing lands, the status stays.
+struct NoResult {};
+template <> struct ResultOf<NoResult> {
+  using Raw = void;
+};
+
+// ---- The frame -------------------------------------------------------------------------------
+
+enum class Target { Handle, Class, Constructor };
+
+template <class... A>
+class Bound;
+
+class Call {
+ public:
+  // An instance method of a built proxy.
+  Call(VLXKDMJavaObject& self, const char* name, Slot method)
+      : _self(&self), _name(name), _method(method), _class(SlotCount), _target(Target::Handle) {}
+
+  // A static method of the class in slot cls; no proxy is needed.
+  static Call Static(const char* name, Slot cls, Slot method) {
+    return Call(nullptr, name, method, cls, Target::Class);
+  }
+  // A new Java object of the class in slot cls, made by constructor ctor and attached to self; self
+  // need not be built.
+  static Call Construct(VLXKDMJavaObject& self, const char* name, Slot cls, Slot ctor) {
+    Call call(nullptr, name, ctor, cls, Target::Constructor);
+    call._created = &self;
+    return call;
+  }
+
+  // A failed argument conversion returns the converter's code as it is, untranslated.
+  Call& rawConversionCode() {
+    _rawConversionCode = true;
+    return *this;
+  }
+
+  template <class... A>
+  Bound<A...> with(const A&... args) const {
+    return Bound<A...>(*this, args...);
+  }
+  template <class Out>
+  long returning(Out& out) const {
+    return with().returning(out);
+  }
+  long run() const { return with().run(); }
+  long construct() const { return with().construct(); }
+
+ private:
+  template <class... A>
+  friend class Bound;
+
+  Call(VLXKDMJavaObject* self, const char* name, Slot method, Slot cls, Target target)
+      : _self(self), _name(name), _method(method), _class(cls), _target(target) {}
+
+  VLXKDMJavaObject* _self;
+  VLXKDMJavaObject* _created = nullptr;
+  const char* _name;
+  Slot _method;
+  Slot _class;
+  Target _target;
+  bool _rawConversionCode = false;
+};
+
+template <class... A>
+class Bound {
+ public:
+  Bound(const Call& call, const A&... args) : _call(call), _args(args...) {}
+
+  // The method returns a value that lands in out.
+  template <class Out>
+  long returning(Out& out) {
+    return Execute<ResultOf<Out>>(out);
+  }
+  // The method returns nothing.
+  long run() {
+    NoResult none;
+    return Execute<ResultOf<NoResult>>(none);
+  }
+  // The constructor's new object is attached to the proxy given to Call::Construct.
+  long construct() { return Execute<ResultOf<VLXKDMJavaObject>>(*_call._created); }
+
+ private:
+  using JArgs = std::tuple<typename ArgOf<A>::J...>;
+  static constexpr std::size_t kArity = sizeof...(A);
+
+  template <class Result, class Out>
+  long Execute(Out& out) {
+    const char* const name = _call._name;
+    JNIEnv* env = nullptr;                                                          // 1
+    long status = FrameAccess::Start(_call._self, env, name);                       // 2
+    if (status < 0) return VLXKDMJavaObject::HandleReplicaError(env, status, name);  // 3
+    ReplicaStubs* st = FrameAccess::Table();                                        // 4
+    if (!st) return VLX_E_FAIL;
+    if (!st->IsBound()) return st->ReportUnbound(name);
+
+    JArgs jargs{};                                                                  // 5
+    const long converted = ConvertAll(env, jargs, std::index_sequence_for<A...>{});
+    if (converted < 0) {
+      ReleaseAll(env, jargs, std::index_sequence_for<A...>{});
+      return _call._rawConversionCode ? converted
+                                      : VLXKDMJavaObject::HandleReplicaError(env, converted, name);
+    }
+    if (kArity > 0) status = converted;
+
+    using Raw = typename Result::Raw;                                               // 6
+    if constexpr (std::is_void_v<Raw>) {
+      Invoke<void>(env, *st, jargs);
+      ReleaseAll(env, jargs, std::index_sequence_for<A...>{});                      // 7
+    } else {
+      const Raw result = Invoke<Raw>(env, *st, jargs);
+      ReleaseAll(env, jargs, std::index_sequence_for<A...>{});                      // 7
+      if (!VLXJBXJNIHelper::ExceptionCheck(env))                                    // 8
+        status = Result::Land(env, result, out, status);
+    }
+    return VLXKDMJavaObject::HandleReplicaError(env, status, name);                 // 9
+  }
+
+  // Converts the arguments, enumeration constants first; stops at the first failure. Returns the
+  // last conversion's code.
+  template <std::size_t... I>
+  long ConvertAll(JNIEnv* env, JArgs& jargs, std::index_sequence<I...>) {
+    long status = VLX_S_OK;
+    auto one = [&](auto& jarg, const auto& arg) {
+      using T = std::decay_t<decltype(arg)>;
+      status = ArgOf<T>::To(env, arg, jarg);
+      return status >= 0;
+    };
+    const bool early = (... && (!ArgOf<A>::kEarly || one(std::get<I>(jargs), std::get<I>(_args))));
+    if (early) (void)(... && (ArgOf<A>::kEarly || one(std::get<I>(jargs), std::get<I>(_args))));
+    return status;
+  }
+
+  template <std::size_t... I>
+  static void ReleaseAll(JNIEnv* env, JArgs& jargs, std::index_sequence<I...>) {
+    auto one = [env](auto& jarg, bool owns) {
+      if constexpr (std::is_pointer_v<std::decay_t<decltype(jarg)>>) {
+        if (owns && jarg) VLXJBXJNIHelper::DeleteLocalRef(env, jarg);
+        jarg = nullptr;
+      }
+    };
+    (one(std::get<I>(jargs), ArgOf<A>::kOwnsRef), ...);
+  }
+
+  // Step 6: the Call*Method that fits the target and the Java return type.
+  template <class Raw>
+  Raw Invoke(JNIEnv* env, const ReplicaStubs& st, JArgs& jargs) {
+    const jmethodID method = st.Method(_call._method);
+    return std::apply(
+        [&](auto... j) -> Raw {
+          switch (_call._target) {
+            case Target::Constructor:
+              if constexpr (std::is_same_v<Raw, jobject>)
+                return VLXJBXJNIHelper::NewObject(env, st.Class(_call._class), method, j...);
+              break;
+            case Target::Class:
+              if constexpr (std::is_void_v<Raw>)
+                return VLXJBXJNIHelper::CallStaticVoidMethod(env, st.Class(_call._class), method, j...);
+              else if constexpr (std::is_same_v<Raw, jobject>)
+                return VLXJBXJNIHelper::CallStaticObjectMethod(env, st.Class(_call._class), method, j...);
+              break;
+            case Target::Handle: {
+              const jobject self = _call._self->GetHandle();
+              if constexpr (std::is_void_v<Raw>)
+                return VLXJBXJNIHelper::CallVoidMethod(env, self, method, j...);
+              else if constexpr (std::is_same_v<Raw, jobject>)
+                return VLXJBXJNIHelper::CallObjectMethod(env, self, method, j...);
+              else if constexpr (std::is_same_v<Raw, jboolean>)
+                return VLXJBXJNIHelper::CallBooleanMethod(env, self, method, j...);
+              else if constexpr (std::is_same_v<Raw, jint>)
+                return VLXJBXJNIHelper::CallIntMethod(env, self, method, j...);
+              break;
+            }
+          }
+          return Raw();
+        },
+        jargs);
+  }
+
+  const Call& _call;
+  std::tuple<const A&...> _args;
+};
+
+}  // namespace corvexa

@@ -1,0 +1,67 @@
+// The binding table: every Java class reference, method identifier and enumeration constant that
+// the library uses, resolved once per process by init() and only read afterwards, by any thread,
+// without a lock. The rows are declared once, in BindingTable.def.
+#pragma once
+
+#include <atomic>
+#include <jni.h>
+
+#include "CorvexaExport.h"
+
+namespace corvexa {
+
+// Named slot numbers, in table order.
+enum Slot : int {
+#define CLASS(name, path) name,
+#define METHOD(name, member, signature) name,
+#define STATIC(name, member, signature) name,
+#define SETTER_FIRST(name, member, signature) name,
+#define CONSTANT(name, field) name,
+#define RESERVED(name) name,
+#include "BindingTable.def"
+#undef CLASS
+#undef METHOD
+#undef STATIC
+#undef SETTER_FIRST
+#undef CONSTANT
+#undef RESERVED
+  SlotCount
+};
+static_assert(SlotCount == 188, "the binding table has 188 slots");
+
+}  // namespace corvexa
+
+class CORVEXA_API ReplicaStubs {
+ public:
+  // Sets no slot: init() fills them.
+  ReplicaStubs();
+  ReplicaStubs(const ReplicaStubs&) = delete;
+  ReplicaStubs& operator=(const ReplicaStubs&) = delete;
+
+  // Resolves every row of the table, in slot order, through _env. The first failed lookup ends it
+  // with the translated failure; what was resolved before stays, the rest stays unset.
+  long init(JNIEnv* env);
+
+  jclass Class(corvexa::Slot slot) const { return static_cast<jclass>(_slot[slot]); }
+  jmethodID Method(corvexa::Slot slot) const { return static_cast<jmethodID>(_slot[slot]); }
+  jobject Constant(corvexa::Slot slot) const { return static_cast<jobject>(_slot[slot]); }
+
+  // True once init() has resolved every row. Operations never call Java through a table that is
+  // not bound.
+  bool IsBound() const { return _state.load(std::memory_order_acquire) == kBound; }
+  // True once init() has returned, whether it bound everything or stopped at a missing member.
+  bool IsSettled() const { return _state.load(std::memory_order_acquire) != kFilling; }
+  // Fails the operation methodName because the Java side could not be bound: records a last error
+  // naming the first missing class or member and returns VLX_E_FAIL.
+  long ReportUnbound(const char* methodName) const;
+
+  // The environment passed to init(), used by the calls init makes and by nothing else.
+  static JNIEnv* _env;
+
+ private:
+  enum State : int { kFilling, kBound, kFailed };
+
+  void* _slot[corvexa::SlotCount];
+  std::atomic<int> _state;
+  char _missing[512];  // what the first failed lookup was looking for
+};

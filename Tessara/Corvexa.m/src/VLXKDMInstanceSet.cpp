@@ -1,0 +1,8 @@
+#include "VLXKDMInstanceSet.h"
+
+#include "CallFrame.h"
+#include "ProxyMembers.h"
+
+using namespace corvexa;
+
+VLXKDM_PROXY_DEFINITIONS(VLXKDMInstanceSet)

@@ -1,0 +1,205 @@
+// The call frame as a caller sees it: results, out-parameters, last errors and Java exceptions.
+#include <dlfcn.h>
+
+#include <functional>
+#include <string>
+#include <vector>
+
+#include <gtest/gtest.h>
+
+#include "JavaTestSupport.h"
+#include "VLXKDMReplica.h"
+
+using namespace corvexa_test;
+
+namespace {
+
+const char* const kThrowingReplica = "com/velmora/tessara/testdoubles/ThrowingReplica";
+const char* const kNullReplica = "com/velmora/tessara/testdoubles/NullReplica";
+
+class FrameTest : public ::testing::Test {
+ protected:
+  void SetUp() override
+  {
+    ASSERT_NE(nullptr, Env());
+    ClearLastError();
+  }
+};
+
+struct NamedOperation {
+  const char* name;
+  std::function<long(VLXKDMReplica&)> run;
+};
+
+TEST_F(FrameTest, EveryOperationOfAnUnbuiltReplicaFailsNamingItself)
+{
+  VLXUnicodeString text("untouched");
+  VLXKDMModelSet models;
+  VLXKDMClassDef classDef;
+  VLXKDMAttributeDef attributeDef;
+  const std::vector<NamedOperation> operations = {
+      {"VLXKDMReplica::GetName(VLXUnicodeString&)", [&](VLXKDMReplica& r) { return r.GetName(text); }},
+      {"VLXKDMReplica::SetName(const VLXUnicodeString&)", [&](VLXKDMReplica& r) { return r.SetName(text); }},
+      {"VLXKDMReplica::ToString(VLXUnicodeString&)", [&](VLXKDMReplica& r) { return r.ToString(text); }},
+      {"VLXKDMReplica::Commit()", [&](VLXKDMReplica& r) { return r.Commit(); }},
+      {"VLXKDMReplica::GetModels(VLXKDMModelSet&)", [&](VLXKDMReplica& r) { return r.GetModels(models); }},
+      {"VLXKDMReplica::GetClassDef(const VLXUnicodeString&, VLXKDMClassDef&)",
+       [&](VLXKDMReplica& r) { return r.GetClassDef(text, classDef); }},
+      {"VLXKDMReplica::GetAttributeDef(const VLXUnicodeString&, VLXKDMAttributeDef&)",
+       [&](VLXKDMReplica& r) { return r.GetAttributeDef(text, attributeDef); }},
+  };
+  for (const NamedOperation& operation : operations) {
+    SCOPED_TRACE(operation.name);
+    ClearLastError();
+    VLXKDMReplica unbuilt;
+    EXPECT_EQ(VLX_E_FAIL, operation.run(unbuilt));
+    const LastError error = PeekLastError();
+    EXPECT_EQ("VLXJBXInfraERR_1003", error.id);
+    ASSERT_EQ(1u, error.parameters.size());
+    EXPECT_EQ(operation.name, error.parameters[0]);
+    EXPECT_NE(std::string::npos, error.text.find(operation.name)) << error.text;
+  }
+  EXPECT_EQ("untouched", Text(text));
+  EXPECT_EQ(nullptr, models.GetHandle());
+  EXPECT_EQ(nullptr, classDef.GetHandle());
+}
+
+TEST_F(FrameTest, APendingLastErrorIsReRaisedInsteadOfANewOne)
+{
+  VLXError* earlier = new VLXError("TESTERR_0001", "CorvexaTestMessages");
+  ASSERT_EQ(VLX_E_FAIL, VLXError::GetReturn(2, earlier, nullptr, __FILE__, __LINE__));
+
+  VLXKDMReplica unbuilt;
+  EXPECT_EQ(VLX_E_FAIL, unbuilt.Commit());
+  EXPECT_EQ("TESTERR_0001", PeekLastError().id);
+}
+
+TEST_F(FrameTest, GetHandleOfAnUnbuiltProxyIsNullAndReportsNothing)
+{
+  VLXKDMReplica unbuilt;
+  EXPECT_EQ(nullptr, unbuilt.GetHandle());
+  EXPECT_FALSE(PeekLastError().present);
+}
+
+TEST_F(FrameTest, AJavaExceptionIsReportedClearedAndLeavesOutParametersAlone)
+{
+  VLXKDMReplica throwing;
+  AttachNew(throwing, kThrowingReplica);
+
+  VLXUnicodeString name("kept");
+  EXPECT_EQ(VLX_E_FAIL, throwing.GetName(name));
+  EXPECT_EQ("kept", Text(name));
+  EXPECT_FALSE(Env()->ExceptionCheck());
+  const LastError error = PeekLastError();
+  ASSERT_TRUE(error.present);
+  EXPECT_NE(std::string::npos, error.text.find("VLXKDMReplica::GetName(VLXUnicodeString&)")) << error.text;
+  EXPECT_NE(std::string::npos, error.text.find("java.lang.IllegalStateException")) << error.text;
+  EXPECT_NE(std::string::npos, error.text.find("name unavailable")) << error.text;
+  EXPECT_NE(std::string::npos, error.text.find("storage offline")) << error.text;
+
+  // An out-proxy keeps the object it referred to.
+  VLXKDMReplica other;
+  ASSERT_EQ(VLX_S_OK, other.Build(VLXUnicodeString("other")));
+  VLXKDMClassDef classDef;
+  ASSERT_EQ(VLX_S_OK, classDef.SetHandle(Env(), other.GetHandle()));
+  EXPECT_EQ(VLX_E_FAIL, throwing.GetClassDef(VLXUnicodeString("Part"), classDef));
+  EXPECT_TRUE(Env()->IsSameObject(other.GetHandle(), classDef.GetHandle()));
+  EXPECT_NE(std::string::npos, PeekLastError().text.find("no class lookups here: Part"));
+
+  EXPECT_EQ(VLX_E_FAIL, throwing.Commit());
+  EXPECT_EQ(3, IntField(throwing.GetHandle(), "calls"));
+
+  // The next call on the same thread works.
+  VLXUnicodeString otherName;
+  EXPECT_EQ(VLX_S_OK, other.GetName(otherName));
+  EXPECT_EQ("other", Text(otherName));
+}
+
+TEST_F(FrameTest, NullJavaResultsGiveEmptyValuesAndUnbuiltProxies)
+{
+  VLXKDMReplica nulls;
+  AttachNew(nulls, kNullReplica);
+  VLXUnicodeString name("before");
+  EXPECT_EQ(VLX_S_OK, nulls.GetName(name));
+  EXPECT_EQ("", Text(name));
+
+  VLXKDMReplica real;
+  ASSERT_EQ(VLX_S_OK, real.Build());
+  VLXKDMModelSet models;
+  ASSERT_EQ(VLX_S_OK, real.GetModels(models));
+  ASSERT_NE(nullptr, models.GetHandle());
+  EXPECT_EQ(VLX_S_OK, nulls.GetModels(models));
+  EXPECT_EQ(nullptr, models.GetHandle());
+}
+
+TEST_F(FrameTest, BuildNamesReadsBackAndRebuildsOnANewReplica)
+{
+  VLXKDMReplica replica;
+  ASSERT_EQ(VLX_S_OK, replica.Build(VLXUnicodeString("first")));
+  VLXKDMReplica keep(replica);
+  ASSERT_EQ(VLX_S_OK, replica.Build(VLXUnicodeString("second")));
+  EXPECT_FALSE(keep == replica);
+
+  VLXUnicodeString name;
+  ASSERT_EQ(VLX_S_OK, replica.GetName(name));
+  EXPECT_EQ("second", Text(name));
+  ASSERT_EQ(VLX_S_OK, keep.GetName(name));
+  EXPECT_EQ("first", Text(name));
+
+  ASSERT_EQ(VLX_S_OK, replica.SetName(VLXUnicodeString("renamed")));
+  ASSERT_EQ(VLX_S_OK, replica.GetName(name));
+  EXPECT_EQ("renamed", Text(name));
+
+  VLXUnicodeString text;
+  ASSERT_EQ(VLX_S_OK, replica.ToString(text));
+  EXPECT_NE(std::string::npos, Text(text).find("renamed")) << Text(text);
+  EXPECT_EQ(VLX_S_OK, replica.Commit());
+}
+
+TEST_F(FrameTest, CopiesStayValidAfterTheSourceIsDestroyed)
+{
+  const long baseline = VLXJBXJNIUtilities::GetGlobalRefCount();
+  {
+    VLXKDMReplica* source = new VLXKDMReplica;
+    ASSERT_EQ(VLX_S_OK, source->Build(VLXUnicodeString("shared")));
+    VLXKDMReplica copy(*source);
+    VLXKDMReplica assigned;
+    assigned = *source;
+    EXPECT_TRUE(copy == *source);
+    EXPECT_EQ(baseline + 3, VLXJBXJNIUtilities::GetGlobalRefCount());
+    delete source;
+
+    VLXUnicodeString name;
+    ASSERT_EQ(VLX_S_OK, copy.GetName(name));
+    EXPECT_EQ("shared", Text(name));
+    ASSERT_EQ(VLX_S_OK, assigned.GetName(name));
+    EXPECT_EQ("shared", Text(name));
+    assigned = assigned;
+    EXPECT_TRUE(assigned == copy);
+  }
+  EXPECT_EQ(baseline, VLXJBXJNIUtilities::GetGlobalRefCount());
+}
+
+TEST_F(FrameTest, LookupsOfAbsentNamesDetachTheOutProxy)
+{
+  VLXKDMReplica replica;
+  ASSERT_EQ(VLX_S_OK, replica.Build(VLXUnicodeString("lookups")));
+  VLXKDMClassDef classDef;
+  ASSERT_EQ(VLX_S_OK, classDef.SetHandle(Env(), replica.GetHandle()));
+  EXPECT_EQ(VLX_S_OK, replica.GetClassDef(VLXUnicodeString("NoSuchClass"), classDef));
+  EXPECT_EQ(nullptr, classDef.GetHandle());
+  VLXKDMAttributeDef attributeDef;
+  EXPECT_EQ(VLX_S_OK, replica.GetAttributeDef(VLXUnicodeString("NoSuchClass.none"), attributeDef));
+  EXPECT_EQ(nullptr, attributeDef.GetHandle());
+}
+
+TEST(Marker, ReturnsOneUnderItsPlainName)
+{
+  EXPECT_EQ(1, VELMORA_QKA2_INTERNAL_Corvexa());
+  using Marker = int (*)();
+  const Marker found = reinterpret_cast<Marker>(dlsym(RTLD_DEFAULT, "VELMORA_QKA2_INTERNAL_Corvexa"));
+  ASSERT_NE(nullptr, found);
+  EXPECT_EQ(1, found());
+}
+
+}  // namespace

@@ -1,0 +1,16 @@
+# Installs the build into a prefix, moves the installed tree elsewhere, and builds and runs a
+# consumer against the moved tree with find_package(Corvexa).
+set(work ${WORK_DIR})
+file(REMOVE_RECURSE ${work})
+function(run)
+  execute_process(COMMAND ${ARGN} RESULT_VARIABLE rc OUTPUT_VARIABLE out ERROR_VARIABLE err)
+  if(NOT rc EQUAL 0)
+    message(FATAL_ERROR "failed (${rc}): ${ARGN}\n${out}\n${err}")
+  endif()
+  message(STATUS "${out}")
+endfunction()
+run(${CMAKE_COMMAND} --install ${BUILD_DIR} --prefix ${work}/first)
+file(RENAME ${work}/first ${work}/moved)
+run(${CMAKE_COMMAND} -S ${SOURCE_DIR} -B ${work}/build -DCMAKE_PREFIX_PATH=${work}/moved)
+run(${CMAKE_COMMAND} --build ${work}/build)
+run(${work}/build/consumer)
