@@ -1,0 +1,6 @@
+package com.velmora.tessara.kdmreplica;
+
+/** The kind of a class definition. */
+public enum ClassType {
+    Class, Extension
+}

@@ -1,0 +1,127 @@
+package com.velmora.tessara.kdmreplica;
+
+import java.util.ArrayList;
+import java.util.HashMap;
+import java.util.concurrent.locks.Lock;
+
+/**
+ * The data of one class in a replica: its instances ({@link #getInstances()}, a live set), plus the
+ * deleted instances that wait for {@code Replica.commit}. A model is made for a class definition and
+ * joins a replica through {@code ModelSet.add}; instances can only be created once it is there.
+ */
+public class Model {
+    private static final AttributeDef[] NO_ATTRIBUTES = new AttributeDef[0];
+
+    final ClassDef classDef;
+    final InstanceSet instances;
+    /** The replica whose model set holds this model, or null. */
+    volatile Replica replica;
+    /** The layout that the value arrays of this model's instances follow. */
+    AttributeDef[] alignedTo = NO_ATTRIBUTES;
+    /** Removed instances that were committed before (or loaded), waiting for the next commit. */
+    ArrayList<Instance> deleted;
+    /** Identifier key to live instance; made on first use. */
+    HashMap<Object, Instance> ids;
+
+    /**
+     * A model for the class {@code classDef}, in no replica yet.
+     *
+     * @throws IllegalArgumentException for null
+     */
+    public Model(ClassDef classDef) {
+        if (classDef == null) {
+            throw new IllegalArgumentException("Model: class definition is null");
+        }
+        this.classDef = classDef;
+        this.instances = new InstanceSet(this);
+    }
+
+    /** A model for a new class with a generated name. */
+    public Model() {
+        this(new ClassDef());
+    }
+
+    /** The model of a set made with {@code new InstanceSet()}. */
+    Model(InstanceSet set) {
+        this.classDef = new ClassDef();
+        this.instances = set;
+    }
+
+    /** The replica that holds this model, or null. */
+    public Replica getReplica() {
+        return replica;
+    }
+
+    /**
+     * A new instance of the class, marked created, appended to {@link #getInstances()}.
+     *
+     * @throws IllegalStateException when the model is in no replica
+     */
+    public Instance createInstance() {
+        Lock l = Locks.write(this);
+        try {
+            if (replica == null) {
+                throw new IllegalStateException("model of class '" + classDef.name
+                        + "' is in no replica: add it to a replica's model set before creating instances");
+            }
+            Instance x = new Instance(this, alignedTo.length);
+            x.state = Instance.CREATED;
+            instances.append(x);
+            return x;
+        } finally {
+            l.unlock();
+        }
+    }
+
+    /** The instances of the model: the live set (not a copy). */
+    public InstanceSet getInstances() {
+        return instances;
+    }
+
+    public ClassDef getClassDef() {
+        return classDef;
+    }
+
+    /** Moves a live instance of this model from its identifier to a new one (caller holds the write lock). */
+    void changeId(Instance x, Object newId) {
+        Object newKey = Instance.keyOf(newId);
+        if (newKey != null) {
+            Instance other = ids == null ? null : ids.get(newKey);
+            if (other != null && other != x) {
+                StringBuilder b = new StringBuilder("model of class '").append(classDef.name)
+                        .append("' already has a live instance with identifier ");
+                Values.format(b, newId);
+                throw new IllegalArgumentException(b.toString());
+            }
+        }
+        if (ids == null) {
+            ids = new HashMap<>();
+        }
+        Object oldKey = Instance.keyOf(x.id);
+        if (oldKey != null) {
+            ids.remove(oldKey);
+        }
+        if (newKey != null) {
+            ids.put(newKey, x);
+        }
+    }
+
+    /** For example {@code Model 'Part' (12 instances, 2 deleted) in replica 'plant'}. */
+    @Override
+    public String toString() {
+        Lock l = Locks.read(this);
+        try {
+            StringBuilder b = new StringBuilder("Model '").append(classDef.name).append("' (")
+                    .append(instances.count).append(" instances");
+            if (deleted != null && !deleted.isEmpty()) {
+                b.append(", ").append(deleted.size()).append(" deleted");
+            }
+            b.append(')');
+            Replica r = replica;
+            b.append(r == null ? " in no replica" : " in replica '" + r.name + "'");
+            return b.toString();
+        } finally {
+            l.unlock();
+        }
+    }
+}

@@ -1,0 +1,439 @@
+package com.velmora.tessara.kdmreplica;
+
+import java.util.ArrayDeque;
+import java.util.ArrayList;
+import java.util.Collections;
+import java.util.HashMap;
+import java.util.IdentityHashMap;
+import java.util.LinkedHashMap;
+import java.util.List;
+import java.util.Map;
+import java.util.Set;
+import java.util.concurrent.locks.Lock;
+import java.util.concurrent.locks.ReentrantReadWriteLock;
+
+/**
+ * A replica: a schema (the class definitions of its models, one model per class) and the data of
+ * that schema. All objects of a replica are guarded by the replica's one read-write lock: readers
+ * run in parallel, writers exclusively; any thread may call any member.
+ *
+ * <p>{@link #commit()} checks the whole replica and either refuses with one
+ * {@link ReplicaCommitException} listing the violations, changing nothing, or forgets the deleted
+ * instances and clears the created and modified flags.
+ *
+ * <p>Process-wide settings: {@link #setFeature} and {@link #setSchemaLocation}.
+ */
+public class Replica {
+    /** Most violations listed by one refused commit; the count of the others is given. */
+    public static final int MAX_LISTED_VIOLATIONS = 100;
+
+    private static final Map<String, Boolean> FEATURE_DEFAULTS;
+    private static final Map<String, Boolean> FEATURES = Collections.synchronizedMap(new LinkedHashMap<>());
+    private static volatile String processSchemaLocation = "";
+
+    static {
+        LinkedHashMap<String, Boolean> d = new LinkedHashMap<>();
+        d.put("validate", Boolean.FALSE);
+        d.put("indent", Boolean.TRUE);
+        FEATURE_DEFAULTS = Collections.unmodifiableMap(d);
+        FEATURES.putAll(d);
+    }
+
+    final ReentrantReadWriteLock rw = new ReentrantReadWriteLock();
+    volatile String name;
+    final ModelSet models;
+    volatile String schemaLocation;
+
+    /**
+     * An empty replica named {@code name} (any text but null). Its schema location is the
+     * process-wide one in force now.
+     */
+    public Replica(String name) {
+        if (name == null) {
+            throw new IllegalArgumentException("Replica: name is null");
+        }
+        this.name = name;
+        this.models = new ModelSet(this);
+        this.schemaLocation = processSchemaLocation;
+    }
+
+    /** An empty replica with a generated name ("Replica" followed by a number). */
+    public Replica() {
+        this(Names.generate("Replica"));
+    }
+
+    /** The replica of a model set made with {@code new ModelSet()}. */
+    Replica(ModelSet set) {
+        this.name = Names.generate("Replica");
+        this.models = set;
+        this.schemaLocation = processSchemaLocation;
+    }
+
+    // ---------------------------------------------------------------- process-wide settings
+
+    /**
+     * Sets a process-wide feature. Known features: "validate" (validate XML input against the
+     * replica's schema; default off) and "indent" (indent XML output; default on).
+     *
+     * @throws IllegalArgumentException for an unknown name, listing the known ones
+     */
+    public static void setFeature(String feature, boolean value) {
+        if (feature == null || !FEATURE_DEFAULTS.containsKey(feature)) {
+            throw new IllegalArgumentException("Replica.setFeature: unknown feature "
+                    + (feature == null ? "null" : "'" + feature + "'") + "; known features: "
+                    + String.join(", ", FEATURE_DEFAULTS.keySet()));
+        }
+        FEATURES.put(feature, value);
+    }
+
+    /** The current value of a process-wide feature. @throws IllegalArgumentException for an unknown name */
+    public static boolean getFeature(String feature) {
+        Boolean v = feature == null ? null : FEATURES.get(feature);
+        if (v == null) {
+            throw new IllegalArgumentException("Replica.getFeature: unknown feature "
+                    + (feature == null ? "null" : "'" + feature + "'") + "; known features: "
+                    + String.join(", ", FEATURE_DEFAULTS.keySet()));
+        }
+        return v;
+    }
+
+    /** Sets the process-wide schema location written into XML output (null: none, stored as ""). */
+    public static void setSchemaLocation(String location) {
+        processSchemaLocation = Names.orEmpty(location);
+    }
+
+    /** The location this replica was read with, or the process-wide one in force when it was created. */
+    public String getSchemaLocation() {
+        return schemaLocation;
+    }
+
+    // ---------------------------------------------------------------- name, schema, lookups
+
+    public String getName() {
+        return name;
+    }
+
+    /** @throws IllegalArgumentException for null */
+    public void setName(String name) {
+        if (name == null) {
+            throw new IllegalArgumentException("replica '" + this.name + "': name is null");
+        }
+        Lock l = rw.writeLock();
+        l.lock();
+        try {
+            this.name = name;
+        } finally {
+            l.unlock();
+        }
+    }
+
+    /** The replica's own model set (live). */
+    public ModelSet getModels() {
+        return models;
+    }
+
+    /** The class of that name, or null. */
+    public ClassDef getClassDef(String className) {
+        if (className == null) {
+            throw new IllegalArgumentException("replica '" + name + "': class name is null");
+        }
+        Lock l = rw.readLock();
+        l.lock();
+        try {
+            Model m = models.byName.get(className);
+            return m == null ? null : m.classDef;
+        } finally {
+            l.unlock();
+        }
+    }
+
+    /**
+     * An attribute definition by "Class.attribute" (inherited attributes included) or by a bare
+     * name that exactly one class of the replica holds as its own; null when none matches.
+     *
+     * @throws IllegalArgumentException for null, or a bare name that several classes hold (naming them)
+     */
+    public AttributeDef getAttributeDef(String attributeName) {
+        if (attributeName == null) {
+            throw new IllegalArgumentException("replica '" + name + "': attribute name is null");
+        }
+        Lock l = rw.readLock();
+        l.lock();
+        try {
+            int dot = attributeName.indexOf('.');
+            if (dot >= 0) {
+                Model m = models.byName.get(attributeName.substring(0, dot));
+                if (m == null) {
+                    return null;
+                }
+                int p = m.classDef.positionOf(attributeName.substring(dot + 1));
+                return p < 0 ? null : m.classDef.layout[p];
+            }
+            AttributeDef found = null;
+            List<String> holders = new ArrayList<>();
+            for (Model m : models.items) {
+                for (AttributeDef a : m.classDef.attributes.items) {
+                    if (a.name.equals(attributeName)) {
+                        found = a;
+                        holders.add("'" + m.classDef.name + "'");
+                    }
+                }
+            }
+            if (holders.size() > 1) {
+                throw new IllegalArgumentException("replica '" + name + "': attribute name '" + attributeName
+                        + "' is ambiguous: classes " + String.join(", ", holders)
+                        + " hold it; write 'Class." + attributeName + "'");
+            }
+            return found;
+        } finally {
+            l.unlock();
+        }
+    }
+
+    /** Recomputes and installs every layout (caller holds the write lock). @throws IllegalArgumentException */
+    void schemaChanged() {
+        Schema.apply(this, Schema.compute(this));
+    }
+
+    /** Instances (live or deleted) that hold a value of {@code a} (caller holds a lock). */
+    int countValuesOf(AttributeDef a) {
+        int n = 0;
+        for (Model m : models.items) {
+            AttributeDef[] layout = m.alignedTo;
+            for (int p = 0; p < layout.length; p++) {
+                if (layout[p] == a) {
+                    for (int k = 0; k < m.instances.count; k++) {
+                        n += m.instances.items[k].values[p] != null ? 1 : 0;
+                    }
+                    if (m.deleted != null) {
+                        for (Instance x : m.deleted) {
+                            n += x.values[p] != null ? 1 : 0;
+                        }
+                    }
+                }
+            }
+        }
+        return n;
+    }
+
+    boolean isLive(Instance x) {
+        return x.model != null && x.model.replica == this && x.pos >= 0 && (x.state & Instance.DELETED) == 0;
+    }
+
+    /**
+     * Removes live instances and, transitively, the live instances they hold through Composition
+     * relationships (caller holds the write lock). Created instances disappear; the others wait in
+     * their model's deleted list for the next commit.
+     */
+    void removeInstances(List<Instance> roots) {
+        Set<Instance> gone = Collections.newSetFromMap(new IdentityHashMap<>());
+        ArrayDeque<Instance> queue = new ArrayDeque<>();
+        for (Instance x : roots) {
+            if (isLive(x) && gone.add(x)) {
+                queue.add(x);
+            }
+        }
+        while (!queue.isEmpty()) {
+            Instance x = queue.poll();
+            AttributeDef[] layout = x.model.alignedTo;
+            for (int p = 0; p < layout.length; p++) {
+                AttributeDef def = layout[p];
+                if (def.type == AttributeType.Relationship && def.aggregation == AggregationType.Composition
+                        && x.values[p] != null) {
+                    for (Instance t : Values.targets(x.values[p])) {
+                        if (isLive(t) && gone.add(t)) {
+                            queue.add(t);
+                        }
+                    }
+                }
+            }
+        }
+        Map<Model, Set<Instance>> byModel = new IdentityHashMap<>();
+        for (Instance x : gone) {
+            byModel.computeIfAbsent(x.model, k -> Collections.newSetFromMap(new IdentityHashMap<>())).add(x);
+        }
+        for (Map.Entry<Model, Set<Instance>> e : byModel.entrySet()) {
+            Model m = e.getKey();
+            m.instances.compact(e.getValue());
+            for (Instance x : e.getValue()) {
+                Object key = Instance.keyOf(x.id);
+                if (key != null && m.ids != null && m.ids.get(key) == x) {
+                    m.ids.remove(key);
+                }
+                boolean created = (x.state & Instance.CREATED) != 0;
+                x.state = Instance.DELETED;
+                if (!created) {
+                    if (m.deleted == null) {
+                        m.deleted = new ArrayList<>();
+                    }
+                    m.deleted.add(x);
+                }
+            }
+        }
+    }
+
+    // ---------------------------------------------------------------- commit
+
+    /**
+     * Checks the whole replica: mandatory attributes valuated, unique attributes unique within
+     * their class (and its subclasses), no reference to a deleted instance or to one outside the
+     * replica, no live instance of an abstract class. On success forgets the deleted instances and
+     * clears every created and modified flag.
+     *
+     * @throws ReplicaCommitException listing every violation (up to {@link #MAX_LISTED_VIOLATIONS});
+     *         nothing is changed then
+     */
+    public void commit() {
+        Lock l = rw.writeLock();
+        l.lock();
+        try {
+            List<String> listed = new ArrayList<>();
+            int[] total = {0};
+            IdentityHashMap<AttributeDef, HashMap<Object, Instance>> uniques = new IdentityHashMap<>();
+            for (Model m : models.items) {
+                ClassDef c = m.classDef;
+                InstanceSet s = m.instances;
+                if (c.abstractClass && s.count > 0) {
+                    violation(listed, total, "class '" + c.name + "' is abstract but has " + s.count
+                            + " live instance(s)");
+                }
+                AttributeDef[] layout = m.alignedTo;
+                for (int k = 0; k < s.count; k++) {
+                    Instance x = s.items[k];
+                    for (int p = 0; p < layout.length; p++) {
+                        AttributeDef def = layout[p];
+                        Object v = x.values[p];
+                        if (v == null) {
+                            if (def.mandatory) {
+                                violation(listed, total, x.describe() + ": mandatory attribute '"
+                                        + def.qualifiedName() + "' has no value");
+                            }
+                            continue;
+                        }
+                        if (def.type == AttributeType.Relationship) {
+                            for (Instance t : Values.targets(v)) {
+                                if ((t.state & Instance.DELETED) != 0) {
+                                    violation(listed, total, x.describe() + ": attribute '" + def.qualifiedName()
+                                            + "' refers to " + t.describe() + ", which is deleted");
+                                } else if (t.model == null || t.model.replica != this) {
+                                    violation(listed, total, x.describe() + ": attribute '" + def.qualifiedName()
+                                            + "' refers to " + t.describe() + ", which is not in the replica");
+                                }
+                            }
+                        }
+                        if (def.unique) {
+                            Instance other = uniques.computeIfAbsent(def, d -> new HashMap<>()).putIfAbsent(
+                                    Values.key(v), x);
+                            if (other != null) {
+                                StringBuilder b = new StringBuilder("attribute '").append(def.qualifiedName())
+                                        .append("' is unique but ").append(other.describe()).append(" and ")
+                                        .append(x.describe()).append(" both hold ");
+                                Values.format(b, v);
+                                violation(listed, total, b.toString());
+                            }
+                        }
+                    }
+                }
+            }
+            if (total[0] > 0) {
+                throw new ReplicaCommitException(name, listed, total[0]);
+            }
+            for (Model m : models.items) {
+                InstanceSet s = m.instances;
+                for (int k = 0; k < s.count; k++) {
+                    s.items[k].state = 0;
+                }
+                m.deleted = null;
+            }
+        } finally {
+            l.unlock();
+        }
+    }
+
+    private static void violation(List<String> listed, int[] total, String text) {
+        if (listed.size() < MAX_LISTED_VIOLATIONS) {
+            listed.add(text);
+        }
+        total[0]++;
+    }
+
+    // ---------------------------------------------------------------- documents (not written yet)
+
+    private static UnsupportedOperationException notYet(String member) {
+        return new UnsupportedOperationException("Replica." + member + " is not implemented yet");
+    }
+
+    /** Not implemented yet: throws UnsupportedOperationException. */
+    public void insertSchemaString(String xsd) {
+        throw notYet("insertSchemaString");
+    }
+
+    /** Not implemented yet: throws UnsupportedOperationException. */
+    public void insertSchemaFile(String path) {
+        throw notYet("insertSchemaFile");
+    }
+
+    /** Not implemented yet: throws UnsupportedOperationException. */
+    public void populatesFromXmlString(String xml) {
+        throw notYet("populatesFromXmlString");
+    }
+
+    /** Not implemented yet: throws UnsupportedOperationException. */
+    public void populatesFromXmlFile(String path) {
+        throw notYet("populatesFromXmlFile");
+    }
+
+    /** Not implemented yet: throws UnsupportedOperationException. */
+    public static Replica readFromXmlString(String xml) {
+        throw notYet("readFromXmlString");
+    }
+
+    /** Not implemented yet: throws UnsupportedOperationException. */
+    public static Replica readFromXmlFile(String path) {
+        throw notYet("readFromXmlFile");
+    }
+
+    /** Not implemented yet: throws UnsupportedOperationException. */
+    public String getXsd() {
+        throw notYet("getXsd");
+    }
+
+    /** Not implemented yet: throws UnsupportedOperationException. */
+    public String getXml(boolean withSchema, boolean withState) {
+        throw notYet("getXml");
+    }
+
+    /** Not implemented yet: throws UnsupportedOperationException. */
+    public String getXml(boolean withSchema) {
+        return getXml(withSchema, false);
+    }
+
+    /** Not implemented yet: throws UnsupportedOperationException. */
+    public static byte[] getBinaryFromReplica(Replica replica, boolean compressed) {
+        throw notYet("getBinaryFromReplica");
+    }
+
+    /** Not implemented yet: throws UnsupportedOperationException. */
+    public static Replica getReplicaFromBinary(byte[] bytes, boolean compressed) {
+        throw notYet("getReplicaFromBinary");
+    }
+
+    /** For example {@code Replica 'plant' (3 classes, 120 instances, 2 deleted)}. */
+    @Override
+    public String toString() {
+        Lock l = rw.readLock();
+        l.lock();
+        try {
+            int live = 0;
+            int deleted = 0;
+            for (Model m : models.items) {
+                live += m.instances.count;
+                deleted += m.deleted == null ? 0 : m.deleted.size();
+            }
+            return "Replica '" + name + "' (" + models.items.size() + " classes, " + live + " instances"
+                    + (deleted > 0 ? ", " + deleted + " deleted" : "") + ")";
+        } finally {
+            l.unlock();
+        }
+    }
+}

@@ -1,0 +1,364 @@
+package com.velmora.tessara.kdmreplica;
+
+import java.time.Instant;
+import java.util.Arrays;
+import java.util.Date;
+
+/**
+ * Attribute values: checks and copies on the way in, copies on the way out, equality keys and
+ * text forms.
+ *
+ * <p>Stored forms, one per type (single / multi-valued): Integer {@code Integer} / {@code int[]};
+ * Double {@code Double} / {@code double[]}; String {@code String} / {@code String[]}; Date
+ * {@code Long} milliseconds / {@code long[]}; Boolean {@code Boolean} / {@code boolean[]}; Binary
+ * {@code byte[]} / {@code byte[][]}; Relationship {@code Instance} / {@code Instance[]}. A stored
+ * array is never shared with a caller. null means "no value"; an empty array is a value.
+ */
+final class Values {
+    private Values() {
+    }
+
+    /** The Java form that {@code setValue} accepts for a type, single or multi-valued. */
+    static String form(AttributeType type, boolean multi) {
+        switch (type) {
+            case Integer: return multi ? "int[]" : "Integer";
+            case Double: return multi ? "double[]" : "Double";
+            case String: return multi ? "String[]" : "String";
+            case Date: return multi ? "java.util.Date[]" : "java.util.Date";
+            case Boolean: return multi ? "boolean[]" : "Boolean";
+            case Binary: return multi ? "byte[][]" : "byte[]";
+            default: return multi ? "Instance[]" : "Instance";
+        }
+    }
+
+    static String className(Object v) {
+        String n = v.getClass().getCanonicalName();
+        return n == null ? v.getClass().getName() : n;
+    }
+
+    /**
+     * Checks a non-null value against an attribute and returns the stored form (a copy).
+     * Relationship targets must be live instances of {@code replica} and, when the attribute has
+     * target names, of one of those classes or of a subclass of one. The access mode is not looked
+     * at here.
+     *
+     * @param who names the instance being written, for messages
+     * @throws IllegalArgumentException naming the attribute and the offending value or element
+     */
+    static Object importValue(AttributeDef def, Object v, Replica replica, String who) {
+        boolean multi = def.multi;
+        switch (def.type) {
+            case Integer:
+                if (!multi && v instanceof Integer) {
+                    return v;
+                }
+                if (multi && v instanceof int[]) {
+                    return ((int[]) v).clone();
+                }
+                break;
+            case Double:
+                if (!multi && v instanceof Double) {
+                    return v;
+                }
+                if (multi && v instanceof double[]) {
+                    return ((double[]) v).clone();
+                }
+                break;
+            case Boolean:
+                if (!multi && v instanceof Boolean) {
+                    return v;
+                }
+                if (multi && v instanceof boolean[]) {
+                    return ((boolean[]) v).clone();
+                }
+                break;
+            case String:
+                if (!multi && v instanceof String) {
+                    checkLength(def, who, (String) v, -1);
+                    return v;
+                }
+                // Object[] of strings is accepted too: some native converters build that form.
+                if (multi && (v instanceof String[] || v.getClass() == Object[].class)) {
+                    Object[] in = (Object[]) v;
+                    String[] out = new String[in.length];
+                    for (int i = 0; i < in.length; i++) {
+                        if (!(in[i] instanceof String)) {
+                            throw badElement(def, who, i, in[i]);
+                        }
+                        out[i] = (String) in[i];
+                        checkLength(def, who, out[i], i);
+                    }
+                    return out;
+                }
+                break;
+            case Date:
+                if (!multi && v instanceof Date) {
+                    return ((Date) v).getTime();
+                }
+                if (multi && v instanceof Date[]) {
+                    Date[] in = (Date[]) v;
+                    long[] out = new long[in.length];
+                    for (int i = 0; i < in.length; i++) {
+                        if (in[i] == null) {
+                            throw badElement(def, who, i, null);
+                        }
+                        out[i] = in[i].getTime();
+                    }
+                    return out;
+                }
+                break;
+            case Binary:
+                if (!multi && v instanceof byte[]) {
+                    checkLength(def, who, (byte[]) v, -1);
+                    return ((byte[]) v).clone();
+                }
+                if (multi && v instanceof byte[][]) {
+                    byte[][] in = (byte[][]) v;
+                    byte[][] out = new byte[in.length][];
+                    for (int i = 0; i < in.length; i++) {
+                        if (in[i] == null) {
+                            throw badElement(def, who, i, null);
+                        }
+                        checkLength(def, who, in[i], i);
+                        out[i] = in[i].clone();
+                    }
+                    return out;
+                }
+                break;
+            case Relationship:
+                if (!multi && v instanceof Instance) {
+                    checkTarget(def, (Instance) v, replica, who, -1);
+                    return v;
+                }
+                if (multi && v instanceof Instance[]) {
+                    Instance[] in = (Instance[]) v;
+                    Instance[] out = Arrays.copyOf(in, in.length, Instance[].class);
+                    for (int i = 0; i < out.length; i++) {
+                        if (out[i] == null) {
+                            throw badElement(def, who, i, null);
+                        }
+                        checkTarget(def, out[i], replica, who, i);
+                    }
+                    return out;
+                }
+                break;
+            default:
+                break;
+        }
+        throw new IllegalArgumentException(who + ": attribute '" + def.qualifiedName() + "' ("
+                + def.type + (multi ? ", multi-valued" : "") + ") takes " + form(def.type, multi) + ", not "
+                + className(v));
+    }
+
+    private static IllegalArgumentException badElement(AttributeDef def, String who, int i, Object e) {
+        return new IllegalArgumentException(who + ": attribute '" + def.qualifiedName() + "': element " + i
+                + " of the value is " + (e == null ? "null" : "a " + className(e)) + ", expected "
+                + form(def.type, false));
+    }
+
+    private static String where(int element) {
+        return element < 0 ? "the value" : "element " + element;
+    }
+
+    private static void checkLength(AttributeDef def, String who, String s, int element) {
+        if (def.length > 0) {
+            int n = s.codePointCount(0, s.length());
+            if (n > def.length) {
+                throw new IllegalArgumentException(who + ": attribute '" + def.qualifiedName() + "' holds at most "
+                        + def.length + " characters; " + where(element) + " has " + n);
+            }
+        }
+    }
+
+    private static void checkLength(AttributeDef def, String who, byte[] b, int element) {
+        if (def.length > 0 && b.length > def.length) {
+            throw new IllegalArgumentException(who + ": attribute '" + def.qualifiedName() + "' holds at most "
+                    + def.length + " bytes; " + where(element) + " has " + b.length);
+        }
+    }
+
+    private static void checkTarget(AttributeDef def, Instance x, Replica replica, String who, int element) {
+        Model m = x.model;
+        if (m == null || replica == null || m.replica != replica) {
+            throw new IllegalArgumentException(who + ": attribute '" + def.qualifiedName() + "': " + where(element)
+                    + ", " + x.describe() + ", is not an instance of replica '"
+                    + (replica == null ? "?" : replica.name) + "'");
+        }
+        if ((x.state & Instance.DELETED) != 0) {
+            throw new IllegalArgumentException(who + ": attribute '" + def.qualifiedName() + "': " + where(element)
+                    + ", " + x.describe() + ", is deleted");
+        }
+        String[] targets = def.targetNames;
+        if (targets.length == 0) {
+            return;
+        }
+        for (ClassDef c = m.classDef; c != null; c = replica.models.superOf(c)) {
+            for (String t : targets) {
+                if (t.equals(c.name)) {
+                    return;
+                }
+            }
+        }
+        throw new IllegalArgumentException(who + ": attribute '" + def.qualifiedName() + "': " + where(element)
+                + ", " + x.describe() + ", is of class '" + m.classDef.name + "', not of a target class "
+                + Arrays.toString(targets));
+    }
+
+    /** The caller's copy of a stored value. */
+    static Object exportValue(Object stored) {
+        if (stored == null || stored instanceof Integer || stored instanceof Double || stored instanceof Boolean
+                || stored instanceof String || stored instanceof Instance) {
+            return stored;
+        }
+        if (stored instanceof Long) {
+            return new Date((Long) stored);
+        }
+        if (stored instanceof long[]) {
+            long[] in = (long[]) stored;
+            Date[] out = new Date[in.length];
+            for (int i = 0; i < in.length; i++) {
+                out[i] = new Date(in[i]);
+            }
+            return out;
+        }
+        if (stored instanceof byte[][]) {
+            byte[][] in = (byte[][]) stored;
+            byte[][] out = new byte[in.length][];
+            for (int i = 0; i < in.length; i++) {
+                out[i] = in[i].clone();
+            }
+            return out;
+        }
+        if (stored instanceof byte[]) {
+            return ((byte[]) stored).clone();
+        }
+        if (stored instanceof int[]) {
+            return ((int[]) stored).clone();
+        }
+        if (stored instanceof double[]) {
+            return ((double[]) stored).clone();
+        }
+        if (stored instanceof boolean[]) {
+            return ((boolean[]) stored).clone();
+        }
+        if (stored instanceof String[]) {
+            return ((String[]) stored).clone();
+        }
+        if (stored instanceof Instance[]) {
+            return ((Instance[]) stored).clone();
+        }
+        throw new IllegalStateException("unexpected stored value " + className(stored));
+    }
+
+    /** Instances a stored relationship value refers to (empty for other values). */
+    static Instance[] targets(Object stored) {
+        if (stored instanceof Instance) {
+            return new Instance[] {(Instance) stored};
+        }
+        if (stored instanceof Instance[]) {
+            return (Instance[]) stored;
+        }
+        return new Instance[0];
+    }
+
+    /** A key with value equality for a stored value: arrays by content, instances by identity. */
+    static Object key(Object stored) {
+        if (stored != null && stored.getClass().isArray()) {
+            return new ArrayKey(stored);
+        }
+        return stored;
+    }
+
+    /** Key of an identifier (String or byte[]); a String and a byte[] never collide. */
+    static Object idKey(Object id) {
+        return id instanceof byte[] ? new ArrayKey(id) : id;
+    }
+
+    private static final class ArrayKey {
+        private final Object array;
+        private final int hash;
+
+        ArrayKey(Object array) {
+            this.array = array;
+            this.hash = Arrays.deepHashCode(new Object[] {array});
+        }
+
+        @Override
+        public boolean equals(Object o) {
+            return o instanceof ArrayKey && Arrays.deepEquals(new Object[] {array}, new Object[] {((ArrayKey) o).array});
+        }
+
+        @Override
+        public int hashCode() {
+            return hash;
+        }
+    }
+
+    static void quote(StringBuilder b, String s) {
+        b.append('"');
+        for (int i = 0; i < s.length(); i++) {
+            char c = s.charAt(i);
+            switch (c) {
+                case '"': b.append("\\\""); break;
+                case '\\': b.append("\\\\"); break;
+                case '\n': b.append("\\n"); break;
+                case '\r': b.append("\\r"); break;
+                case '\t': b.append("\\t"); break;
+                default:
+                    if (c < 0x20) {
+                        b.append(String.format("\\u%04x", (int) c));
+                    } else {
+                        b.append(c);
+                    }
+            }
+        }
+        b.append('"');
+    }
+
+    private static void hex(StringBuilder b, byte[] bytes) {
+        b.append("0x");
+        int n = Math.min(bytes.length, 32);
+        for (int i = 0; i < n; i++) {
+            b.append(Character.forDigit((bytes[i] >> 4) & 15, 16)).append(Character.forDigit(bytes[i] & 15, 16));
+        }
+        if (n < bytes.length) {
+            b.append("...(").append(bytes.length).append(" bytes)");
+        }
+    }
+
+    /** Readable form of a stored value. */
+    static void format(StringBuilder b, Object v) {
+        if (v instanceof String) {
+            quote(b, (String) v);
+        } else if (v instanceof Long) {
+            b.append(Instant.ofEpochMilli((Long) v));
+        } else if (v instanceof byte[]) {
+            hex(b, (byte[]) v);
+        } else if (v instanceof Instance) {
+            b.append(((Instance) v).describe());
+        } else if (v instanceof int[]) {
+            b.append(Arrays.toString((int[]) v));
+        } else if (v instanceof double[]) {
+            b.append(Arrays.toString((double[]) v));
+        } else if (v instanceof boolean[]) {
+            b.append(Arrays.toString((boolean[]) v));
+        } else if (v instanceof long[]) {
+            long[] a = (long[]) v;
+            b.append('[');
+            for (int i = 0; i < a.length; i++) {
+                b.append(i == 0 ? "" : ", ").append(Instant.ofEpochMilli(a[i]));
+            }
+            b.append(']');
+        } else if (v instanceof Object[]) {
+            Object[] a = (Object[]) v;
+            b.append('[');
+            for (int i = 0; i < a.length; i++) {
+                b.append(i == 0 ? "" : ", ");
+                format(b, a[i]);
+            }
+            b.append(']');
+        } else {
+            b.append(v);
+        }
+    }
+}
