@@ -1,0 +1,96 @@
+// Shared helpers of the bridge's units; not installed.
+#ifndef VLXJBXInternal_h
+#define VLXJBXInternal_h
+
+#include "VLXUnicodeString.h"
+
+#include <jni.h>
+
+#include <initializer_list>
+#include <string>
+#include <vector>
+
+namespace VLXJBXDetail
+{
+// Owns one local reference and deletes it on every path.
+class LocalRef
+{
+public:
+  LocalRef(JNIEnv* env, jobject ref) : _env(env), _ref(ref) {}
+  ~LocalRef()
+  {
+    if (_ref != nullptr)
+      _env->DeleteLocalRef(_ref);
+  }
+  LocalRef(const LocalRef&) = delete;
+  LocalRef& operator=(const LocalRef&) = delete;
+  jobject get() const { return _ref; }
+  // Gives up ownership.
+  jobject release()
+  {
+    jobject r = _ref;
+    _ref = nullptr;
+    return r;
+  }
+
+private:
+  JNIEnv* _env;
+  jobject _ref;
+};
+
+// Java classes and members of java.lang the bridge itself uses, resolved once per process through
+// uncounted global references that are never released. A member is null when its lookup failed.
+struct JavaLang
+{
+  jclass stringClass = nullptr;
+  jclass objectArrayClass = nullptr;
+  jclass booleanArrayClass = nullptr;
+  jclass byteArrayClass = nullptr;
+  jclass intArrayClass = nullptr;
+  jclass doubleArrayClass = nullptr;
+  jmethodID classGetName = nullptr;        // java.lang.Class.getName()
+  jmethodID throwableGetMessage = nullptr; // java.lang.Throwable.getMessage()
+  jmethodID throwableGetCause = nullptr;   // java.lang.Throwable.getCause()
+};
+// Needs no pending exception.
+const JavaLang& Lang(JNIEnv* env);
+
+// Records a new VLXJBXException with the id and parameters as the calling thread's last error and
+// returns `code`.
+long Raise(long code, const char* id, std::initializer_list<std::string> parameters, const char* file, int line);
+
+// The calling thread's JNIEnv from the bridge (null when none can be obtained; the last error says why).
+JNIEnv* CurrentEnv();
+
+// Adjusts the count of global references held through the bridge.
+void CountGlobalRefs(long delta);
+
+// A Java exception in words.
+struct JavaExceptionText
+{
+  std::string className; // "java.lang.IllegalStateException"
+  std::string message;   // its getMessage(), "(no message)" when null
+  std::string cause;     // "; caused by <class>: <message>", or empty when it has no cause
+  // "class: message" followed by the cause.
+  std::string Describe() const { return className + ": " + message + cause; }
+};
+
+// Clears the pending exception (there must be one) and describes it. Every exception raised while
+// describing it is cleared too.
+JavaExceptionText TakeException(JNIEnv* env);
+
+// Java text <-> UTF-8. JavaToUtf8 needs no pending exception; a null string gives "".
+std::string JavaToUtf8(JNIEnv* env, jstring text);
+
+// The start-up configuration, exposed for tests.
+// The directory of the bridge library ("" if it cannot be found).
+std::string LibraryDirectory();
+// The class path for `classPathVariable` (VLXJBX_CLASSPATH, may be null) and the library
+// directory: the variable's non-empty entries, then the replica jar when it exists in
+// <libraryDirectory>/../share/corvexa or else in <libraryDirectory>.
+std::string BuildClassPath(const char* classPathVariable, const std::string& libraryDirectory);
+// The whitespace-separated words of `text` (may be null).
+std::vector<std::string> SplitOptions(const char* text);
+}
+
+#endif
