@@ -20,7 +20,7 @@ public class AttributeDefList {
 
     /** The list of a new class with a generated name (the list is that class's own list). */
     public AttributeDefList() {
-        this.owner = new ClassDef(this);
+        this.owner = new ClassDef(Names.generate("Class"), this);
     }
 
     private String who() {

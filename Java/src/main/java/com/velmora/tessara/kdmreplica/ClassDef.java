@@ -54,8 +54,8 @@ public class ClassDef {
     }
 
     /** The class of a list made with {@code new AttributeDefList()}. */
-    ClassDef(AttributeDefList list) {
-        this.name = Names.generate("Class");
+    ClassDef(String name, AttributeDefList list) {
+        this.name = name;
         this.attributes = list;
     }
 

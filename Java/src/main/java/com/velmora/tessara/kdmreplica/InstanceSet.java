@@ -24,7 +24,7 @@ public class InstanceSet {
 
     /** The set of a new model of a new class, in no replica: it stays empty. */
     public InstanceSet() {
-        this.model = new Model(this);
+        this.model = new Model(new ClassDef(), this);
     }
 
     private String who() {

@@ -42,8 +42,8 @@ public class Model {
     }
 
     /** The model of a set made with {@code new InstanceSet()}. */
-    Model(InstanceSet set) {
-        this.classDef = new ClassDef();
+    Model(ClassDef classDef, InstanceSet set) {
+        this.classDef = classDef;
         this.instances = set;
     }
 

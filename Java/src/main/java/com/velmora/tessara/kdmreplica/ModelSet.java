@@ -21,7 +21,7 @@ public class ModelSet {
 
     /** The model set of a new replica with a generated name (the set is that replica's own). */
     public ModelSet() {
-        this.replica = new Replica(this);
+        this.replica = new Replica(Names.generate("Replica"), this);
     }
 
     private String who() {

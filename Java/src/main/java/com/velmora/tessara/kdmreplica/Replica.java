@@ -63,8 +63,8 @@ public class Replica {
     }
 
     /** The replica of a model set made with {@code new ModelSet()}. */
-    Replica(ModelSet set) {
-        this.name = Names.generate("Replica");
+    Replica(String name, ModelSet set) {
+        this.name = name;
         this.models = set;
         this.schemaLocation = processSchemaLocation;
     }

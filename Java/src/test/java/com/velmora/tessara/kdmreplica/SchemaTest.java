@@ -1,0 +1,175 @@
+package com.velmora.tessara.kdmreplica;
+
+import static com.velmora.tessara.kdmreplica.Fx.addAttr;
+import static com.velmora.tessara.kdmreplica.Fx.addClass;
+import static com.velmora.tessara.kdmreplica.Fx.throwsWith;
+import static org.junit.jupiter.api.Assertions.assertArrayEquals;
+import static org.junit.jupiter.api.Assertions.assertEquals;
+import static org.junit.jupiter.api.Assertions.assertFalse;
+import static org.junit.jupiter.api.Assertions.assertNull;
+import static org.junit.jupiter.api.Assertions.assertSame;
+import static org.junit.jupiter.api.Assertions.assertThrows;
+
+import org.junit.jupiter.api.BeforeEach;
+import org.junit.jupiter.api.Test;
+
+/** Inheritance, schema checks, lookups and what schema changes do to existing instances. */
+class SchemaTest {
+    private Replica r;
+    private Model part;
+    private Model bolt;
+
+    @BeforeEach
+    void setUp() {
+        r = new Replica("plant");
+        part = addClass(r, "Part", null);
+        addAttr(part, "name", AttributeType.String, false);
+        addAttr(part, "weight", AttributeType.Double, false);
+        bolt = addClass(r, "Bolt", "Part");
+        addAttr(bolt, "thread", AttributeType.Integer, false);
+    }
+
+    @Test
+    void subclassInstancesHaveInheritedAttributesFirst() {
+        Instance b = bolt.createInstance();
+        b.setValue(0, "m8");
+        b.setValue(1, 2.5);
+        b.setValue(2, 8);
+        assertEquals("m8", b.getValue("name"));
+        assertEquals(8, b.getValue("thread"));
+        throwsWith(IndexOutOfBoundsException.class, () -> b.getValue(3), "position 3", "3 attributes");
+        throwsWith(IllegalArgumentException.class, () -> b.getValue("wieght"), "class 'Bolt'", "'wieght'");
+        assertSame(part.getClassDef().getAttributes().getItem("name"), r.getAttributeDef("Bolt.name"));
+    }
+
+    @Test
+    void valuesFollowTheirAttributesWhenTheSchemaChanges() {
+        Instance p = part.createInstance();
+        Instance b = bolt.createInstance();
+        p.setValue("name", "plate");
+        p.setValue("weight", 1.0);
+        b.setValue("name", "m8");
+        b.setValue("thread", 8);
+
+        // a new attribute of the super class goes before the subclass's own, without value
+        addAttr(part, "colour", AttributeType.String, false);
+        assertEquals("colour", part.getClassDef().getAttributes().getItem(2).getAttributeName());
+        assertFalse(b.isValuated("colour"));
+        assertEquals(3, r.getClassDef("Bolt").getAttributes().getCount() + 2);
+        assertEquals(8, b.getValue(3));
+        assertEquals("m8", b.getValue(0));
+        b.setValue("colour", "red");
+
+        // removing one takes its values with it, the others stay
+        part.getClassDef().getAttributes().remove("weight");
+        assertEquals("plate", p.getValue("name"));
+        assertEquals("red", b.getValue(1));
+        assertEquals(8, b.getValue("thread"));
+        throwsWith(IllegalArgumentException.class, () -> p.getValue("weight"), "'weight'");
+        assertNull(r.getAttributeDef("Part.weight"));
+    }
+
+    @Test
+    void changingTheSuperClassRealignsInstances() {
+        Model base = addClass(r, "Base", null);
+        addAttr(base, "uid", AttributeType.Integer, false);
+        Instance b = bolt.createInstance();
+        b.setValue("thread", 6);
+        part.getClassDef().setSuperName("Base");
+        assertEquals("uid", r.getAttributeDef("Bolt.uid").getAttributeName());
+        assertEquals(6, b.getValue(3));
+        b.setValue(0, 1);
+        part.getClassDef().setSuperName(null);
+        assertEquals("", part.getClassDef().getSuperName());
+        assertEquals(6, b.getValue(2));
+    }
+
+    @Test
+    void unknownAndCyclicSuperClassesAreRefusedAndUndone() {
+        ClassDef p = part.getClassDef();
+        throwsWith(IllegalArgumentException.class, () -> p.setSuperName("Nope"), "class 'Part'", "'Nope'");
+        assertEquals("", p.getSuperName());
+        throwsWith(IllegalArgumentException.class, () -> p.setSuperName("Bolt"), "cyclic", "Part -> Bolt -> Part");
+        throwsWith(IllegalArgumentException.class, () -> p.setSuperName("Part"), "cyclic");
+        assertEquals("", p.getSuperName());
+
+        ClassDef orphan = new ClassDef("Orphan");
+        orphan.setSuperName("Missing"); // only stored while in no replica
+        throwsWith(IllegalArgumentException.class, () -> r.getModels().add(new Model(orphan)), "'Missing'");
+        assertEquals(2, r.getModels().getCount());
+        assertNull(orphan.replica);
+        assertNull(r.getClassDef("Orphan"));
+        orphan.setSuperName("Part");
+        r.getModels().add(new Model(orphan));
+        assertEquals(3, r.getModels().getCount());
+    }
+
+    @Test
+    void attributeNamesMayNotClashAlongTheInheritanceChain() {
+        throwsWith(IllegalArgumentException.class, () -> addAttr(bolt, "name", AttributeType.String, false),
+                "'Bolt.name'", "'Part.name'");
+        throwsWith(IllegalArgumentException.class, () -> addAttr(part, "thread", AttributeType.Integer, false),
+                "'Bolt.thread'");
+        assertEquals(2, part.getClassDef().getAttributes().getCount());
+        assertEquals(1, bolt.getClassDef().getAttributes().getCount());
+        Model other = addClass(r, "Other", null);
+        addAttr(other, "thread", AttributeType.String, false);
+        throwsWith(IllegalArgumentException.class, () -> bolt.getClassDef().setSuperName("Other"), "'Bolt.thread'", "'Other.thread'");
+        assertEquals("Part", bolt.getClassDef().getSuperName());
+    }
+
+    @Test
+    void aClassNameIsTakenOnceAndRenamesCarrySubclasses() {
+        throwsWith(IllegalArgumentException.class, () -> r.getModels().add(new Model(new ClassDef("Part"))),
+                "already has a class 'Part'");
+        throwsWith(IllegalArgumentException.class, () -> part.getClassDef().setClassName("Bolt"), "taken");
+        part.getClassDef().setClassName("Item");
+        assertEquals("Item", bolt.getClassDef().getSuperName());
+        assertSame(part, r.getModels().getItem("Item"));
+        assertNull(r.getModels().getItem("Part"));
+        throwsWith(IllegalArgumentException.class, () -> r.getModels().remove("Item"), "'Bolt' extends it");
+        throwsWith(IllegalArgumentException.class, () -> new ClassDef("a.b"), "'a.b'");
+        throwsWith(IllegalArgumentException.class, () -> new AttributeDef("", AttributeType.Integer), "empty");
+        throwsWith(IllegalArgumentException.class, () -> new AttributeDef("x", null), "type is null");
+    }
+
+    @Test
+    void attributeLookupByQualifiedOrUniqueBareName() {
+        Model nut = addClass(r, "Nut", null);
+        addAttr(nut, "thread", AttributeType.Integer, false);
+        assertSame(bolt.getClassDef().getAttributes().getItem(0), r.getAttributeDef("Bolt.thread"));
+        assertSame(part.getClassDef().getAttributes().getItem(1), r.getAttributeDef("weight"));
+        throwsWith(IllegalArgumentException.class, () -> r.getAttributeDef("thread"), "ambiguous", "'Bolt'", "'Nut'");
+        assertNull(r.getAttributeDef("nothing"));
+        assertNull(r.getAttributeDef("Nope.name"));
+        assertNull(r.getAttributeDef("Part.thread"));
+        assertNull(r.getClassDef("Nope"));
+        assertThrows(IllegalArgumentException.class, () -> r.getAttributeDef(null));
+    }
+
+    @Test
+    void anAttributeBelongsToOneClass() {
+        AttributeDef a = part.getClassDef().getAttributes().getItem("name");
+        assertSame(part.getClassDef(), a.getClassDef());
+        Model nut = addClass(r, "Nut", null);
+        throwsWith(IllegalArgumentException.class, () -> nut.getClassDef().getAttributes().add(a),
+                "already belongs to class 'Part'");
+        part.getClassDef().getAttributes().remove(a);
+        assertNull(a.getClassDef());
+        nut.getClassDef().getAttributes().add(a);
+        assertSame(nut.getClassDef(), a.getClassDef());
+        assertEquals("AttributeDef 'Nut.name' String", a.toString());
+    }
+
+    @Test
+    void multiValuationCannotChangeUnderExistingValues() {
+        AttributeDef w = r.getAttributeDef("Part.weight");
+        Instance p = part.createInstance();
+        p.setValue("weight", 2.0);
+        throwsWith(IllegalStateException.class, () -> w.setMultiValuation(true), "'Part.weight'", "1 instance");
+        p.clearValue("weight");
+        w.setMultiValuation(true);
+        p.setValue("weight", new double[] {1, 2});
+        assertArrayEquals(new double[] {1, 2}, (double[]) p.getValue("weight"));
+    }
+}
