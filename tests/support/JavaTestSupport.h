@@ -54,6 +54,10 @@ void AttachNew(Proxy& proxy, const char* classPath)
 // Reads an int field of a Java object (for test doubles that count calls).
 inline int IntField(jobject object, const char* field)
 {
+  if (!object) {
+    ADD_FAILURE() << "no Java object to read " << field << " from";
+    return -1;
+  }
   JNIEnv* env = Env();
   jclass cls = env->GetObjectClass(object);
   const int value = env->GetIntField(object, env->GetFieldID(cls, field, "I"));
@@ -85,5 +89,38 @@ inline LastError PeekLastError()
 }
 
 inline void ClearLastError() { VLXError::VLXCleanLastError(); }
+
+}  // namespace corvexa_test
+
+#include "VLXFatalError.h"
+
+namespace corvexa_test {
+
+// Records the fatal-error reports made while it lives, and lets the library go on.
+class FatalRecorder {
+ public:
+  struct Report {
+    std::string message;
+    std::string file;
+    int line;
+  };
+  FatalRecorder() : _previous(VLXSetFatalErrorHandler(&FatalRecorder::Record)) { Reports().clear(); }
+  ~FatalRecorder() { VLXSetFatalErrorHandler(_previous); }
+  FatalRecorder(const FatalRecorder&) = delete;
+  FatalRecorder& operator=(const FatalRecorder&) = delete;
+
+  static std::vector<Report>& Reports()
+  {
+    static std::vector<Report> reports;
+    return reports;
+  }
+
+ private:
+  static void Record(const char* message, const char* file, int line)
+  {
+    Reports().push_back(Report{message ? message : "", file ? file : "", line});
+  }
+  VLXFatalErrorHandler _previous;
+};
 
 }  // namespace corvexa_test

@@ -1,8 +1,57 @@
-// A class definition of a replica's schema: its name, super class, flags, and attribute list.
+// A class definition of a replica's schema: its name, super class, uuid, comments, scope names,
+// flags, class type, visibility, and the list of its attribute definitions. Every operation but
+// Build needs a built proxy; on failure, out-parameters are left as they were.
 #pragma once
 
+#include "VLXKDMAttributeDefList.h"
 #include "VLXKDMJavaObject.h"
+#include "VLXKDMSchemaTypes.h"
+#include "VLXListValVLXUnicodeString.h"
+#include "VLXUnicodeString.h"
 
 class CORVEXA_API VLXKDMClassDef : public VLXKDMJavaObject {
   VLXKDM_PROXY_SPECIAL_MEMBERS(VLXKDMClassDef)
+
+ public:
+  // Attaches this proxy to a new Java class definition named name (releasing any it referred to).
+  long Build(const VLXUnicodeString& name);
+  // Attaches this proxy to a new, unnamed Java class definition.
+  long Build();
+
+  long GetClassName(VLXUnicodeString& name);
+  long SetClassName(const VLXUnicodeString& name);
+  // The name of the class this one extends (empty when none).
+  long GetSuperName(VLXUnicodeString& name);
+  long SetSuperName(const VLXUnicodeString& name);
+  long GetUuid(VLXUnicodeString& uuid);
+  long SetUuid(const VLXUnicodeString& uuid);
+  long GetQKAComment(VLXUnicodeString& comment);
+  long SetQKAComment(const VLXUnicodeString& comment);
+  long GetQKADerivability(VLXUnicodeString& derivability);
+  long SetQKADerivability(const VLXUnicodeString& derivability);
+  long GetScopeNames(VLXListOfVLXUnicodeString& names);
+  long SetScopeNames(const VLXListOfVLXUnicodeString& names);
+  // As SetScopeNames with a list: count NUL-terminated texts (const char*) follow; count <= 0 sets
+  // an empty list. Failures are reported under the list form's name.
+  long SetScopeNames(int count, ...);
+
+  // The flags cross as their byte values, unchanged.
+  long IsAbstract(VLXBoolean& isAbstract);
+  long SetAbstract(VLXBoolean isAbstract);
+  long IsExtensible(VLXBoolean& isExtensible);
+  long SetExtensibility(VLXBoolean isExtensible);
+  long IsPersistent(VLXBoolean& isPersistent);
+  long SetPersistency(VLXBoolean isPersistent);
+
+  // Writes VLXKDMClassType::Class when the Java side answers null or an unknown object.
+  long GetClassType(VLXKDMClassType::Type& type);
+  // A value that is not an enumerator is a broken precondition, reported through VLXFatalError.
+  long SetClassType(VLXKDMClassType::Type type);
+  // Writes VLXKDMVisibility::Public when the Java side answers null or an unknown object.
+  long GetSoftwareVisibility(VLXKDMVisibility::Mode& visibility);
+  long SetSoftwareVisibility(VLXKDMVisibility::Mode visibility);
+
+  // Attaches attributes to the class's own (live) attribute list.
+  long GetAttributes(VLXKDMAttributeDefList& attributes);
+  long ToString(VLXUnicodeString& text);
 };

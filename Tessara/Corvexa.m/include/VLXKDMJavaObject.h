@@ -11,6 +11,7 @@
 
 #include "CorvexaExport.h"
 #include "VLXJBXJavaObject.h"
+#include "VLXResult.h"
 
 class ReplicaStubs;
 class VLXMutex;

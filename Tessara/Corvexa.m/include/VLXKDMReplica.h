@@ -3,6 +3,9 @@
 // out-parameters as they were.
 #pragma once
 
+#include <jni.h>
+
+#include "VLXBinary.h"
 #include "VLXKDMAttributeDef.h"
 #include "VLXKDMClassDef.h"
 #include "VLXKDMJavaObject.h"
@@ -36,4 +39,55 @@ class CORVEXA_API VLXKDMReplica : public VLXKDMJavaObject {
   // Attaches attributeDef to the attribute definition named attributeName ("Class.attribute", or a
   // bare name that exactly one class holds); to nothing when there is none.
   long GetAttributeDef(const VLXUnicodeString& attributeName, VLXKDMAttributeDef& attributeDef);
+
+  // ---- Documents. Parsing, validation and writing happen on the Java side; a malformed or hostile
+  // document or buffer fails with a last error that says what was wrong, leaving the replica as it
+  // was.
+
+  // Sets the schema location written into XML output, for the whole process. Needs no proxy.
+  static long SetSchemaLocation(const VLXUnicodeString& location);
+  // The schema location this replica was read with (or the one in force when it was created).
+  long GetSchemaLocation(VLXUnicodeString& location);
+  // Sets a process-wide feature of the replica implementation: "validate" (validate XML input
+  // against the replica's schema; default off) or "indent" (indent XML output; default on). Needs
+  // no proxy; an unknown name fails, listing the known ones.
+  static long SetFeature(const VLXUnicodeString& name, VLXBoolean value);
+
+  // Adds the class definitions of an XSD file or text to the schema, with an empty model for each.
+  long InsertSchemaFile(const VLXUnicodeString& path);
+  long InsertSchemaString(const VLXUnicodeString& xsd);
+  // Adds the instances of an XML file or text; the schema must know their classes. All or nothing.
+  long PopulatesFromXmlFile(const VLXUnicodeString& path);
+  long PopulatesFromXmlString(const VLXUnicodeString& xml);
+  // Attaches replica to a new replica read from an XML file or text, with the schema embedded in
+  // the document or found at its schema location. replica need not be built.
+  static long ReadFromXmlFile(const VLXUnicodeString& path, VLXKDMReplica& replica);
+  static long ReadFromXmlString(const VLXUnicodeString& xml, VLXKDMReplica& replica);
+
+  // The replica as XML; withSchema embeds its XSD so that the document stands alone.
+  long GetXml(VLXBoolean withSchema, VLXUnicodeString& xml);
+  // As above; withState also writes pending changes (states, deleted instances) so that reading
+  // the document back restores them.
+  long GetXml(VLXBoolean withSchema, VLXBoolean withState, VLXUnicodeString& xml);
+  // The schema as a W3C XML Schema that validates the replica's own XML.
+  long GetXsd(VLXUnicodeString& xsd);
+
+  // The replica as bytes (deflated when compressed), and back. The flag given to read must be the
+  // one the bytes were written with.
+  static long GetBinaryFromReplica(const VLXKDMReplica& replica, VLXBoolean compressed, VLXBinary& bytes);
+  static long GetReplicaFromBinary(const VLXBinary& bytes, VLXBoolean compressed, VLXKDMReplica& replica);
+
+  // ---- Exchange with Java code that calls into native code with its own environment.
+
+  // Attaches this proxy to the given Java replica. Uses env as it is and starts nothing.
+  long BuildFromJavaType(JNIEnv* env, jobject replica);
+  // Writes a new local reference to this proxy's Java replica (null when the proxy is not built);
+  // the reference belongs to the calling Java frame.
+  long ConvertToJavaType(JNIEnv* env, jobject& replica);
+  // Attaches this proxy to the replica that the Java ReplicaHolder holder holds.
+  long BuildFromJavaHolder(JNIEnv* env, jobject holder);
+  // Stores this proxy's Java replica into holder; when holder is null, into a new ReplicaHolder
+  // written to holder (a local reference of the calling Java frame). holder is written only on
+  // success.
+  long ConvertToJavaHolder(JNIEnv* env, jobject& holder);
 };

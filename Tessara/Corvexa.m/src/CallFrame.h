@@ -21,6 +21,7 @@
 #pragma once
 
 #include <cstddef>
+#include <string>
 #include <tuple>
 #include <type_traits>
 #include <utility>
@@ -30,8 +31,12 @@
 #include "ReplicaStubs.h"
 #include "VLXBinary.h"
 #include "VLXJBXJNIConverter.h"
+#include "VLXError.h"
+#include "VLXFatalError.h"
+#include "VLXJBXException.h"
 #include "VLXJBXJNIHelper.h"
 #include "VLXKDMJavaObject.h"
+#include "VLXKDMSchemaTypes.h"
 #include "VLXListValVLXUnicodeString.h"
 #include "VLXResult.h"
 #include "VLXUnicodeString.h"
@@ -46,6 +51,12 @@ class LocalRef {
   LocalRef(const LocalRef&) = delete;
   LocalRef& operator=(const LocalRef&) = delete;
   jobject get() const { return _ref; }
+  // Hands the reference over to the caller, who then owns it.
+  jobject release() {
+    const jobject ref = _ref;
+    _ref = nullptr;
+    return ref;
+  }
   void reset() {
     if (_ref) VLXJBXJNIHelper::DeleteLocalRef(_env, _ref);
     _ref = nullptr;
@@ -64,6 +75,17 @@ class FrameAccess {
     return self ? self->InitJavaAndTestIsBuilt(env, name) : VLXKDMJavaObject::InitJava(env, name);
   }
   static ReplicaStubs* Table() { return VLXKDMJavaObject::_st.load(std::memory_order_acquire); }
+
+  // The start of an operation that Java code calls with its own environment: env is replaced by
+  // the calling thread's. Returns the bound table, or null with the operation's result in result.
+  static const ReplicaStubs* StartJavaFacing(JNIEnv*& env, const char* name, long& result) {
+    result = VLXKDMJavaObject::InitJava(env, name);
+    if (result < 0) return nullptr;
+    const ReplicaStubs* st = Table();
+    if (!st) result = VLX_E_FAIL;
+    else if (!st->IsBound()) result = st->ReportUnbound(name);
+    return st && st->IsBound() ? st : nullptr;
+  }
 };
 
 // ---- How a native argument reaches Java ------------------------------------------------------
@@ -160,6 +182,128 @@ template <> struct ResultOf<NoResult> {
   using Raw = void;
 };
 
+// ---- Schema enumerations ---------------------------------------------------------------------
+// Each native enumeration stands for the Java constants in consecutive slots of the binding table,
+// in value order. A getter that finds a null or unknown object writes the enumeration's default;
+// the aggregation type has none and then leaves the caller's value alone.
+
+template <class E>
+struct EnumTable;
+template <> struct EnumTable<VLXKDMAttributeType::Type> {
+  static constexpr const char* kName = "VLXKDMAttributeType::Type";
+  static constexpr Slot kFirst = AttributeType_Integer;
+  static constexpr int kCount = 7;
+  static constexpr bool kHasDefault = true;
+  static constexpr VLXKDMAttributeType::Type kDefault = VLXKDMAttributeType::String;
+};
+template <> struct EnumTable<VLXKDMAccessMode::Mode> {
+  static constexpr const char* kName = "VLXKDMAccessMode::Mode";
+  static constexpr Slot kFirst = AccessMode_Read;
+  static constexpr int kCount = 3;
+  static constexpr bool kHasDefault = true;
+  static constexpr VLXKDMAccessMode::Mode kDefault = VLXKDMAccessMode::Read;
+};
+template <> struct EnumTable<VLXKDMAggregationType::Type> {
+  static constexpr const char* kName = "VLXKDMAggregationType::Type";
+  static constexpr Slot kFirst = AggregationType_Composition;
+  static constexpr int kCount = 2;
+  static constexpr bool kHasDefault = false;
+  static constexpr VLXKDMAggregationType::Type kDefault = VLXKDMAggregationType::Composition;
+};
+template <> struct EnumTable<VLXKDMClassType::Type> {
+  static constexpr const char* kName = "VLXKDMClassType::Type";
+  static constexpr Slot kFirst = ClassType_Class;
+  static constexpr int kCount = 2;
+  static constexpr bool kHasDefault = true;
+  static constexpr VLXKDMClassType::Type kDefault = VLXKDMClassType::Class;
+};
+template <> struct EnumTable<VLXKDMVisibility::Mode> {
+  static constexpr const char* kName = "VLXKDMVisibility::Mode";
+  static constexpr Slot kFirst = Visibility_Public;
+  static constexpr int kCount = 3;
+  static constexpr bool kHasDefault = true;
+  static constexpr VLXKDMVisibility::Mode kDefault = VLXKDMVisibility::Public;
+};
+
+// Where a broken enumeration argument is reported: the assertion text, source path and line.
+struct Assertion {
+  const char* message;
+  const char* file;
+  int line;
+};
+
+// An enumeration argument: sent as its Java constant, mapped before any other argument. A value
+// without a constant is a broken precondition, reported through VLXFatalError; if the handler
+// returns, the operation fails with an invalid-argument error and Java is not called.
+template <class E>
+struct EnumArg {
+  E value;
+  Assertion assertion;
+};
+template <class E>
+EnumArg<E> Enum(E value, Assertion assertion) { return EnumArg<E>{value, assertion}; }
+
+// Records that value is none of the enumerators of the enumeration name; returns VLX_E_INVALIDARG.
+inline long RejectEnumerator(const char* name, int value) {
+  VLXJBXException* error = new VLXJBXException(VLXJBXMessages::InvalidArgument);
+  const std::string what = std::string("the enumeration ") + name;
+  const std::string why = "the value " + std::to_string(value) + " is none of its enumerators";
+  const VLXUnicodeString parameters[2] = {VLXUnicodeString(what.c_str()), VLXUnicodeString(why.c_str())};
+  error->SetNLSRequestParams(2, parameters);
+  VLXError::VLXCleanLastError();
+  VLXError::GetReturn(2, error, nullptr, __FILE__, __LINE__);
+  return VLX_E_INVALIDARG;
+}
+
+template <class E>
+struct ArgOf<EnumArg<E>> {
+  using J = jobject;
+  static constexpr bool kOwnsRef = false;
+  static constexpr bool kEarly = true;
+  static long To(JNIEnv*, const EnumArg<E>& arg, J& out) {
+    using Table = EnumTable<E>;
+    const int value = static_cast<int>(arg.value);
+    out = value >= 0 && value < Table::kCount
+              ? FrameAccess::Table()->Constant(static_cast<Slot>(Table::kFirst + value))
+              : nullptr;
+    if (out) return VLX_S_OK;
+    VLXFatalError(arg.assertion.message, nullptr, nullptr, nullptr, arg.assertion.file, arg.assertion.line);
+    return RejectEnumerator(Table::kName, value);
+  }
+};
+
+// An enumeration out-parameter: the returned Java object compared by identity with the constants.
+template <class E>
+struct EnumOut {
+  E& value;
+};
+template <class E>
+EnumOut<E> Enum(E& value) { return EnumOut<E>{value}; }
+
+template <class E>
+struct ResultOf<EnumOut<E>> {
+  using Raw = jobject;
+  static long Land(JNIEnv* env, jobject result, EnumOut<E>& out, long status) {
+    using Table = EnumTable<E>;
+    if (!result) {
+      if (Table::kHasDefault) out.value = Table::kDefault;
+      return status;
+    }
+    const ReplicaStubs* st = FrameAccess::Table();
+    int found = -1;
+    for (int value = 0; value < Table::kCount && found < 0; ++value) {
+      const jobject constant = st->Constant(static_cast<Slot>(Table::kFirst + value));
+      if (constant && VLXJBXJNIHelper::IsSameObject(env, result, constant)) found = value;
+    }
+    VLXJBXJNIHelper::DeleteLocalRef(env, result);
+    if (found >= 0)
+      out.value = static_cast<E>(found);
+    else if (Table::kHasDefault)
+      out.value = Table::kDefault;
+    return status;
+  }
+};
+
 // ---- The frame -------------------------------------------------------------------------------
 
 enum class Target { Handle, Class, Constructor };
@@ -191,16 +335,14 @@ class Call {
     return *this;
   }
 
+  // The arguments, in the Java method's parameter order.
   template <class... A>
-  Bound<A...> with(const A&... args) const {
-    return Bound<A...>(*this, args...);
-  }
+  Bound<A...> with(const A&... args) const;
+  // Shorthands for a method without arguments.
   template <class Out>
-  long returning(Out& out) const {
-    return with().returning(out);
-  }
-  long run() const { return with().run(); }
-  long construct() const { return with().construct(); }
+  long returning(Out&& out) const;
+  long run() const;
+  long construct() const;
 
  private:
   template <class... A>
@@ -225,8 +367,8 @@ class Bound {
 
   // The method returns a value that lands in out.
   template <class Out>
-  long returning(Out& out) {
-    return Execute<ResultOf<Out>>(out);
+  long returning(Out&& out) {
+    return Execute<ResultOf<std::decay_t<Out>>>(out);
   }
   // The method returns nothing.
   long run() {
@@ -277,7 +419,7 @@ class Bound {
   template <std::size_t... I>
   long ConvertAll(JNIEnv* env, JArgs& jargs, std::index_sequence<I...>) {
     long status = VLX_S_OK;
-    auto one = [&](auto& jarg, const auto& arg) {
+    [[maybe_unused]] auto one = [&](auto& jarg, const auto& arg) {
       using T = std::decay_t<decltype(arg)>;
       status = ArgOf<T>::To(env, arg, jarg);
       return status >= 0;
@@ -289,7 +431,7 @@ class Bound {
 
   template <std::size_t... I>
   static void ReleaseAll(JNIEnv* env, JArgs& jargs, std::index_sequence<I...>) {
-    auto one = [env](auto& jarg, bool owns) {
+    [[maybe_unused]] auto one = [env](auto& jarg, bool owns) {
       if constexpr (std::is_pointer_v<std::decay_t<decltype(jarg)>>) {
         if (owns && jarg) VLXJBXJNIHelper::DeleteLocalRef(env, jarg);
         jarg = nullptr;
@@ -336,5 +478,16 @@ class Bound {
   const Call& _call;
   std::tuple<const A&...> _args;
 };
+
+template <class... A>
+Bound<A...> Call::with(const A&... args) const {
+  return Bound<A...>(*this, args...);
+}
+template <class Out>
+long Call::returning(Out&& out) const {
+  return with().returning(std::forward<Out>(out));
+}
+inline long Call::run() const { return with().run(); }
+inline long Call::construct() const { return with().construct(); }
 
 }  // namespace corvexa

@@ -2,7 +2,200 @@
 
 #include "CallFrame.h"
 #include "ProxyMembers.h"
+#include "VLXKDMClassDef.h"
+#include "Variadic.h"
 
 using namespace corvexa;
 
+namespace {
+const char* const kSource = "Tessara\\Corvexa.m\\src\\VLXKDMAttributeDef.cpp";
+}
+
 VLXKDM_PROXY_DEFINITIONS(VLXKDMAttributeDef)
+
+long VLXKDMAttributeDef::Build(const VLXUnicodeString& name, VLXKDMAttributeType::Type type)
+{
+  return Call::Construct(*this, "VLXKDMAttributeDef::Build(const VLXUnicodeString&, VLXKDMAttributeType::Type)",
+                         AttributeDef, AttributeDef_new_name_type)
+      .rawConversionCode()
+      .with(name, Enum(type, {"AssertionFailed:type != NULL", kSource, 41}))
+      .construct();
+}
+
+long VLXKDMAttributeDef::GetAttributeName(VLXUnicodeString& name)
+{
+  return Call(*this, "VLXKDMAttributeDef::GetAttributeName(VLXUnicodeString&)", AttributeDef_getAttributeName)
+      .returning(name);
+}
+
+long VLXKDMAttributeDef::GetAttributeType(VLXKDMAttributeType::Type& type)
+{
+  return Call(*this, "VLXKDMAttributeDef::GetAttributeType(VLXKDMAttributeType::Type&)", AttributeDef_getAttributeType)
+      .returning(Enum(type));
+}
+
+long VLXKDMAttributeDef::GetUuid(VLXUnicodeString& uuid)
+{
+  return Call(*this, "VLXKDMAttributeDef::GetUuid(VLXUnicodeString&)", AttributeDef_getUuid).returning(uuid);
+}
+
+long VLXKDMAttributeDef::SetUuid(const VLXUnicodeString& uuid)
+{
+  return Call(*this, "VLXKDMAttributeDef::SetUuid(const VLXUnicodeString&)", AttributeDef_setUuid).with(uuid).run();
+}
+
+long VLXKDMAttributeDef::GetQKAComment(VLXUnicodeString& comment)
+{
+  return Call(*this, "VLXKDMAttributeDef::GetQKAComment(VLXUnicodeString&)", AttributeDef_getQKAComment)
+      .returning(comment);
+}
+
+long VLXKDMAttributeDef::SetQKAComment(const VLXUnicodeString& comment)
+{
+  return Call(*this, "VLXKDMAttributeDef::SetQKAComment(const VLXUnicodeString&)", AttributeDef_setQKAComment)
+      .rawConversionCode()
+      .with(comment)
+      .run();
+}
+
+long VLXKDMAttributeDef::GetTargetNames(VLXListOfVLXUnicodeString& names)
+{
+  return Call(*this, "VLXKDMAttributeDef::GetTargetNames(VLXListOfVLXUnicodeString&)", AttributeDef_getTargetNames)
+      .returning(names);
+}
+
+long VLXKDMAttributeDef::SetTargetNames(const VLXListOfVLXUnicodeString& names)
+{
+  return Call(*this, "VLXKDMAttributeDef::SetTargetNames(const VLXListOfVLXUnicodeString&)",
+              AttributeDef_setTargetNames)
+      .rawConversionCode()
+      .with(names)
+      .run();
+}
+
+long VLXKDMAttributeDef::SetTargetNames(int count, ...)
+{
+  va_list args;
+  va_start(args, count);
+  const VLXListValVLXUnicodeString names = GatherTexts(count, args);
+  va_end(args);
+  return SetTargetNames(names);
+}
+
+long VLXKDMAttributeDef::GetTargetRefs(VLXListOfVLXUnicodeString& refs)
+{
+  return Call(*this, "VLXKDMAttributeDef::GetTargetRefs(VLXListOfVLXUnicodeString&)", AttributeDef_getTargetRefs)
+      .returning(refs);
+}
+
+long VLXKDMAttributeDef::SetTargetRefs(const VLXListOfVLXUnicodeString& refs)
+{
+  return Call(*this, "VLXKDMAttributeDef::SetTargetRefs(const VLXListOfVLXUnicodeString&)", AttributeDef_setTargetRefs)
+      .with(refs)
+      .run();
+}
+
+long VLXKDMAttributeDef::SetTargetRefs(int count, ...)
+{
+  va_list args;
+  va_start(args, count);
+  const VLXListValVLXUnicodeString refs = GatherTexts(count, args);
+  va_end(args);
+  return SetTargetRefs(refs);
+}
+
+long VLXKDMAttributeDef::GetAggregationType(VLXKDMAggregationType::Type& type)
+{
+  return Call(*this, "VLXKDMAttributeDef::GetAggregationType(VLXKDMAggregationType::Type&)",
+              AttributeDef_getAggregationType)
+      .returning(Enum(type));
+}
+
+long VLXKDMAttributeDef::SetAggregationType(VLXKDMAggregationType::Type type)
+{
+  return Call(*this, "VLXKDMAttributeDef::SetAggregationType(VLXKDMAggregationType::Type)",
+              AttributeDef_setAggregationType)
+      .with(Enum(type, {"AssertionFailed:agg != NULL", kSource, 139}))
+      .run();
+}
+
+long VLXKDMAttributeDef::GetAccessMode(VLXKDMAccessMode::Mode& mode)
+{
+  return Call(*this, "VLXKDMAttributeDef::GetAccessMode(VLXKDMAccessMode::Mode&)", AttributeDef_getAccessMode)
+      .returning(Enum(mode));
+}
+
+long VLXKDMAttributeDef::SetAccessMode(VLXKDMAccessMode::Mode mode)
+{
+  return Call(*this, "VLXKDMAttributeDef::SetAccessMode(VLXKDMAccessMode::Mode)", AttributeDef_setAccessMode)
+      .with(Enum(mode, {"AssertionFailed:mode != NULL", kSource, 245}))
+      .run();
+}
+
+long VLXKDMAttributeDef::GetSoftwareVisibility(VLXKDMVisibility::Mode& visibility)
+{
+  return Call(*this, "VLXKDMAttributeDef::GetSoftwareVisibility(VLXKDMVisibility::Mode&)",
+              AttributeDef_getSoftwareVisibility)
+      .returning(Enum(visibility));
+}
+
+long VLXKDMAttributeDef::SetSoftwareVisibility(VLXKDMVisibility::Mode visibility)
+{
+  return Call(*this, "VLXKDMAttributeDef::SetSoftwareVisibility(VLXKDMVisibility::Mode)",
+              AttributeDef_setSoftwareVisibility)
+      .with(Enum(visibility, {"AssertionFailed:vis != NULL", kSource, 290}))
+      .run();
+}
+
+long VLXKDMAttributeDef::GetLength(int& length)
+{
+  return Call(*this, "VLXKDMAttributeDef::GetLength(int&)", AttributeDef_getLength).returning(length);
+}
+
+long VLXKDMAttributeDef::SetLength(int length)
+{
+  return Call(*this, "VLXKDMAttributeDef::SetLength(int)", AttributeDef_setLength).with(length).run();
+}
+
+long VLXKDMAttributeDef::IsMandatory(VLXBoolean& isMandatory)
+{
+  return Call(*this, "VLXKDMAttributeDef::IsMandatory(VLXBoolean&)", AttributeDef_isMandatory).returning(isMandatory);
+}
+
+long VLXKDMAttributeDef::SetMandatory(VLXBoolean isMandatory)
+{
+  return Call(*this, "VLXKDMAttributeDef::SetMandatory(VLXBoolean)", AttributeDef_setMandatory).with(isMandatory).run();
+}
+
+long VLXKDMAttributeDef::IsMultiValuated(VLXBoolean& isMultiValuated)
+{
+  return Call(*this, "VLXKDMAttributeDef::IsMultiValuated(VLXBoolean&)", AttributeDef_isMultiValuated)
+      .returning(isMultiValuated);
+}
+
+long VLXKDMAttributeDef::SetMultiValuation(VLXBoolean isMultiValuated)
+{
+  return Call(*this, "VLXKDMAttributeDef::SetMultiValuation(VLXBoolean)", AttributeDef_setMultiValuation)
+      .with(isMultiValuated)
+      .run();
+}
+
+long VLXKDMAttributeDef::IsUnique(VLXBoolean& isUnique)
+{
+  return Call(*this, "VLXKDMAttributeDef::IsUnique(VLXBoolean&)", AttributeDef_isUnique).returning(isUnique);
+}
+
+long VLXKDMAttributeDef::SetUnicity(VLXBoolean isUnique)
+{
+  return Call(*this, "VLXKDMAttributeDef::SetUnicity(VLXBoolean)", AttributeDef_setUnicity).with(isUnique).run();
+}
+
+long VLXKDMAttributeDef::GetClassDef(VLXKDMClassDef& classDef)
+{
+  return Call(*this, "VLXKDMAttributeDef::GetClassDef(VLXKDMClassDef&)", AttributeDef_getClassDef).returning(classDef);
+}
+
+long VLXKDMAttributeDef::ToString(VLXUnicodeString& text)
+{
+  return Call(*this, "VLXKDMAttributeDef::ToString(VLXUnicodeString&)", AttributeDef_toString).returning(text);
+}

@@ -6,3 +6,69 @@
 using namespace corvexa;
 
 VLXKDM_PROXY_DEFINITIONS(VLXKDMAttributeDefList)
+
+long VLXKDMAttributeDefList::GetCount(int& count)
+{
+  return Call(*this, "VLXKDMAttributeDefList::GetCount(int&)", AttributeDefList_getCount).returning(count);
+}
+
+long VLXKDMAttributeDefList::GetItem(int position, VLXKDMAttributeDef& item)
+{
+  return Call(*this, "VLXKDMAttributeDefList::GetItem(int, VLXKDMAttributeDef&)", AttributeDefList_getItemAt)
+      .with(position)
+      .returning(item);
+}
+
+long VLXKDMAttributeDefList::GetItem(const VLXUnicodeString& name, VLXKDMAttributeDef& item)
+{
+  return Call(*this, "VLXKDMAttributeDefList::GetItem(const VLXUnicodeString&, VLXKDMAttributeDef&)",
+              AttributeDefList_getItemNamed)
+      .with(name)
+      .returning(item);
+}
+
+long VLXKDMAttributeDefList::Includes(const VLXUnicodeString& name, VLXBoolean& included)
+{
+  return Call(*this, "VLXKDMAttributeDefList::Includes(const VLXUnicodeString&, VLXBoolean&)",
+              AttributeDefList_includes)
+      .with(name)
+      .returning(included);
+}
+
+long VLXKDMAttributeDefList::IndexOf(const VLXKDMAttributeDef& item, int& position)
+{
+  return Call(*this, "VLXKDMAttributeDefList::IndexOf(const VLXKDMAttributeDef&, int&)", AttributeDefList_indexOf)
+      .with(item)
+      .returning(position);
+}
+
+long VLXKDMAttributeDefList::IndexOf(const VLXUnicodeString& name, int& position)
+{
+  return Call(*this, "VLXKDMAttributeDefList::IndexOf(const VLXUnicodeString&, int&)", AttributeDefList_indexOfNamed)
+      .with(name)
+      .returning(position);
+}
+
+long VLXKDMAttributeDefList::Add(const VLXKDMAttributeDef& item)
+{
+  return Call(*this, "VLXKDMAttributeDefList::Add(const VLXKDMAttributeDef&)", AttributeDefList_add).with(item).run();
+}
+
+long VLXKDMAttributeDefList::Remove(const VLXKDMAttributeDef& item)
+{
+  return Call(*this, "VLXKDMAttributeDefList::Remove(const VLXKDMAttributeDef&)", AttributeDefList_remove)
+      .with(item)
+      .run();
+}
+
+long VLXKDMAttributeDefList::Remove(const VLXUnicodeString& name)
+{
+  return Call(*this, "VLXKDMAttributeDefList::Remove(const VLXUnicodeString&)", AttributeDefList_removeNamed)
+      .with(name)
+      .run();
+}
+
+long VLXKDMAttributeDefList::Remove(int position)
+{
+  return Call(*this, "VLXKDMAttributeDefList::Remove(int)", AttributeDefList_removeAt).with(position).run();
+}

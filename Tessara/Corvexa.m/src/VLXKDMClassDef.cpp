@@ -2,7 +2,170 @@
 
 #include "CallFrame.h"
 #include "ProxyMembers.h"
+#include "Variadic.h"
 
 using namespace corvexa;
 
+namespace {
+const char* const kSource = "Tessara\\Corvexa.m\\src\\VLXKDMClassDef.cpp";
+}
+
 VLXKDM_PROXY_DEFINITIONS(VLXKDMClassDef)
+
+long VLXKDMClassDef::Build(const VLXUnicodeString& name)
+{
+  return Call::Construct(*this, "VLXKDMClassDef::Build(const VLXUnicodeString&)", ClassDef, ClassDef_new_name)
+      .with(name)
+      .construct();
+}
+
+long VLXKDMClassDef::Build()
+{
+  return Call::Construct(*this, "VLXKDMClassDef::Build()", ClassDef, ClassDef_new).construct();
+}
+
+long VLXKDMClassDef::GetClassName(VLXUnicodeString& name)
+{
+  return Call(*this, "VLXKDMClassDef::GetClassName(VLXUnicodeString&)", ClassDef_getClassName).returning(name);
+}
+
+long VLXKDMClassDef::SetClassName(const VLXUnicodeString& name)
+{
+  return Call(*this, "VLXKDMClassDef::SetClassName(const VLXUnicodeString&)", ClassDef_setClassName).with(name).run();
+}
+
+long VLXKDMClassDef::GetSuperName(VLXUnicodeString& name)
+{
+  return Call(*this, "VLXKDMClassDef::GetSuperName(VLXUnicodeString&)", ClassDef_getSuperName).returning(name);
+}
+
+long VLXKDMClassDef::SetSuperName(const VLXUnicodeString& name)
+{
+  return Call(*this, "VLXKDMClassDef::SetSuperName(const VLXUnicodeString&)", ClassDef_setSuperName).with(name).run();
+}
+
+long VLXKDMClassDef::GetUuid(VLXUnicodeString& uuid)
+{
+  return Call(*this, "VLXKDMClassDef::GetUuid(VLXUnicodeString&)", ClassDef_getUuid).returning(uuid);
+}
+
+long VLXKDMClassDef::SetUuid(const VLXUnicodeString& uuid)
+{
+  return Call(*this, "VLXKDMClassDef::SetUuid(const VLXUnicodeString&)", ClassDef_setUuid).with(uuid).run();
+}
+
+long VLXKDMClassDef::GetQKAComment(VLXUnicodeString& comment)
+{
+  return Call(*this, "VLXKDMClassDef::GetQKAComment(VLXUnicodeString&)", ClassDef_getQKAComment).returning(comment);
+}
+
+long VLXKDMClassDef::SetQKAComment(const VLXUnicodeString& comment)
+{
+  return Call(*this, "VLXKDMClassDef::SetQKAComment(const VLXUnicodeString&)", ClassDef_setQKAComment)
+      .with(comment)
+      .run();
+}
+
+long VLXKDMClassDef::GetQKADerivability(VLXUnicodeString& derivability)
+{
+  return Call(*this, "VLXKDMClassDef::GetQKADerivability(VLXUnicodeString&)", ClassDef_getQKADerivability)
+      .returning(derivability);
+}
+
+long VLXKDMClassDef::SetQKADerivability(const VLXUnicodeString& derivability)
+{
+  return Call(*this, "VLXKDMClassDef::SetQKADerivability(const VLXUnicodeString&)", ClassDef_setQKADerivability)
+      .with(derivability)
+      .run();
+}
+
+long VLXKDMClassDef::GetScopeNames(VLXListOfVLXUnicodeString& names)
+{
+  return Call(*this, "VLXKDMClassDef::GetScopeNames(VLXListOfVLXUnicodeString&)", ClassDef_getScopeNames)
+      .returning(names);
+}
+
+long VLXKDMClassDef::SetScopeNames(const VLXListOfVLXUnicodeString& names)
+{
+  return Call(*this, "VLXKDMClassDef::SetScopeNames(const VLXListOfVLXUnicodeString&)", ClassDef_setScopeNames)
+      .with(names)
+      .run();
+}
+
+long VLXKDMClassDef::SetScopeNames(int count, ...)
+{
+  va_list args;
+  va_start(args, count);
+  const VLXListValVLXUnicodeString names = GatherTexts(count, args);
+  va_end(args);
+  return SetScopeNames(names);
+}
+
+long VLXKDMClassDef::IsAbstract(VLXBoolean& isAbstract)
+{
+  return Call(*this, "VLXKDMClassDef::IsAbstract(VLXBoolean&)", ClassDef_isAbstract).returning(isAbstract);
+}
+
+long VLXKDMClassDef::SetAbstract(VLXBoolean isAbstract)
+{
+  return Call(*this, "VLXKDMClassDef::SetAbstract(VLXBoolean)", ClassDef_setAbstract).with(isAbstract).run();
+}
+
+long VLXKDMClassDef::IsExtensible(VLXBoolean& isExtensible)
+{
+  return Call(*this, "VLXKDMClassDef::IsExtensible(VLXBoolean&)", ClassDef_isExtensible).returning(isExtensible);
+}
+
+long VLXKDMClassDef::SetExtensibility(VLXBoolean isExtensible)
+{
+  return Call(*this, "VLXKDMClassDef::SetExtensibility(VLXBoolean)", ClassDef_setExtensibility)
+      .with(isExtensible)
+      .run();
+}
+
+long VLXKDMClassDef::IsPersistent(VLXBoolean& isPersistent)
+{
+  return Call(*this, "VLXKDMClassDef::IsPersistent(VLXBoolean&)", ClassDef_isPersistent).returning(isPersistent);
+}
+
+long VLXKDMClassDef::SetPersistency(VLXBoolean isPersistent)
+{
+  return Call(*this, "VLXKDMClassDef::SetPersistency(VLXBoolean)", ClassDef_setPersistency).with(isPersistent).run();
+}
+
+long VLXKDMClassDef::GetClassType(VLXKDMClassType::Type& type)
+{
+  return Call(*this, "VLXKDMClassDef::GetClassType(VLXKDMClassType::Type&)", ClassDef_getClassType)
+      .returning(Enum(type));
+}
+
+long VLXKDMClassDef::SetClassType(VLXKDMClassType::Type type)
+{
+  return Call(*this, "VLXKDMClassDef::SetClassType(VLXKDMClassType::Type)", ClassDef_setClassType)
+      .with(Enum(type, {"AssertionFailed:type != NULL", kSource, 341}))
+      .run();
+}
+
+long VLXKDMClassDef::GetSoftwareVisibility(VLXKDMVisibility::Mode& visibility)
+{
+  return Call(*this, "VLXKDMClassDef::GetSoftwareVisibility(VLXKDMVisibility::Mode&)", ClassDef_getSoftwareVisibility)
+      .returning(Enum(visibility));
+}
+
+long VLXKDMClassDef::SetSoftwareVisibility(VLXKDMVisibility::Mode visibility)
+{
+  return Call(*this, "VLXKDMClassDef::SetSoftwareVisibility(VLXKDMVisibility::Mode)", ClassDef_setSoftwareVisibility)
+      .with(Enum(visibility, {"AssertionFailed:vis != NULL", kSource, 211}))
+      .run();
+}
+
+long VLXKDMClassDef::GetAttributes(VLXKDMAttributeDefList& attributes)
+{
+  return Call(*this, "VLXKDMClassDef::GetAttributes(VLXKDMAttributeDefList&)", ClassDef_getAttributes)
+      .returning(attributes);
+}
+
+long VLXKDMClassDef::ToString(VLXUnicodeString& text)
+{
+  return Call(*this, "VLXKDMClassDef::ToString(VLXUnicodeString&)", ClassDef_toString).returning(text);
+}

@@ -2,6 +2,7 @@
 
 #include "CallFrame.h"
 #include "ProxyMembers.h"
+#include "VLXJBXJNIUtilities.h"
 
 using namespace corvexa;
 
@@ -60,4 +61,168 @@ long VLXKDMReplica::GetAttributeDef(const VLXUnicodeString& attributeName, VLXKD
               Replica_getAttributeDef)
       .with(attributeName)
       .returning(attributeDef);
+}
+
+// ---- Documents -------------------------------------------------------------------------------
+
+long VLXKDMReplica::SetSchemaLocation(const VLXUnicodeString& location)
+{
+  return Call::Static("VLXKDMReplica::SetSchemaLocation(const VLXUnicodeString&)", Replica, Replica_setSchemaLocation)
+      .with(location)
+      .run();
+}
+
+long VLXKDMReplica::GetSchemaLocation(VLXUnicodeString& location)
+{
+  return Call(*this, "VLXKDMReplica::GetSchemaLocation(VLXUnicodeString&)", Replica_getSchemaLocation)
+      .returning(location);
+}
+
+long VLXKDMReplica::SetFeature(const VLXUnicodeString& name, VLXBoolean value)
+{
+  return Call::Static("VLXKDMReplica::SetFeature(const VLXUnicodeString&, VLXBoolean)", Replica, Replica_setFeature)
+      .with(name, value)
+      .run();
+}
+
+long VLXKDMReplica::InsertSchemaFile(const VLXUnicodeString& path)
+{
+  return Call(*this, "VLXKDMReplica::InsertSchemaFile(const VLXUnicodeString&)", Replica_insertSchemaFile)
+      .with(path)
+      .run();
+}
+
+long VLXKDMReplica::InsertSchemaString(const VLXUnicodeString& xsd)
+{
+  return Call(*this, "VLXKDMReplica::InsertSchemaString(const VLXUnicodeString&)", Replica_insertSchemaString)
+      .with(xsd)
+      .run();
+}
+
+long VLXKDMReplica::PopulatesFromXmlFile(const VLXUnicodeString& path)
+{
+  return Call(*this, "VLXKDMReplica::PopulatesFromXmlFile(const VLXUnicodeString&)", Replica_populatesFromXmlFile)
+      .with(path)
+      .run();
+}
+
+long VLXKDMReplica::PopulatesFromXmlString(const VLXUnicodeString& xml)
+{
+  return Call(*this, "VLXKDMReplica::PopulatesFromXmlString(const VLXUnicodeString&)", Replica_populatesFromXmlString)
+      .with(xml)
+      .run();
+}
+
+long VLXKDMReplica::ReadFromXmlFile(const VLXUnicodeString& path, VLXKDMReplica& replica)
+{
+  return Call::Static("VLXKDMReplica::ReadFromXmlFile(const VLXUnicodeString&, VLXKDMReplica&)", Replica,
+                      Replica_readFromXmlFile)
+      .with(path)
+      .returning(replica);
+}
+
+long VLXKDMReplica::ReadFromXmlString(const VLXUnicodeString& xml, VLXKDMReplica& replica)
+{
+  return Call::Static("VLXKDMReplica::ReadFromXmlString(const VLXUnicodeString&, VLXKDMReplica&)", Replica,
+                      Replica_readFromXmlString)
+      .with(xml)
+      .returning(replica);
+}
+
+long VLXKDMReplica::GetXml(VLXBoolean withSchema, VLXUnicodeString& xml)
+{
+  return Call(*this, "VLXKDMReplica::GetXml(VLXBoolean, VLXUnicodeString&)", Replica_getXml)
+      .with(withSchema)
+      .returning(xml);
+}
+
+long VLXKDMReplica::GetXml(VLXBoolean withSchema, VLXBoolean withState, VLXUnicodeString& xml)
+{
+  return Call(*this, "VLXKDMReplica::GetXml(VLXBoolean, VLXBoolean, VLXUnicodeString&)", Replica_getXmlWithState)
+      .with(withSchema, withState)
+      .returning(xml);
+}
+
+long VLXKDMReplica::GetXsd(VLXUnicodeString& xsd)
+{
+  return Call(*this, "VLXKDMReplica::GetXsd(VLXUnicodeString&)", Replica_getXsd).returning(xsd);
+}
+
+long VLXKDMReplica::GetBinaryFromReplica(const VLXKDMReplica& replica, VLXBoolean compressed, VLXBinary& bytes)
+{
+  return Call::Static("VLXKDMReplica::GetBinaryFromReplica(const VLXKDMReplica&, VLXBoolean, VLXBinary&)", Replica,
+                      Replica_getBinaryFromReplica)
+      .with(replica, compressed)
+      .returning(bytes);
+}
+
+long VLXKDMReplica::GetReplicaFromBinary(const VLXBinary& bytes, VLXBoolean compressed, VLXKDMReplica& replica)
+{
+  return Call::Static("VLXKDMReplica::GetReplicaFromBinary(const VLXBinary&, VLXBoolean, VLXKDMReplica&)", Replica,
+                      Replica_getReplicaFromBinary)
+      .with(bytes, compressed)
+      .returning(replica);
+}
+
+// ---- Exchange with Java ------------------------------------------------------------------------
+// These run on a Java thread that called native code: they end with the bridge's Java error
+// handling instead of the error translation, and the references they hand out belong to the
+// calling Java frame.
+
+long VLXKDMReplica::BuildFromJavaType(JNIEnv* env, jobject replica)
+{
+  exchangedWithJava = 1;
+  return SetGlobalRef(env, replica);
+}
+
+long VLXKDMReplica::ConvertToJavaType(JNIEnv* env, jobject& replica)
+{
+  const char* const name = "VLXKDMReplica::ConvertToJavaType(JNIEnv*, jobject&)";
+  long status = VLX_S_OK;
+  if (!FrameAccess::StartJavaFacing(env, name, status)) return status;
+  exchangedWithJava = 1;
+  replica = VLXJBXJNIHelper::NewLocalRef(env, GetHandle());
+  return VLXJBXJNIUtilities::HandleJavaError(env, status, name, nullptr, 0);
+}
+
+long VLXKDMReplica::BuildFromJavaHolder(JNIEnv* env, jobject holder)
+{
+  const char* const name = "VLXKDMReplica::BuildFromJavaHolder(JNIEnv*, jobject)";
+  long status = VLX_S_OK;
+  const ReplicaStubs* st = FrameAccess::StartJavaFacing(env, name, status);
+  if (!st) return status;
+  const LocalRef replica(env, VLXJBXJNIHelper::CallObjectMethod(env, holder, st->Method(ReplicaHolder_getValue)));
+  if (VLXJBXJNIHelper::ExceptionCheck(env)) {
+    status = VLX_E_FAIL;
+  } else {
+    exchangedWithJava = 1;
+    status = SetGlobalRef(env, replica.get());
+  }
+  return VLXJBXJNIUtilities::HandleJavaError(env, status, name, nullptr, 0);
+}
+
+long VLXKDMReplica::ConvertToJavaHolder(JNIEnv* env, jobject& holder)
+{
+  const char* const name = "VLXKDMReplica::ConvertToJavaHolder(JNIEnv*, jobject&)";
+  long status = VLX_S_OK;
+  const ReplicaStubs* st = FrameAccess::StartJavaFacing(env, name, status);
+  if (!st) return status;
+
+  // A holder made here is handed out only when it holds the replica.
+  LocalRef created(env, holder ? nullptr
+                               : VLXJBXJNIHelper::NewObject(env, st->Class(ReplicaHolder), st->Method(ReplicaHolder_new)));
+  const jobject target = holder ? holder : created.get();
+  if (!target) return VLXJBXJNIUtilities::HandleJavaError(env, VLX_E_FAIL, name, nullptr, 0);
+
+  status = VLX_E_FAIL;
+  jobject replica = nullptr;
+  if (ConvertToJavaType(env, replica) >= 0) {
+    const LocalRef owned(env, replica);
+    VLXJBXJNIHelper::CallVoidMethod(env, target, st->Method(ReplicaHolder_setValue), replica);
+    if (!VLXJBXJNIHelper::ExceptionCheck(env)) {
+      if (!holder) holder = created.release();
+      status = VLX_S_OK;
+    }
+  }
+  return VLXJBXJNIUtilities::HandleJavaError(env, status, name, nullptr, 0);
 }

@@ -1,0 +1,151 @@
+// The schema enumerations: every enumerator set and read back, null answers, values out of range.
+#include <functional>
+#include <string>
+#include <vector>
+
+#include <gtest/gtest.h>
+
+#include "JavaTestSupport.h"
+#include "VLXKDMAttributeDef.h"
+#include "VLXKDMClassDef.h"
+
+using namespace corvexa_test;
+
+namespace {
+
+const char* const kNullAttributeDef = "com/velmora/tessara/testdoubles/NullSchema$AttributeDef";
+const char* const kNullClassDef = "com/velmora/tessara/testdoubles/NullSchema$ClassDefinition";
+const char* const kAttributeDefSource = "Tessara\\Corvexa.m\\src\\VLXKDMAttributeDef.cpp";
+const char* const kClassDefSource = "Tessara\\Corvexa.m\\src\\VLXKDMClassDef.cpp";
+
+// Sets each enumerator through the setter and reads it back through the getter.
+template <class E, class Proxy>
+void RoundTrip(Proxy& proxy, int count, long (Proxy::*set)(E), long (Proxy::*get)(E&))
+{
+  for (int value = 0; value < count; ++value) {
+    SCOPED_TRACE(value);
+    ASSERT_EQ(VLX_S_OK, (proxy.*set)(static_cast<E>(value)));
+    E back = static_cast<E>(count - 1 - value);
+    ASSERT_EQ(VLX_S_OK, (proxy.*get)(back));
+    EXPECT_EQ(value, static_cast<int>(back));
+  }
+}
+
+TEST(Enumerations, EveryEnumeratorCrossesBothWays)
+{
+  VLXKDMAttributeDef attribute;
+  ASSERT_EQ(VLX_S_OK, attribute.Build(VLXUnicodeString("weight"), VLXKDMAttributeType::Double));
+  RoundTrip<VLXKDMAccessMode::Mode>(attribute, 3, &VLXKDMAttributeDef::SetAccessMode, &VLXKDMAttributeDef::GetAccessMode);
+  RoundTrip<VLXKDMAggregationType::Type>(attribute, 2, &VLXKDMAttributeDef::SetAggregationType,
+                                         &VLXKDMAttributeDef::GetAggregationType);
+  RoundTrip<VLXKDMVisibility::Mode>(attribute, 3, &VLXKDMAttributeDef::SetSoftwareVisibility,
+                                    &VLXKDMAttributeDef::GetSoftwareVisibility);
+
+  VLXKDMClassDef classDef;
+  ASSERT_EQ(VLX_S_OK, classDef.Build(VLXUnicodeString("Part")));
+  RoundTrip<VLXKDMClassType::Type>(classDef, 2, &VLXKDMClassDef::SetClassType, &VLXKDMClassDef::GetClassType);
+  RoundTrip<VLXKDMVisibility::Mode>(classDef, 3, &VLXKDMClassDef::SetSoftwareVisibility,
+                                    &VLXKDMClassDef::GetSoftwareVisibility);
+
+  // The attribute type is fixed when the definition is built.
+  for (int type = 0; type <= VLXKDMAttributeType::Relationship; ++type) {
+    SCOPED_TRACE(type);
+    VLXKDMAttributeDef typed;
+    ASSERT_EQ(VLX_S_OK, typed.Build(VLXUnicodeString("a"), static_cast<VLXKDMAttributeType::Type>(type)));
+    VLXKDMAttributeType::Type back = VLXKDMAttributeType::Relationship;
+    if (type == VLXKDMAttributeType::Relationship) back = VLXKDMAttributeType::Integer;
+    ASSERT_EQ(VLX_S_OK, typed.GetAttributeType(back));
+    EXPECT_EQ(type, back);
+  }
+}
+
+TEST(Enumerations, NullAnswersGiveTheDefaultsButLeaveTheAggregationAlone)
+{
+  VLXKDMAttributeDef attribute;
+  AttachNew(attribute, kNullAttributeDef);
+  VLXKDMAttributeType::Type type = VLXKDMAttributeType::Binary;
+  EXPECT_EQ(VLX_S_OK, attribute.GetAttributeType(type));
+  EXPECT_EQ(VLXKDMAttributeType::String, type);
+  VLXKDMAccessMode::Mode mode = VLXKDMAccessMode::ReadWrite;
+  EXPECT_EQ(VLX_S_OK, attribute.GetAccessMode(mode));
+  EXPECT_EQ(VLXKDMAccessMode::Read, mode);
+  VLXKDMVisibility::Mode visibility = VLXKDMVisibility::Private;
+  EXPECT_EQ(VLX_S_OK, attribute.GetSoftwareVisibility(visibility));
+  EXPECT_EQ(VLXKDMVisibility::Public, visibility);
+  VLXKDMAggregationType::Type aggregation = VLXKDMAggregationType::Shared;
+  EXPECT_EQ(VLX_S_OK, attribute.GetAggregationType(aggregation));
+  EXPECT_EQ(VLXKDMAggregationType::Shared, aggregation);
+
+  VLXKDMClassDef classDef;
+  AttachNew(classDef, kNullClassDef);
+  VLXKDMClassType::Type classType = VLXKDMClassType::Extension;
+  EXPECT_EQ(VLX_S_OK, classDef.GetClassType(classType));
+  EXPECT_EQ(VLXKDMClassType::Class, classType);
+  visibility = VLXKDMVisibility::Protected;
+  EXPECT_EQ(VLX_S_OK, classDef.GetSoftwareVisibility(visibility));
+  EXPECT_EQ(VLXKDMVisibility::Public, visibility);
+
+  // Object getters attach the null answer: the out-proxy is detached.
+  VLXKDMAttributeDefList attributes;
+  ASSERT_EQ(VLX_S_OK, attributes.SetHandle(Env(), classDef.GetHandle()));
+  EXPECT_EQ(VLX_S_OK, classDef.GetAttributes(attributes));
+  EXPECT_EQ(nullptr, attributes.GetHandle());
+  VLXKDMClassDef owner(classDef);
+  EXPECT_EQ(VLX_S_OK, attribute.GetClassDef(owner));
+  EXPECT_EQ(nullptr, owner.GetHandle());
+}
+
+struct OutOfRange {
+  const char* what;
+  std::function<long()> call;
+  const char* message;
+  const char* file;
+  int line;
+};
+
+TEST(Enumerations, ValuesOutOfRangeAreReportedAndNeverReachJava)
+{
+  VLXKDMAttributeDef attribute;
+  AttachNew(attribute, kNullAttributeDef);
+  VLXKDMClassDef classDef;
+  AttachNew(classDef, kNullClassDef);
+  VLXKDMAttributeDef built;
+  const std::vector<OutOfRange> cases = {
+      {"SetAccessMode(3)", [&] { return attribute.SetAccessMode(static_cast<VLXKDMAccessMode::Mode>(3)); },
+       "AssertionFailed:mode != NULL", kAttributeDefSource, 245},
+      {"SetAggregationType(-1)", [&] { return attribute.SetAggregationType(static_cast<VLXKDMAggregationType::Type>(-1)); },
+       "AssertionFailed:agg != NULL", kAttributeDefSource, 139},
+      {"AttributeDef SetSoftwareVisibility(3)",
+       [&] { return attribute.SetSoftwareVisibility(static_cast<VLXKDMVisibility::Mode>(3)); },
+       "AssertionFailed:vis != NULL", kAttributeDefSource, 290},
+      {"SetClassType(2)", [&] { return classDef.SetClassType(static_cast<VLXKDMClassType::Type>(2)); },
+       "AssertionFailed:type != NULL", kClassDefSource, 341},
+      {"ClassDef SetSoftwareVisibility(7)",
+       [&] { return classDef.SetSoftwareVisibility(static_cast<VLXKDMVisibility::Mode>(7)); },
+       "AssertionFailed:vis != NULL", kClassDefSource, 211},
+      {"Build(name, 7)", [&] { return built.Build(VLXUnicodeString("x"), static_cast<VLXKDMAttributeType::Type>(7)); },
+       "AssertionFailed:type != NULL", kAttributeDefSource, 41},
+  };
+  for (const OutOfRange& c : cases) {
+    SCOPED_TRACE(c.what);
+    FatalRecorder recorder;
+    const long rc = c.call();
+    EXPECT_LT(rc, 0);
+    ASSERT_EQ(1u, FatalRecorder::Reports().size());
+    EXPECT_EQ(c.message, FatalRecorder::Reports()[0].message);
+    EXPECT_EQ(c.file, FatalRecorder::Reports()[0].file);
+    EXPECT_EQ(c.line, FatalRecorder::Reports()[0].line);
+    EXPECT_NE(std::string::npos, PeekLastError().text.find("none of its enumerators")) << PeekLastError().text;
+  }
+  EXPECT_EQ(0, IntField(attribute.GetHandle(), "setterCalls"));
+  EXPECT_EQ(0, IntField(classDef.GetHandle(), "setterCalls"));
+  EXPECT_EQ(nullptr, built.GetHandle());
+
+  // The type is mapped before the name is converted: a bad type is reported even with a bad name.
+  FatalRecorder recorder;
+  const long raw = built.Build(VLXUnicodeString("bad \xC3"), static_cast<VLXKDMAttributeType::Type>(9));
+  EXPECT_EQ(1u, FatalRecorder::Reports().size());
+  EXPECT_LT(raw, 0);
+}
+
+}  // namespace
