@@ -1,0 +1,142 @@
+package com.velmora.tessara.kdmreplica;
+
+import static com.velmora.tessara.kdmreplica.Fx.addAttr;
+import static com.velmora.tessara.kdmreplica.Fx.addClass;
+import static com.velmora.tessara.kdmreplica.Fx.throwsWith;
+import static org.junit.jupiter.api.Assertions.assertArrayEquals;
+import static org.junit.jupiter.api.Assertions.assertEquals;
+import static org.junit.jupiter.api.Assertions.assertFalse;
+import static org.junit.jupiter.api.Assertions.assertNull;
+import static org.junit.jupiter.api.Assertions.assertSame;
+import static org.junit.jupiter.api.Assertions.assertTrue;
+
+import com.velmora.tessara.ReplicaHolder;
+import java.util.Date;
+import java.util.List;
+import org.junit.jupiter.api.Test;
+import org.junit.jupiter.api.function.Executable;
+
+/** Process-wide features and schema location, text forms, definition properties, the holder. */
+class FeaturesTest {
+
+    @Test
+    void featuresHaveDefaultsAndUnknownNamesListTheKnownOnes() {
+        assertFalse(Replica.getFeature("validate"));
+        assertTrue(Replica.getFeature("indent"));
+        try {
+            Replica.setFeature("validate", true);
+            Replica.setFeature("indent", false);
+            assertTrue(Replica.getFeature("validate"));
+            assertFalse(Replica.getFeature("indent"));
+        } finally {
+            Replica.setFeature("validate", false);
+            Replica.setFeature("indent", true);
+        }
+        throwsWith(IllegalArgumentException.class, () -> Replica.setFeature("Indent", true), "'Indent'",
+                "validate, indent");
+        throwsWith(IllegalArgumentException.class, () -> Replica.setFeature(null, true), "null", "validate");
+    }
+
+    @Test
+    void schemaLocationIsTakenWhenAReplicaIsCreated() {
+        try {
+            Replica.setSchemaLocation("first.xsd");
+            Replica a = new Replica("a");
+            Replica.setSchemaLocation("second.xsd");
+            assertEquals("first.xsd", a.getSchemaLocation());
+            assertEquals("second.xsd", new Replica("b").getSchemaLocation());
+            Replica.setSchemaLocation(null);
+            assertEquals("", new Replica("c").getSchemaLocation());
+        } finally {
+            Replica.setSchemaLocation(null);
+        }
+    }
+
+    @Test
+    void documentMembersSayThatTheyAreNotWrittenYet() {
+        Replica r = new Replica("docs");
+        List<Object[]> calls = List.of(
+                new Object[] {"insertSchemaString", (Executable) () -> r.insertSchemaString("<x/>")},
+                new Object[] {"insertSchemaFile", (Executable) () -> r.insertSchemaFile("x.xsd")},
+                new Object[] {"populatesFromXmlString", (Executable) () -> r.populatesFromXmlString("<x/>")},
+                new Object[] {"populatesFromXmlFile", (Executable) () -> r.populatesFromXmlFile("x.xml")},
+                new Object[] {"readFromXmlString", (Executable) () -> Replica.readFromXmlString("<x/>")},
+                new Object[] {"readFromXmlFile", (Executable) () -> Replica.readFromXmlFile("x.xml")},
+                new Object[] {"getXsd", (Executable) r::getXsd},
+                new Object[] {"getXml", (Executable) () -> r.getXml(true, true)},
+                new Object[] {"getXml", (Executable) () -> r.getXml(false)},
+                new Object[] {"getBinaryFromReplica", (Executable) () -> Replica.getBinaryFromReplica(r, false)},
+                new Object[] {"getReplicaFromBinary", (Executable) () -> Replica.getReplicaFromBinary(new byte[0], true)});
+        for (Object[] c : calls) {
+            throwsWith(UnsupportedOperationException.class, (Executable) c[1], "Replica." + c[0] + " is not implemented");
+        }
+    }
+
+    @Test
+    void textFormsNameTheirObject() {
+        Replica r = new Replica("shop");
+        Model part = addClass(r, "Part", null);
+        AttributeDef name = addAttr(part, "name", AttributeType.String, false);
+        name.setMandatory(true);
+        name.setLength(20);
+        addAttr(part, "made", AttributeType.Date, false);
+        addAttr(part, "sizes", AttributeType.Integer, true);
+        addAttr(part, "blob", AttributeType.Binary, false);
+        Model bolt = addClass(r, "Bolt", "Part");
+        Instance p = part.createInstance();
+        p.setID("p\"1");
+        p.setValue("name", "nut\n");
+        p.setValue("made", new Date(0));
+        p.setValue("sizes", new int[] {1, 2});
+        p.setValue("blob", new byte[] {10, -1});
+        Instance b = bolt.createInstance();
+
+        assertEquals("Replica 'shop' (2 classes, 2 instances)", r.toString());
+        assertEquals("ModelSet of replica 'shop' [Part, Bolt]", r.getModels().toString());
+        assertEquals("Model 'Part' (1 instances) in replica 'shop'", part.toString());
+        assertEquals("ClassDef 'Bolt' extends 'Part' (0 own attributes, 4 in all)", bolt.getClassDef().toString());
+        assertEquals("AttributeDefList of 'Part' [name, made, sizes, blob]", part.getClassDef().getAttributes().toString());
+        assertEquals("AttributeDef 'Part.name' String mandatory length=20", name.toString());
+        assertEquals("InstanceSet of 'Part' (1 instances)", part.getInstances().toString());
+        assertEquals("Instance Part[id=\"p\\\"1\"] created", p.toString());
+        assertEquals("Instance Part[id=\"p\\\"1\"] created {name=\"nut\\n\", made=1970-01-01T00:00:00Z, "
+                + "sizes=[1, 2], blob=0x0aff}", p.toString(true));
+        assertEquals("Instance Bolt[#0] created {}", b.toString(true));
+        assertEquals("ReplicaHolder[Replica 'shop' (2 classes, 2 instances)]", new ReplicaHolder(r).toString());
+    }
+
+    @Test
+    void definitionPropertiesAreStoredAndCopied() {
+        ClassDef c = new ClassDef("Part");
+        String[] scopes = {"a", "b"};
+        c.setScopeNames(scopes);
+        scopes[0] = "z";
+        c.getScopeNames()[1] = "z";
+        assertArrayEquals(new String[] {"a", "b"}, c.getScopeNames());
+        c.setScopeNames(null);
+        assertEquals(0, c.getScopeNames().length);
+        c.setQKAComment(null);
+        assertEquals("", c.getQKAComment());
+        throwsWith(IllegalArgumentException.class, () -> c.setScopeNames(new String[] {"a", null}), "element 1");
+        throwsWith(IllegalArgumentException.class, () -> c.setClassType(null), "'Part'", "class type is null");
+
+        AttributeDef a = new AttributeDef("ref", AttributeType.Relationship);
+        String[] refs = {"r1"};
+        a.setTargetRefs(refs);
+        refs[0] = "x";
+        assertArrayEquals(new String[] {"r1"}, a.getTargetRefs());
+        assertEquals(AggregationType.Shared, a.getAggregationType());
+        assertNull(a.getClassDef());
+    }
+
+    @Test
+    void holderHoldsOneReplica() {
+        ReplicaHolder h = new ReplicaHolder();
+        assertNull(h.getValue());
+        Replica r = new Replica();
+        h.setValue(r);
+        assertSame(r, h.getValue());
+        h.setValue(null);
+        assertEquals("ReplicaHolder[empty]", h.toString());
+    }
+}
