@@ -33,6 +33,12 @@ public class Instance {
     byte state;
     /** Position in the model's instance set, or -1 when not in it. */
     int pos = -1;
+    /**
+     * The layout of a deleted instance that its model no longer tracks (never committed, or
+     * forgotten by a commit): such an instance is not realigned any more and keeps the attributes
+     * it had when it left. null while the model tracks the instance.
+     */
+    AttributeDef[] frozen;
 
     /** A detached instance of no class (see the class comment). */
     public Instance() {
@@ -69,11 +75,30 @@ public class Instance {
         return "instance " + describe();
     }
 
+    /** Leaves the model's tracking: keeps the current layout (caller holds the write lock). */
+    void forget() {
+        if (model != null) {
+            frozen = model.alignedTo;
+        }
+    }
+
+    private AttributeDef[] layout() {
+        AttributeDef[] f = frozen;
+        return f != null ? f : model == null ? new AttributeDef[0] : model.alignedTo;
+    }
+
     private int position(String name) {
         if (name == null) {
             throw new IllegalArgumentException(who() + ": attribute name is null");
         }
-        int p = model == null ? -1 : model.classDef.positionOf(name);
+        int p = -1;
+        if (frozen != null) {
+            for (int i = 0; i < frozen.length && p < 0; i++) {
+                p = frozen[i].name.equals(name) ? i : -1;
+            }
+        } else if (model != null) {
+            p = model.classDef.positionOf(name);
+        }
         if (p < 0) {
             throw new IllegalArgumentException(who() + ": class '" + (model == null ? "(none)" : model.classDef.name)
                     + "' has no attribute '" + name + "'");
@@ -197,7 +222,7 @@ public class Instance {
 
     private void store(int p, Object value) {
         checkWritable();
-        AttributeDef def = model.classDef.layout[p];
+        AttributeDef def = model.alignedTo[p];
         if (def.accessMode == AccessMode.Read) {
             throw new IllegalStateException(who() + ": attribute '" + def.qualifiedName()
                     + "' is read-only (access mode Read)");
@@ -288,7 +313,7 @@ public class Instance {
             if (withValues) {
                 b.append(" {");
                 boolean first = true;
-                AttributeDef[] layout = model == null ? new AttributeDef[0] : model.classDef.layout;
+                AttributeDef[] layout = layout();
                 for (int i = 0; i < values.length; i++) {
                     if (values[i] != null) {
                         b.append(first ? "" : ", ").append(layout[i].name).append('=');

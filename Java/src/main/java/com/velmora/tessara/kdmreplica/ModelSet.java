@@ -183,7 +183,7 @@ public class ModelSet {
             }
         }
         replica.removeInstances(m.instances.snapshot());
-        m.deleted = null;
+        Replica.forget(m);
         m.ids = null;
         items.remove(position);
         byName.remove(c.name);

@@ -262,7 +262,9 @@ public class Replica {
                 }
                 boolean created = (x.state & Instance.CREATED) != 0;
                 x.state = Instance.DELETED;
-                if (!created) {
+                if (created) {
+                    x.forget();
+                } else {
                     if (m.deleted == null) {
                         m.deleted = new ArrayList<>();
                     }
@@ -343,10 +345,20 @@ public class Replica {
                 for (int k = 0; k < s.count; k++) {
                     s.items[k].state = 0;
                 }
-                m.deleted = null;
+                forget(m);
             }
         } finally {
             l.unlock();
+        }
+    }
+
+    /** Forgets the deleted instances of a model (caller holds the write lock). */
+    static void forget(Model m) {
+        if (m.deleted != null) {
+            for (Instance x : m.deleted) {
+                x.forget();
+            }
+            m.deleted = null;
         }
     }
 

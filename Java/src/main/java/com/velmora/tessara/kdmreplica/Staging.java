@@ -164,6 +164,7 @@ final class Staging implements AutoCloseable {
         Map<Model, Set<Instance>> byModel = new IdentityHashMap<>();
         for (Instance x : addedInstances) {
             Model m = x.model;
+            x.forget();
             if ((x.state & Instance.DELETED) != 0) {
                 m.deleted.remove(x);
                 continue;

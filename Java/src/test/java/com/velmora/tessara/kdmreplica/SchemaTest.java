@@ -70,6 +70,29 @@ class SchemaTest {
     }
 
     @Test
+    void forgottenDeletedInstancesKeepTheAttributesTheyLeftWith() {
+        Instance fresh = part.createInstance();
+        fresh.setValue("weight", 3.0);
+        Instance committed = part.createInstance();
+        committed.setValue("weight", 4.0);
+        r.commit();
+        part.getInstances().remove(committed);
+        r.commit(); // forgotten now
+        Instance neverCommitted = part.createInstance();
+        neverCommitted.setValue("weight", 5.0);
+        part.getInstances().remove(neverCommitted);
+        part.getInstances().remove(fresh);
+        r.commit();
+
+        part.getClassDef().getAttributes().remove("name");
+        addAttr(part, "colour", AttributeType.String, false);
+        assertEquals(4.0, committed.getValue("weight"));
+        assertEquals(5.0, neverCommitted.getValue(1));
+        throwsWith(IllegalArgumentException.class, () -> neverCommitted.getValue("colour"), "'colour'");
+        assertEquals("Instance Part[deleted] deleted {weight=5.0}", neverCommitted.toString(true));
+    }
+
+    @Test
     void changingTheSuperClassRealignsInstances() {
         Model base = addClass(r, "Base", null);
         addAttr(base, "uid", AttributeType.Integer, false);

@@ -1,0 +1,193 @@
+package com.velmora.tessara.kdmreplica;
+
+import static com.velmora.tessara.kdmreplica.Fx.addAttr;
+import static com.velmora.tessara.kdmreplica.Fx.addClass;
+import static org.junit.jupiter.api.Assertions.assertEquals;
+import static org.junit.jupiter.api.Assertions.assertFalse;
+import static org.junit.jupiter.api.Assertions.assertSame;
+import static org.junit.jupiter.api.Assertions.assertTrue;
+
+import java.util.ArrayList;
+import java.util.List;
+import java.util.Random;
+import java.util.concurrent.ConcurrentLinkedQueue;
+import java.util.concurrent.CountDownLatch;
+import java.util.concurrent.ExecutorService;
+import java.util.concurrent.Executors;
+import java.util.concurrent.Future;
+import java.util.concurrent.TimeUnit;
+import java.util.concurrent.atomic.AtomicInteger;
+import org.junit.jupiter.api.Test;
+
+/**
+ * 8 threads read and 2 write one replica for a fixed number of operations (writers also change
+ * the schema under the readers). The only exceptions allowed are the documented answers to a
+ * race lost: a position that went out of range, an attribute that is gone, an instance deleted
+ * by the other writer. Afterwards the replica must be consistent.
+ */
+class ThreadsTest {
+    private static final int READERS = 8;
+    private static final int WRITERS = 2;
+    private static final int READ_OPS = 20_000;
+    private static final int WRITE_OPS = 3_000;
+    private static final int INITIAL = 200;
+
+    private final ConcurrentLinkedQueue<Throwable> unexpected = new ConcurrentLinkedQueue<>();
+    private final AtomicInteger created = new AtomicInteger();
+    private final AtomicInteger removed = new AtomicInteger();
+    private final AtomicInteger racesLost = new AtomicInteger();
+
+    /** Documented: exact exception classes with this package's messages (a raw AIOOBE would be a bug). */
+    private void check(RuntimeException e) {
+        Class<?> c = e.getClass();
+        String m = String.valueOf(e.getMessage());
+        boolean ours = m.startsWith("instance ") || m.startsWith("instance set of class ")
+                || m.startsWith("attribute list of class ") || m.startsWith("replica ");
+        if ((c == IndexOutOfBoundsException.class || c == IllegalArgumentException.class
+                || c == IllegalStateException.class) && ours) {
+            racesLost.incrementAndGet();
+        } else {
+            unexpected.add(e);
+        }
+    }
+
+    private void read(Replica r, Model part, Random rnd) {
+        InstanceSet set = part.getInstances();
+        int n = set.getCount();
+        if (n > 0) {
+            Instance x = set.getItem(rnd.nextInt(n));
+            Object v = x.getValue("n");
+            if (v != null && !(v instanceof Integer)) {
+                unexpected.add(new AssertionError("n holds a " + v.getClass()));
+            }
+            x.toString(true);
+            if (x.isValuated("tags")) {
+                assertEquals(2, ((String[]) x.getValue("tags")).length);
+            }
+            Object ref = x.getValue("ref");
+            if (ref != null) {
+                ((Instance) ref).getID();
+            }
+            if (rnd.nextInt(10) == 0) {
+                x.getValue("extra"); // may be gone
+            }
+        }
+        if (rnd.nextInt(50) == 0) {
+            r.toString();
+            r.getAttributeDef("Part.n");
+            part.getClassDef().getAttributes().getItem(rnd.nextInt(4));
+        }
+    }
+
+    private void write(int w, Replica r, Model part, Random rnd, int op) {
+        InstanceSet set = part.getInstances();
+        int choice = rnd.nextInt(10);
+        if (choice < 5) {
+            Instance x = part.createInstance();
+            created.incrementAndGet();
+            x.setID("w" + w + "-" + op);
+            x.setValue("n", op);
+            x.setValue("tags", new String[] {"a", "b"});
+            int n = set.getCount();
+            x.setValue("ref", set.getItem(rnd.nextInt(n)));
+        } else if (choice < 8) {
+            int n = set.getCount();
+            if (n > INITIAL / 2) {
+                set.remove(rnd.nextInt(n));
+                removed.incrementAndGet();
+            }
+        } else if (choice < 9) {
+            Instance x = set.getItem(rnd.nextInt(set.getCount()));
+            x.setValue("n", -op);
+        } else if (w == 0) {
+            AttributeDefList attrs = part.getClassDef().getAttributes();
+            if (attrs.includes("extra")) {
+                attrs.remove("extra");
+            } else {
+                attrs.add(new AttributeDef("extra", AttributeType.Double));
+            }
+        } else {
+            part.getClassDef().setQKAComment("op " + op);
+        }
+    }
+
+    @Test
+    void readersAndWritersEndConsistent() throws Exception {
+        Replica r = new Replica("shared");
+        Model part = addClass(r, "Part", null);
+        addAttr(part, "n", AttributeType.Integer, false);
+        addAttr(part, "tags", AttributeType.String, true);
+        addAttr(part, "ref", AttributeType.Relationship, false);
+        addAttr(part, "note", AttributeType.String, false);
+        for (int i = 0; i < INITIAL; i++) {
+            part.createInstance().setValue("n", i);
+        }
+        r.commit();
+
+        ExecutorService pool = Executors.newFixedThreadPool(READERS + WRITERS);
+        CountDownLatch start = new CountDownLatch(1);
+        List<Future<?>> done = new ArrayList<>();
+        for (int t = 0; t < READERS + WRITERS; t++) {
+            int id = t;
+            done.add(pool.submit(() -> {
+                Random rnd = new Random(1234 + id);
+                start.await();
+                for (int op = 0; op < (id < WRITERS ? WRITE_OPS : READ_OPS); op++) {
+                    try {
+                        if (id < WRITERS) {
+                            write(id, r, part, rnd, op);
+                        } else {
+                            read(r, part, rnd);
+                        }
+                    } catch (RuntimeException e) {
+                        check(e);
+                    } catch (Throwable e) {
+                        unexpected.add(e);
+                    }
+                }
+                return null;
+            }));
+        }
+        start.countDown();
+        pool.shutdown();
+        // a generous bound that only a deadlock can reach
+        assertTrue(pool.awaitTermination(120, TimeUnit.SECONDS), "threads did not finish: deadlock?");
+        for (Future<?> f : done) {
+            f.get();
+        }
+        if (!unexpected.isEmpty()) {
+            AssertionError e = new AssertionError(unexpected.size() + " undocumented exception(s)");
+            unexpected.stream().limit(5).forEach(e::addSuppressed);
+            throw e;
+        }
+
+        // consistency: counts, positions, layouts, identifier map
+        InstanceSet set = part.getInstances();
+        assertEquals(INITIAL + created.get() - removed.get(), set.getCount());
+        int withId = 0;
+        int layout = part.getClassDef().layout.length;
+        for (int k = 0; k < set.count; k++) {
+            Instance x = set.items[k];
+            assertEquals(k, x.pos);
+            assertFalse(x.isDeleted());
+            assertEquals(layout, x.values.length);
+            if (x.id != null) {
+                withId++;
+                assertSame(x, part.ids.get(x.id));
+            }
+        }
+        assertEquals(withId, part.ids == null ? 0 : part.ids.size());
+        // references to instances removed meanwhile are the only thing commit may refuse
+        for (int k = 0; k < set.count; k++) {
+            Instance x = set.items[k];
+            Object ref = x.getValue("ref");
+            if (ref != null && ((Instance) ref).isDeleted()) {
+                x.clearValue("ref");
+            }
+        }
+        r.commit();
+        assertEquals(0, r.toString().contains("deleted") ? 1 : 0);
+        System.out.println("threads: " + created.get() + " created, " + removed.get() + " removed, "
+                + racesLost.get() + " documented race answers");
+    }
+}
