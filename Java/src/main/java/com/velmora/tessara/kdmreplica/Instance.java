@@ -227,7 +227,7 @@ public class Instance {
             throw new IllegalStateException(who() + ": attribute '" + def.qualifiedName()
                     + "' is read-only (access mode Read)");
         }
-        values[p] = value == null ? null : Values.importValue(def, value, model.replica, who());
+        values[p] = value == null ? null : Values.importValue(def, value, model.replica, this);
         touch();
     }
 

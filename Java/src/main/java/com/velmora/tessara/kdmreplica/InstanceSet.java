@@ -39,10 +39,17 @@ public class InstanceSet {
         items[count++] = x;
     }
 
-    /** Takes out every instance of {@code gone} in one pass (caller holds the write lock). */
+    /**
+     * Takes out every instance of {@code gone} (all of this set) in one pass from the first of
+     * them; the following instances move up (caller holds the write lock).
+     */
     void compact(Set<Instance> gone) {
-        int w = 0;
-        for (int r = 0; r < count; r++) {
+        int first = count;
+        for (Instance x : gone) {
+            first = Math.min(first, x.pos);
+        }
+        int w = first;
+        for (int r = first; r < count; r++) {
             Instance x = items[r];
             if (gone.contains(x)) {
                 x.pos = -1;

@@ -136,7 +136,7 @@ final class Staging implements AutoCloseable {
                     + " is out of range (" + x.values.length + " attributes)");
         }
         AttributeDef def = x.model.alignedTo[position];
-        x.values[position] = value == null ? null : Values.importValue(def, value, target, "instance " + x.describe());
+        x.values[position] = value == null ? null : Values.importValue(def, value, target, x);
     }
 
     /** Keeps everything added. @throws IllegalArgumentException when the schema is invalid (then nothing is kept) */

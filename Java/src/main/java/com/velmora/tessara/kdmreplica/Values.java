@@ -42,10 +42,10 @@ final class Values {
      * target names, of one of those classes or of a subclass of one. The access mode is not looked
      * at here.
      *
-     * @param who names the instance being written, for messages
+     * @param x the instance being written, named in messages
      * @throws IllegalArgumentException naming the attribute and the offending value or element
      */
-    static Object importValue(AttributeDef def, Object v, Replica replica, String who) {
+    static Object importValue(AttributeDef def, Object v, Replica replica, Instance x) {
         boolean multi = def.multi;
         switch (def.type) {
             case Integer:
@@ -74,7 +74,7 @@ final class Values {
                 break;
             case String:
                 if (!multi && v instanceof String) {
-                    checkLength(def, who, (String) v, -1);
+                    checkLength(def, x, (String) v, -1);
                     return v;
                 }
                 // Object[] of strings is accepted too: some native converters build that form.
@@ -83,10 +83,10 @@ final class Values {
                     String[] out = new String[in.length];
                     for (int i = 0; i < in.length; i++) {
                         if (!(in[i] instanceof String)) {
-                            throw badElement(def, who, i, in[i]);
+                            throw badElement(def, x, i, in[i]);
                         }
                         out[i] = (String) in[i];
-                        checkLength(def, who, out[i], i);
+                        checkLength(def, x, out[i], i);
                     }
                     return out;
                 }
@@ -100,7 +100,7 @@ final class Values {
                     long[] out = new long[in.length];
                     for (int i = 0; i < in.length; i++) {
                         if (in[i] == null) {
-                            throw badElement(def, who, i, null);
+                            throw badElement(def, x, i, null);
                         }
                         out[i] = in[i].getTime();
                     }
@@ -109,7 +109,7 @@ final class Values {
                 break;
             case Binary:
                 if (!multi && v instanceof byte[]) {
-                    checkLength(def, who, (byte[]) v, -1);
+                    checkLength(def, x, (byte[]) v, -1);
                     return ((byte[]) v).clone();
                 }
                 if (multi && v instanceof byte[][]) {
@@ -117,9 +117,9 @@ final class Values {
                     byte[][] out = new byte[in.length][];
                     for (int i = 0; i < in.length; i++) {
                         if (in[i] == null) {
-                            throw badElement(def, who, i, null);
+                            throw badElement(def, x, i, null);
                         }
-                        checkLength(def, who, in[i], i);
+                        checkLength(def, x, in[i], i);
                         out[i] = in[i].clone();
                     }
                     return out;
@@ -127,7 +127,7 @@ final class Values {
                 break;
             case Relationship:
                 if (!multi && v instanceof Instance) {
-                    checkTarget(def, (Instance) v, replica, who, -1);
+                    checkTarget(def, (Instance) v, replica, x, -1);
                     return v;
                 }
                 if (multi && v instanceof Instance[]) {
@@ -135,9 +135,9 @@ final class Values {
                     Instance[] out = Arrays.copyOf(in, in.length, Instance[].class);
                     for (int i = 0; i < out.length; i++) {
                         if (out[i] == null) {
-                            throw badElement(def, who, i, null);
+                            throw badElement(def, x, i, null);
                         }
-                        checkTarget(def, out[i], replica, who, i);
+                        checkTarget(def, out[i], replica, x, i);
                     }
                     return out;
                 }
@@ -145,13 +145,17 @@ final class Values {
             default:
                 break;
         }
-        throw new IllegalArgumentException(who + ": attribute '" + def.qualifiedName() + "' ("
+        throw new IllegalArgumentException(who(x) + ": attribute '" + def.qualifiedName() + "' ("
                 + def.type + (multi ? ", multi-valued" : "") + ") takes " + form(def.type, multi) + ", not "
                 + className(v));
     }
 
-    private static IllegalArgumentException badElement(AttributeDef def, String who, int i, Object e) {
-        return new IllegalArgumentException(who + ": attribute '" + def.qualifiedName() + "': element " + i
+    private static String who(Instance x) {
+        return "instance " + x.describe();
+    }
+
+    private static IllegalArgumentException badElement(AttributeDef def, Instance x, int i, Object e) {
+        return new IllegalArgumentException(who(x) + ": attribute '" + def.qualifiedName() + "': element " + i
                 + " of the value is " + (e == null ? "null" : "a " + className(e)) + ", expected "
                 + form(def.type, false));
     }
@@ -160,47 +164,47 @@ final class Values {
         return element < 0 ? "the value" : "element " + element;
     }
 
-    private static void checkLength(AttributeDef def, String who, String s, int element) {
+    private static void checkLength(AttributeDef def, Instance x, String s, int element) {
         if (def.length > 0) {
             int n = s.codePointCount(0, s.length());
             if (n > def.length) {
-                throw new IllegalArgumentException(who + ": attribute '" + def.qualifiedName() + "' holds at most "
+                throw new IllegalArgumentException(who(x) + ": attribute '" + def.qualifiedName() + "' holds at most "
                         + def.length + " characters; " + where(element) + " has " + n);
             }
         }
     }
 
-    private static void checkLength(AttributeDef def, String who, byte[] b, int element) {
+    private static void checkLength(AttributeDef def, Instance x, byte[] b, int element) {
         if (def.length > 0 && b.length > def.length) {
-            throw new IllegalArgumentException(who + ": attribute '" + def.qualifiedName() + "' holds at most "
+            throw new IllegalArgumentException(who(x) + ": attribute '" + def.qualifiedName() + "' holds at most "
                     + def.length + " bytes; " + where(element) + " has " + b.length);
         }
     }
 
-    private static void checkTarget(AttributeDef def, Instance x, Replica replica, String who, int element) {
-        Model m = x.model;
+    private static void checkTarget(AttributeDef def, Instance t, Replica replica, Instance x, int element) {
+        Model m = t.model;
         if (m == null || replica == null || m.replica != replica) {
-            throw new IllegalArgumentException(who + ": attribute '" + def.qualifiedName() + "': " + where(element)
-                    + ", " + x.describe() + ", is not an instance of replica '"
+            throw new IllegalArgumentException(who(x) + ": attribute '" + def.qualifiedName() + "': " + where(element)
+                    + ", " + t.describe() + ", is not an instance of replica '"
                     + (replica == null ? "?" : replica.name) + "'");
         }
-        if ((x.state & Instance.DELETED) != 0) {
-            throw new IllegalArgumentException(who + ": attribute '" + def.qualifiedName() + "': " + where(element)
-                    + ", " + x.describe() + ", is deleted");
+        if ((t.state & Instance.DELETED) != 0) {
+            throw new IllegalArgumentException(who(x) + ": attribute '" + def.qualifiedName() + "': " + where(element)
+                    + ", " + t.describe() + ", is deleted");
         }
         String[] targets = def.targetNames;
         if (targets.length == 0) {
             return;
         }
         for (ClassDef c = m.classDef; c != null; c = replica.models.superOf(c)) {
-            for (String t : targets) {
-                if (t.equals(c.name)) {
+            for (String target : targets) {
+                if (target.equals(c.name)) {
                     return;
                 }
             }
         }
-        throw new IllegalArgumentException(who + ": attribute '" + def.qualifiedName() + "': " + where(element)
-                + ", " + x.describe() + ", is of class '" + m.classDef.name + "', not of a target class "
+        throw new IllegalArgumentException(who(x) + ": attribute '" + def.qualifiedName() + "': " + where(element)
+                + ", " + t.describe() + ", is of class '" + m.classDef.name + "', not of a target class "
                 + Arrays.toString(targets));
     }
 
