@@ -215,8 +215,8 @@ class BindingTableTest {
     @ValueSource(strings = {"AttributeType:Integer,Double,String,Date,Boolean,Binary,Relationship",
             "vrattributes.AccessMode:Read,Write,ReadWrite", "AggregationType:Composition,Shared",
             "ClassType:Class,Extension", "vrattributes.Visibility:Public,Protected,Private"})
-    void enumerationConstantsAreStaticFieldsOfTheirOwnType(String spec) throws Exception {
-        String[] parts = spec.split(":");
+    void enumerationConstantsAreStaticFieldsOfTheirOwnType(String row) throws Exception {
+        String[] parts = row.split(":");
         Class<?> c = Class.forName("com.velmora.tessara.kdmreplica." + parts[0]);
         for (String constant : parts[1].split(",")) {
             Field f = c.getField(constant);
