@@ -1,0 +1,27 @@
+// Creates the process's JVM once, through the bridge, with an options list of its own.
+#include "BridgeSupport.h"
+
+namespace
+{
+class JvmEnvironment : public ::testing::Environment
+{
+public:
+  void SetUp() override
+  {
+    VLXListValVLXUnicodeString options;
+    options.Append("-Dcorvexa.platform.test=from-options");
+    options.Append(""); // empty entries are skipped
+    JNIEnv* env = nullptr;
+    const long rc = VLXJBXJNIUtilities::GetJNIEnv(env, options);
+    ASSERT_EQ(rc, VLX_S_OK) << TakeLastError().text;
+    ASSERT_NE(env, nullptr);
+  }
+};
+}
+
+int main(int argc, char** argv)
+{
+  ::testing::InitGoogleTest(&argc, argv);
+  ::testing::AddGlobalTestEnvironment(new JvmEnvironment);
+  return RUN_ALL_TESTS();
+}
