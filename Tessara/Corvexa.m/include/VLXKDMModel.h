@@ -1,8 +1,34 @@
-// The data of one class definition inside a replica: creates its instances.
+// The data of one class definition inside a replica: it creates the instances of that class and
+// hands out the set of its instances. Every operation but Build needs a built proxy; on failure,
+// out-parameters (and out-proxies) are left as they were.
 #pragma once
 
+#include "VLXKDMClassDef.h"
+#include "VLXKDMInstance.h"
+#include "VLXKDMInstanceSet.h"
 #include "VLXKDMJavaObject.h"
+#include "VLXUnicodeString.h"
+
+class VLXKDMReplica;
 
 class CORVEXA_API VLXKDMModel : public VLXKDMJavaObject {
   VLXKDM_PROXY_SPECIAL_MEMBERS(VLXKDMModel)
+
+ public:
+  // Attaches this proxy to a new Java model for classDef (releasing any model it referred to). The
+  // model is in no replica until it is added to a model set. A classDef that is not built goes to
+  // Java as null, which the Java side refuses.
+  long Build(const VLXKDMClassDef& classDef);
+
+  // Attaches instance to a new instance of the model's class, marked created. Fails when the model
+  // is in no replica.
+  long CreateInstance(VLXKDMInstance& instance);
+  // Attaches classDef to the class definition the model holds the data of.
+  long GetClassDef(VLXKDMClassDef& classDef);
+  // Attaches instances to the model's own (live) instance set.
+  long GetInstances(VLXKDMInstanceSet& instances);
+  // Attaches replica to the replica that holds the model; to nothing (not built) when it is in none.
+  long GetReplica(VLXKDMReplica& replica);
+  // A readable text form of the model.
+  long ToString(VLXUnicodeString& text);
 };
