@@ -15,6 +15,11 @@
 
 class ReplicaStubs;
 class VLXMutex;
+class VLXTime;
+class VLXKDMInstance;
+class VLXListValVLXTime;
+class VLXListValVLXBinary;
+class VLXListValVLXKDMInstance;
 namespace corvexa {
 class FrameAccess;
 }
@@ -48,6 +53,42 @@ class CORVEXA_API VLXKDMJavaObject : public VLXJBXJavaObject {
   static long InitJava(JNIEnv*& env, const char* methodName);
   // InitJava, then fails unless this proxy is built.
   long InitJavaAndTestIsBuilt(JNIEnv*& env, const char* methodName);
+
+  // The value converters: one attribute value between its native form and a Java object.
+  //
+  // They use the caller's env (the Java side must be started) and report through the error
+  // translation under their own method name texts. On failure the output is left as it was, except
+  // that the list builders keep the elements converted before the failure, and no local reference
+  // is left behind; a pending Java exception is reported and cleared.
+  //
+  // BuildFromJavaType reads input, which must be of the Java form of output's type (a boxed
+  // Boolean, Integer or Double, a Date, an Instance, or an array of Dates, byte arrays or
+  // Instances); it never releases input. A null input fails for a boxed value or a date, detaches
+  // an instance and empties a list. A list is emptied first; a null element of a date array is a
+  // failure, a null byte array gives an empty buffer, a null instance an unattached proxy. A date
+  // of m milliseconds gives (m + 500) / 1000 seconds, rounded toward zero.
+  static long BuildFromJavaType(JNIEnv* env, jobject input, VLXBoolean& output);
+  static long BuildFromJavaType(JNIEnv* env, jobject input, int& output);
+  static long BuildFromJavaType(JNIEnv* env, jobject input, double& output);
+  static long BuildFromJavaType(JNIEnv* env, jobject input, VLXTime& output);
+  static long BuildFromJavaType(JNIEnv* env, jobject input, VLXKDMInstance& output);
+  static long BuildFromJavaType(JNIEnv* env, jobject input, VLXListValVLXTime& output);
+  static long BuildFromJavaType(JNIEnv* env, jobject input, VLXListValVLXBinary& output);
+  static long BuildFromJavaType(JNIEnv* env, jobject input, VLXListValVLXKDMInstance& output);
+  // ConvertToJavaType writes a new local reference into output, which the caller deletes, except
+  // for a single instance: output is then the proxy's own global reference, which the caller must
+  // neither delete nor keep beyond the proxy's life. An instance (or an element of a list of
+  // instances) that is not attached to a Java object is a broken precondition, reported through
+  // VLXFatalError; if the report returns, the conversion fails and makes no Java object. A time of
+  // s seconds gives a Date of s * 1000 milliseconds; a boolean byte crosses unchanged.
+  static long ConvertToJavaType(JNIEnv* env, int input, jobject& output);
+  static long ConvertToJavaType(JNIEnv* env, double input, jobject& output);
+  static long ConvertToJavaType(JNIEnv* env, VLXBoolean input, jobject& output);
+  static long ConvertToJavaType(JNIEnv* env, const VLXTime& input, jobject& output);
+  static long ConvertToJavaType(JNIEnv* env, const VLXKDMInstance& input, jobject& output);
+  static long ConvertToJavaType(JNIEnv* env, const VLXListValVLXTime& input, jobject& output);
+  static long ConvertToJavaType(JNIEnv* env, const VLXListValVLXKDMInstance& input, jobject& output);
+  static long ConvertToJavaType(JNIEnv* env, const VLXListValVLXBinary& input, jobject& output);
 
   // The binding table of the process: null until the Java side is first started.
   static std::atomic<ReplicaStubs*> _st;

@@ -35,6 +35,8 @@
 #include "VLXFatalError.h"
 #include "VLXJBXException.h"
 #include "VLXJBXJNIHelper.h"
+#include "VLXKDMInstance.h"
+#include "VLXKDMInstanceValue.h"
 #include "VLXKDMJavaObject.h"
 #include "VLXKDMSchemaTypes.h"
 #include "VLXListValVLXUnicodeString.h"
@@ -301,6 +303,90 @@ struct ResultOf<EnumOut<E>> {
     else if (Table::kHasDefault)
       out.value = Table::kDefault;
     return status;
+  }
+};
+
+// ---- Attribute values -------------------------------------------------------------------------
+// The value converters, the value holder and how attribute values cross in the frame.
+
+// The value converters of the proxy base and the platform's, as one public overload set.
+struct Values : VLXKDMJavaObject {
+  using VLXKDMJavaObject::BuildFromJavaType;
+  using VLXKDMJavaObject::ConvertToJavaType;
+  template <class Native>
+  static auto ConvertToJavaType(JNIEnv* env, const Native& input, jobject& output)
+      -> decltype(VLXJBXJNIConverter::ConvertToJavaType(env, input, output)) {
+    return VLXJBXJNIConverter::ConvertToJavaType(env, input, output);
+  }
+  template <class Native>
+  static auto BuildFromJavaType(JNIEnv* env, jobject input, Native& output)
+      -> decltype(VLXJBXJNIConverter::BuildFromJavaType(env, input, output)) {
+    return VLXJBXJNIConverter::BuildFromJavaType(env, input, output);
+  }
+};
+
+// Records that operation was given a value it cannot take (why says which and why) as the thread's
+// last error; returns VLX_E_INVALIDARG.
+inline long RejectValue(const char* operation, const std::string& why) {
+  VLXJBXException* error = new VLXJBXException(VLXJBXMessages::InvalidArgument);
+  const VLXUnicodeString parameters[2] = {VLXUnicodeString(operation), VLXUnicodeString(why.c_str())};
+  error->SetNLSRequestParams(2, parameters);
+  VLXError::VLXCleanLastError();
+  VLXError::GetReturn(2, error, nullptr, __FILE__, __LINE__);
+  return VLX_E_INVALIDARG;
+}
+
+// A native value sent as its Java object, made by the value converters: .with(name, AsJava(42)).
+// The object is released after the call, except a single instance's, which is the proxy's own.
+template <class T>
+struct JavaForm {
+  const T& value;
+};
+template <class T>
+JavaForm<T> AsJava(const T& value) { return JavaForm<T>{value}; }
+
+template <class T>
+struct ArgOf<JavaForm<T>> {
+  using J = jobject;
+  static constexpr bool kOwnsRef = !std::is_same_v<T, VLXKDMInstance>;
+  static constexpr bool kEarly = false;
+  static long To(JNIEnv* env, const JavaForm<T>& arg, J& out) { return Values::ConvertToJavaType(env, arg.value, out); }
+};
+
+// A value holder sent as its Java object: BuildRemote runs first, before any other argument is
+// converted, and its failure stops the operation; then the holder's own handle goes to Java.
+struct RemoteForm {
+  VLXKDMInstanceValue& value;
+};
+inline RemoteForm Remote(VLXKDMInstanceValue& value) { return RemoteForm{value}; }
+
+template <>
+struct ArgOf<RemoteForm> {
+  using J = jobject;
+  static constexpr bool kOwnsRef = false;
+  static constexpr bool kEarly = true;
+  static long To(JNIEnv*, const RemoteForm& arg, J& out) {
+    const long status = arg.value.BuildRemote();
+    if (status < 0) return status;
+    out = arg.value.GetHandle();
+    return VLX_S_OK;
+  }
+};
+// A holder passed bare would go without its Java form: pass Remote(value) instead.
+template <>
+struct ArgOf<VLXKDMInstanceValue>;
+
+// A returned attribute value: attached to the holder, whose local form is then read with
+// BuildLocal; the operation's status is BuildLocal's.
+template <>
+struct ResultOf<VLXKDMInstanceValue> {
+  using Raw = jobject;
+  static long Land(JNIEnv* env, jobject result, VLXKDMInstanceValue& out, long) {
+    LocalRef owned(env, result);
+    const long attached = out.SetHandle(env, result);
+    if (attached < 0) return attached;
+    owned.reset();
+    return out.BuildLocal();
   }
 };
 
