@@ -420,14 +420,34 @@ public class Replica {
         return getXml(withSchema, false);
     }
 
-    /** Not implemented yet: throws UnsupportedOperationException. */
+    /**
+     * The binary form of a replica: schema, instances with identifiers, states and values, deleted
+     * instances, name and schema location, with a version and a checksum; deflated when
+     * {@code compressed}. Reading it back with {@link #getReplicaFromBinary} gives the same replica.
+     *
+     * @throws IllegalArgumentException for null, or a replica that holds a reference the form
+     *         cannot carry (to an instance of a class no longer in the replica), naming it
+     */
     public static byte[] getBinaryFromReplica(Replica replica, boolean compressed) {
-        throw notYet("getBinaryFromReplica");
+        if (replica == null) {
+            throw new IllegalArgumentException("Replica.getBinaryFromReplica: replica is null");
+        }
+        return BinaryCodec.write(replica, compressed);
     }
 
-    /** Not implemented yet: throws UnsupportedOperationException. */
+    /**
+     * A new replica from bytes written by {@link #getBinaryFromReplica}; {@code compressed} must
+     * match how they were written.
+     *
+     * @throws ReplicaBinaryException (an IllegalArgumentException) for bytes that are truncated,
+     *         corrupted, hostile or read with the wrong flag, saying what and at which offset
+     * @throws IllegalArgumentException for null
+     */
     public static Replica getReplicaFromBinary(byte[] bytes, boolean compressed) {
-        throw notYet("getReplicaFromBinary");
+        if (bytes == null) {
+            throw new IllegalArgumentException("Replica.getReplicaFromBinary: bytes is null");
+        }
+        return BinaryCodec.read(bytes, compressed);
     }
 
     /** For example {@code Replica 'plant' (3 classes, 120 instances, 2 deleted)}. */
