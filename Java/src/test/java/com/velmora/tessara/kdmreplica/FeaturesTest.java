@@ -12,9 +12,7 @@ import static org.junit.jupiter.api.Assertions.assertTrue;
 
 import com.velmora.tessara.ReplicaHolder;
 import java.util.Date;
-import java.util.List;
 import org.junit.jupiter.api.Test;
-import org.junit.jupiter.api.function.Executable;
 
 /** Process-wide features and schema location, text forms, definition properties, the holder. */
 class FeaturesTest {
@@ -49,26 +47,6 @@ class FeaturesTest {
             assertEquals("", new Replica("c").getSchemaLocation());
         } finally {
             Replica.setSchemaLocation(null);
-        }
-    }
-
-    @Test
-    void documentMembersSayThatTheyAreNotWrittenYet() {
-        Replica r = new Replica("docs");
-        List<Object[]> calls = List.of(
-                new Object[] {"insertSchemaString", (Executable) () -> r.insertSchemaString("<x/>")},
-                new Object[] {"insertSchemaFile", (Executable) () -> r.insertSchemaFile("x.xsd")},
-                new Object[] {"populatesFromXmlString", (Executable) () -> r.populatesFromXmlString("<x/>")},
-                new Object[] {"populatesFromXmlFile", (Executable) () -> r.populatesFromXmlFile("x.xml")},
-                new Object[] {"readFromXmlString", (Executable) () -> Replica.readFromXmlString("<x/>")},
-                new Object[] {"readFromXmlFile", (Executable) () -> Replica.readFromXmlFile("x.xml")},
-                new Object[] {"getXsd", (Executable) r::getXsd},
-                new Object[] {"getXml", (Executable) () -> r.getXml(true, true)},
-                new Object[] {"getXml", (Executable) () -> r.getXml(false)},
-                new Object[] {"getBinaryFromReplica", (Executable) () -> Replica.getBinaryFromReplica(r, false)},
-                new Object[] {"getReplicaFromBinary", (Executable) () -> Replica.getReplicaFromBinary(new byte[0], true)});
-        for (Object[] c : calls) {
-            throwsWith(UnsupportedOperationException.class, (Executable) c[1], "Replica." + c[0] + " is not implemented");
         }
     }
 
