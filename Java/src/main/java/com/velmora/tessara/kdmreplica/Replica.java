@@ -29,7 +29,8 @@ public class Replica {
 
     private static final Map<String, Boolean> FEATURE_DEFAULTS;
     private static final Map<String, Boolean> FEATURES = Collections.synchronizedMap(new LinkedHashMap<>());
-    private static volatile String processSchemaLocation = "";
+    /** The process-wide schema location (read by the XML writer). */
+    static volatile String processSchemaLocation = "";
 
     static {
         LinkedHashMap<String, Boolean> d = new LinkedHashMap<>();
@@ -375,47 +376,88 @@ public class Replica {
         return new UnsupportedOperationException("Replica." + member + " is not implemented yet");
     }
 
-    /** Not implemented yet: throws UnsupportedOperationException. */
+    /**
+     * Adds the classes of a W3C XML Schema (each with an empty model): a schema written by
+     * {@link #getXsd()}, or a hand-written one of the same shape (see the package README).
+     * A schema given as a string may not include or import other schemas.
+     *
+     * @throws XmlDocumentException for a construct that is not read, naming it and its line, or a
+     *         class the replica already has; the replica is then unchanged
+     * @throws IllegalArgumentException for null
+     */
     public void insertSchemaString(String xsd) {
-        throw notYet("insertSchemaString");
+        XsdReader.insert(this, XmlSupport.Src.ofString("XSD", xsd, "insertSchemaString"));
     }
 
-    /** Not implemented yet: throws UnsupportedOperationException. */
+    /**
+     * As {@link #insertSchemaString}, from a file; {@code xs:include} and {@code xs:import} may name
+     * local files in the file's directory (or below it), nothing else.
+     */
     public void insertSchemaFile(String path) {
-        throw notYet("insertSchemaFile");
+        XsdReader.insert(this, XmlSupport.Src.ofFile("XSD", path, "insertSchemaFile"));
     }
 
-    /** Not implemented yet: throws UnsupportedOperationException. */
+    /**
+     * Adds the instances of a replica document to this replica, whose classes must include the
+     * document's; an embedded schema and a schema location are not read. Instances are unchanged
+     * unless the document carries states.
+     *
+     * @throws XmlDocumentException naming the line, column and offending name; the replica is
+     *         then unchanged
+     * @throws IllegalArgumentException for null
+     */
     public void populatesFromXmlString(String xml) {
-        throw notYet("populatesFromXmlString");
+        XmlReader.populate(this, XmlSupport.Src.ofString("XML", xml, "populatesFromXmlString"));
     }
 
-    /** Not implemented yet: throws UnsupportedOperationException. */
+    /** As {@link #populatesFromXmlString}, from a file. */
     public void populatesFromXmlFile(String path) {
-        throw notYet("populatesFromXmlFile");
+        XmlReader.populate(this, XmlSupport.Src.ofFile("XML", path, "populatesFromXmlFile"));
     }
 
-    /** Not implemented yet: throws UnsupportedOperationException. */
+    /**
+     * A new replica from a document: the schema embedded in it, or else the local schema file its
+     * {@code xsi:schemaLocation} names (relative paths from the working directory; URLs are
+     * refused). The replica's schema location is the one the document names ("" if none).
+     *
+     * @throws XmlDocumentException naming the line, column and offending name, or saying that the
+     *         document has no schema
+     * @throws IllegalArgumentException for null
+     */
     public static Replica readFromXmlString(String xml) {
-        throw notYet("readFromXmlString");
+        return XmlReader.read(XmlSupport.Src.ofString("XML", xml, "readFromXmlString"));
     }
 
-    /** Not implemented yet: throws UnsupportedOperationException. */
+    /** As {@link #readFromXmlString}, from a file; a relative schema location is taken from the file's directory. */
     public static Replica readFromXmlFile(String path) {
-        throw notYet("readFromXmlFile");
+        return XmlReader.read(XmlSupport.Src.ofFile("XML", path, "readFromXmlFile"));
     }
 
-    /** Not implemented yet: throws UnsupportedOperationException. */
+    /**
+     * The schema as a W3C XML Schema that validates this replica's documents; every class and
+     * attribute property travels in its {@code xs:appinfo}, so {@link #insertSchemaString} on an
+     * empty replica gives this schema again.
+     *
+     * @throws IllegalArgumentException for a class or attribute name that cannot be an XML name
+     */
     public String getXsd() {
-        throw notYet("getXsd");
+        return XsdWriter.write(this);
     }
 
-    /** Not implemented yet: throws UnsupportedOperationException. */
+    /**
+     * The replica as an XML document: {@code withSchema} embeds the schema (so the document reads
+     * back on its own), {@code withState} writes the created, modified and deleted states. The
+     * process-wide schema location, when set, is written as {@code xsi:schemaLocation}. Every
+     * value survives a read exactly; texts that XML cannot carry are escaped reversibly.
+     *
+     * @throws IllegalArgumentException for a relationship to an instance the document does not
+     *         hold (deleted, without {@code withState}), or a name that cannot be an XML name
+     */
     public String getXml(boolean withSchema, boolean withState) {
-        throw notYet("getXml");
+        return XmlWriter.write(this, withSchema, withState);
     }
 
-    /** Not implemented yet: throws UnsupportedOperationException. */
+    /** {@code getXml(withSchema, false)}. */
     public String getXml(boolean withSchema) {
         return getXml(withSchema, false);
     }
