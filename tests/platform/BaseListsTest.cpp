@@ -1,4 +1,4 @@
-// Value lists (one typed suite over every list name), the pointer list VLXRawCollPV and VLXBinary.
+// Value lists (one typed suite over every list name) and the pointer list VLXRawCollPV.
 #include "FatalRecorder.h"
 #include "VLXBinary.h"
 #include "VLXListValVLXBinary.h"
@@ -340,27 +340,6 @@ TEST(RawCollPV, DestroysThroughTheCollectionBase)
   VLXCollecRoot* root = new VLXRawCollPV(8);
   static_cast<VLXRawCollPV*>(root)->Append(root);
   delete root; // virtual destructor: no leak under the sanitizer
-}
-
-// ---- VLXBinary ----
-
-TEST(Binary, LengthsZeroFillAndCopies)
-{
-  EXPECT_EQ(VLXBinary().getLength(), 0);
-  EXPECT_EQ(VLXBinary().getData(), nullptr);
-  EXPECT_EQ(VLXBinary(-3).getLength(), 0);
-  const VLXBinary zeros(5);
-  ASSERT_EQ(zeros.getLength(), 5);
-  for (int i = 0; i < 5; ++i)
-    EXPECT_EQ(zeros.getData()[i], 0);
-  const unsigned char raw[] = {0, 255, 0, 7};
-  VLXBinary data(raw, 4);
-  VLXBinary copy(data);
-  data.getData()[1] = 1;
-  EXPECT_EQ(copy.getData()[1], 255);
-  EXPECT_TRUE(copy != data);
-  EXPECT_TRUE(copy == VLXBinary(raw, 4));
-  EXPECT_TRUE(VLXBinary(nullptr, 4) == VLXBinary());
 }
 
 } // namespace

@@ -104,10 +104,4 @@ INSTANTIATE_TEST_SUITE_P(
         Utf8Case{"firstFaultWins", "\xC3\xA9\x80\xFF", 2, "continuation"}),
     [](const ::testing::TestParamInfo<Utf8Case>& info) { return std::string(info.param.name); });
 
-TEST(UnicodeString, RangeCheckWorksOnRawBytesWithoutReason)
-{
-  EXPECT_EQ(VLXUnicodeString::FirstMalformedOffset("ab\x80", 2, nullptr), -1) << "only the given length counts";
-  EXPECT_EQ(VLXUnicodeString::FirstMalformedOffset("ab\x80", 3, nullptr), 2);
-}
-
 } // namespace

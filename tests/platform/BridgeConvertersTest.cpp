@@ -314,17 +314,4 @@ TEST_F(ConverterTest, LargeStringListsReleaseEachElementReferenceAtOnce)
   env->DeleteLocalRef(array);
 }
 
-TEST_F(ConverterTest, JobjectOutputFormsGiveTheSameObjects)
-{
-  jobject out = nullptr;
-  ASSERT_EQ(VLXJBXJNIConverter::ConvertToJavaType(env, VLXUnicodeString("abc"), out), VLX_S_OK);
-  EXPECT_EQ(env->GetStringLength(static_cast<jstring>(out)), 3);
-  env->DeleteLocalRef(out);
-  VLXRawCollint ints;
-  ints.Append(4);
-  ASSERT_EQ(VLXJBXJNIConverter::ConvertToJavaType(env, ints, out), VLX_S_OK);
-  EXPECT_TRUE(env->IsInstanceOf(out, env->FindClass("[I")));
-  env->DeleteLocalRef(out);
-}
-
 } // namespace

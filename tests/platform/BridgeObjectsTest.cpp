@@ -1,5 +1,4 @@
-// VLXJBXJavaObject: one global reference per object through copy, assignment and destruction;
-// and the thin JNI wrappers.
+// VLXJBXJavaObject: one global reference per object through copy, assignment and destruction.
 #include "BridgeSupport.h"
 #include "VLXJBXJNIHelper.h"
 #include "VLXJBXJavaObject.h"
@@ -129,71 +128,6 @@ TEST_F(JavaObjectTest, HeapObjectsAndOtherThreadsBalanceTheCount)
   EXPECT_EQ(Refs(), base + 1);
   heap->Release();
   EXPECT_EQ(Refs(), base);
-}
-
-TEST_F(JavaObjectTest, JniWrappersForwardArgumentsAndResults)
-{
-  jclass integer = Find("java/lang/Integer");
-  jobject boxed = VLXJBXJNIHelper::CallStaticObjectMethod(
-      env, integer, env->GetStaticMethodID(integer, "valueOf", "(I)Ljava/lang/Integer;"), jint(-42));
-  ASSERT_FALSE(VLXJBXJNIHelper::ExceptionCheck(env));
-  jmethodID intValue = env->GetMethodID(integer, "intValue", "()I");
-  jmethodID longValue = env->GetMethodID(integer, "longValue", "()J");
-  jmethodID doubleValue = env->GetMethodID(integer, "doubleValue", "()D");
-  jmethodID equals = env->GetMethodID(integer, "equals", "(Ljava/lang/Object;)Z");
-  EXPECT_EQ(VLXJBXJNIHelper::CallIntMethod(env, boxed, intValue), -42);
-  ASSERT_FALSE(VLXJBXJNIHelper::ExceptionCheck(env));
-  EXPECT_EQ(VLXJBXJNIHelper::CallLongMethod(env, boxed, longValue), -42);
-  ASSERT_FALSE(VLXJBXJNIHelper::ExceptionCheck(env));
-  EXPECT_EQ(VLXJBXJNIHelper::CallDoubleMethod(env, boxed, doubleValue), -42.0);
-  ASSERT_FALSE(VLXJBXJNIHelper::ExceptionCheck(env));
-  EXPECT_EQ(VLXJBXJNIHelper::CallBooleanMethod(env, boxed, equals, boxed), JNI_TRUE);
-  ASSERT_FALSE(VLXJBXJNIHelper::ExceptionCheck(env));
-  jclass booleanClass = Find("java/lang/Boolean");
-  jobject yes = VLXJBXJNIHelper::NewObject(env, booleanClass, env->GetMethodID(booleanClass, "<init>", "(Z)V"),
-                                           jboolean(JNI_TRUE));
-  ASSERT_FALSE(VLXJBXJNIHelper::ExceptionCheck(env));
-  jmethodID booleanValue = env->GetMethodID(booleanClass, "booleanValue", "()Z");
-  EXPECT_EQ(VLXJBXJNIHelper::CallBooleanMethod(env, yes, booleanValue), JNI_TRUE);
-  ASSERT_FALSE(VLXJBXJNIHelper::ExceptionCheck(env));
-  EXPECT_TRUE(VLXJBXJNIHelper::IsSameObject(env, VLXJBXJNIHelper::GetObjectClass(env, yes), booleanClass));
-
-  jobject builder = NewStringBuilder("ab");
-  jclass sbClass = VLXJBXJNIHelper::GetObjectClass(env, builder);
-  VLXJBXJNIHelper::CallVoidMethod(env, builder, env->GetMethodID(sbClass, "setLength", "(I)V"), jint(1));
-  ASSERT_FALSE(VLXJBXJNIHelper::ExceptionCheck(env));
-  EXPECT_EQ(ToString(builder), u"a");
-
-  jfieldID field = env->GetStaticFieldID(booleanClass, "FALSE", "Ljava/lang/Boolean;");
-  jobject no = VLXJBXJNIHelper::GetStaticObjectField(env, booleanClass, field);
-  EXPECT_FALSE(VLXJBXJNIHelper::IsSameObject(env, no, yes));
-  jobject local = VLXJBXJNIHelper::NewLocalRef(env, no);
-  EXPECT_TRUE(VLXJBXJNIHelper::IsSameObject(env, local, no));
-  VLXJBXJNIHelper::DeleteLocalRef(env, local);
-
-  jobjectArray array = VLXJBXJNIHelper::NewObjectArray(env, 2, booleanClass, no);
-  VLXJBXJNIHelper::SetObjectArrayElement(env, array, 1, yes);
-  ASSERT_FALSE(VLXJBXJNIHelper::ExceptionCheck(env));
-  EXPECT_EQ(VLXJBXJNIHelper::GetArrayLength(env, array), 2);
-  jobject second = VLXJBXJNIHelper::GetObjectArrayElement(env, array, 1);
-  EXPECT_TRUE(VLXJBXJNIHelper::IsSameObject(env, second, yes));
-  // Storing the wrong class raises ArrayStoreException, seen by ExceptionCheck.
-  VLXJBXJNIHelper::SetObjectArrayElement(env, array, 0, boxed);
-  EXPECT_TRUE(VLXJBXJNIHelper::ExceptionCheck(env));
-  env->ExceptionClear();
-
-  const long base = Refs();
-  jobject global = VLXJBXJNIHelper::NewGlobalRef(env, yes);
-  EXPECT_EQ(Refs(), base + 1);
-  EXPECT_EQ(VLXJBXJNIHelper::NewGlobalRef(env, nullptr), nullptr);
-  EXPECT_EQ(Refs(), base + 1) << "a null reference is not counted";
-  VLXJBXJNIHelper::DeleteGlobalRef(env, global);
-  VLXJBXJNIHelper::DeleteGlobalRef(env, nullptr);
-  EXPECT_EQ(Refs(), base);
-
-  jclass system = Find("java/lang/System");
-  VLXJBXJNIHelper::CallStaticVoidMethod(env, system, env->GetStaticMethodID(system, "gc", "()V"));
-  EXPECT_FALSE(VLXJBXJNIHelper::ExceptionCheck(env));
 }
 
 } // namespace
