@@ -5,10 +5,23 @@
 // needs a built proxy; on failure, out-parameters (and out-proxies) are left as they were.
 #pragma once
 
+#include <jni.h>
+
 #include "VLXBinary.h"
 #include "VLXKDMClassDef.h"
 #include "VLXKDMJavaObject.h"
+#include "VLXListValVLXBinary.h"
+#include "VLXListValVLXBoolean.h"
+#include "VLXListValVLXTime.h"
+#include "VLXListValVLXUnicodeString.h"
+#include "VLXRawColldouble.h"
+#include "VLXRawCollint.h"
+#include "VLXTime.h"
 #include "VLXUnicodeString.h"
+
+class VLXKDMInstanceValue;
+class VLXListValVLXKDMInstance;
+typedef VLXListValVLXKDMInstance VLXListOfVLXKDMInstance;
 
 class CORVEXA_API VLXKDMInstance : public VLXKDMJavaObject {
   VLXKDM_PROXY_SPECIAL_MEMBERS(VLXKDMInstance)
@@ -40,7 +53,85 @@ class CORVEXA_API VLXKDMInstance : public VLXKDMJavaObject {
   long ClearValue(const VLXUnicodeString& name);
   long ClearValue(int position);
 
+  // Reads the attribute's value into value (see VLXKDMInstanceValue), whatever its type; an
+  // attribute without value fails, since there is no Java object to read. Returns the result of
+  // reading the value's local form. A name that is not well-formed UTF-8 returns the converter's
+  // own code, with no translation, and leaves value untouched; a Java failure leaves it untouched.
+  long GetValue(const VLXUnicodeString& name, VLXKDMInstanceValue& value);
+  long GetValue(int position, VLXKDMInstanceValue& value);
+  // Writes the attribute's value from value: first gives value its Java form (which it keeps),
+  // then sends it. A value without type is a broken precondition, reported through VLXFatalError;
+  // if the report returns, the operation fails without any Java call, leaving the attribute as it
+  // was. The Java side checks the value against the attribute's type and kind.
+  long SetValue(const VLXUnicodeString& name, VLXKDMInstanceValue& value);
+  long SetValue(int position, VLXKDMInstanceValue& value);
+
+  // The typed setters: one Java object made from the argument, checked by the Java side against
+  // the attribute's type and kind (single or list). A time crosses as seconds * 1000 ms; a boolean
+  // byte crosses unchanged. An instance (or element of a list of instances) that is not attached
+  // to a Java object is a broken precondition, reported through VLXFatalError; if the report
+  // returns, the setter fails without calling Java. An empty list sets an empty value, which is not
+  // the same as no value.
+  long SetValue(const VLXUnicodeString& name, int value);
+  long SetValue(int position, int value);
+  long SetValue(const VLXUnicodeString& name, double value);
+  long SetValue(int position, double value);
+  long SetValue(const VLXUnicodeString& name, VLXBoolean value);
+  long SetValue(int position, VLXBoolean value);
+  long SetValue(const VLXUnicodeString& name, const VLXUnicodeString& value);
+  long SetValue(int position, const VLXUnicodeString& value);
+  long SetValue(const VLXUnicodeString& name, const VLXTime& value);
+  long SetValue(int position, const VLXTime& value);
+  long SetValue(const VLXUnicodeString& name, const VLXBinary& value);
+  long SetValue(int position, const VLXBinary& value);
+  long SetValue(const VLXUnicodeString& name, const VLXKDMInstance& value);
+  long SetValue(int position, const VLXKDMInstance& value);
+  long SetValue(const VLXUnicodeString& name, const VLXListOfInt& value);
+  long SetValue(int position, const VLXListOfInt& value);
+  long SetValue(const VLXUnicodeString& name, const VLXListOfDouble& value);
+  long SetValue(int position, const VLXListOfDouble& value);
+  long SetValue(const VLXUnicodeString& name, const VLXListOfVLXBoolean& value);
+  long SetValue(int position, const VLXListOfVLXBoolean& value);
+  long SetValue(const VLXUnicodeString& name, const VLXListOfVLXUnicodeString& value);
+  long SetValue(int position, const VLXListOfVLXUnicodeString& value);
+  long SetValue(const VLXUnicodeString& name, const VLXListOfVLXTime& value);
+  long SetValue(int position, const VLXListOfVLXTime& value);
+  long SetValue(const VLXUnicodeString& name, const VLXListOfVLXBinary& value);
+  long SetValue(int position, const VLXListOfVLXBinary& value);
+  long SetValue(const VLXUnicodeString& name, const VLXListOfVLXKDMInstance& value);
+  long SetValue(int position, const VLXListOfVLXKDMInstance& value);
+
+  // The variadic setters: count values follow (none when count <= 0, which sets an empty list),
+  // gathered into a list that is then set as by the list setter, whose name failures carry. The
+  // values are: const VLXBinary*, VLXBoolean (as int; its low 8 bits count), const VLXTime*,
+  // double, const VLXKDMInstance*, int, and NUL-terminated UTF-8 texts (const char*). A null
+  // pointer stands for the empty value: an empty buffer, the time 0, an unattached instance (which
+  // fails the conversion), an empty text.
+  long SetValueBinaries(const VLXUnicodeString& name, int count, ...);
+  long SetValueBinaries(int position, int count, ...);
+  long SetValueBooleans(const VLXUnicodeString& name, int count, ...);
+  long SetValueBooleans(int position, int count, ...);
+  long SetValueDates(const VLXUnicodeString& name, int count, ...);
+  long SetValueDates(int position, int count, ...);
+  long SetValueDoubles(const VLXUnicodeString& name, int count, ...);
+  long SetValueDoubles(int position, int count, ...);
+  long SetValueInstances(const VLXUnicodeString& name, int count, ...);
+  long SetValueInstances(int position, int count, ...);
+  long SetValueIntegers(const VLXUnicodeString& name, int count, ...);
+  long SetValueIntegers(int position, int count, ...);
+  long SetValueStrings(const VLXUnicodeString& name, int count, ...);
+  long SetValueStrings(int position, int count, ...);
+
   // A readable text form of the instance; with withValues (any non-zero byte), its values too.
   long ToString(VLXUnicodeString& text);
   long ToString(VLXBoolean withValues, VLXUnicodeString& text);
+
+ private:
+  // Sends object, which the caller owns, as the attribute's new value. Every typed setter ends here.
+  long SetValue(const VLXUnicodeString& name, jobject object);
+  long SetValue(int position, jobject object);
+  // A typed setter: the Java form of value, made under the setter's method name text, goes to the
+  // SetValue above.
+  template <class Attribute, class T>
+  long SetConverted(const char* methodName, const Attribute& attribute, const T& value);
 };

@@ -184,6 +184,12 @@ template <> struct ResultOf<NoResult> {
   using Raw = void;
 };
 
+// An operation that ends in another operation of the library (forwardTo): no Java call of its
+// own; the other operation's result is the status.
+struct Forwarded {
+  using Raw = void;
+};
+
 // ---- Schema enumerations ---------------------------------------------------------------------
 // Each native enumeration stands for the Java constants in consecutive slots of the binding table,
 // in value order. A getter that finds a null or unknown object writes the enumeration's default;
@@ -463,6 +469,12 @@ class Bound {
   }
   // The constructor's new object is attached to the proxy given to Call::Construct.
   long construct() { return Execute<ResultOf<VLXKDMJavaObject>>(*_call._created); }
+  // In place of step 6, the converted arguments go to next, an operation of the library that makes
+  // the Java call; its result is the status that step 9 translates under this operation's name.
+  template <class Next>
+  long forwardTo(Next&& next) {
+    return Execute<Forwarded>(next);
+  }
 
  private:
   using JArgs = std::tuple<typename ArgOf<A>::J...>;
@@ -488,7 +500,10 @@ class Bound {
     if (kArity > 0) status = converted;
 
     using Raw = typename Result::Raw;                                               // 6
-    if constexpr (std::is_void_v<Raw>) {
+    if constexpr (std::is_same_v<Result, Forwarded>) {
+      status = std::apply(out, jargs);
+      ReleaseAll(env, jargs, std::index_sequence_for<A...>{});                      // 7
+    } else if constexpr (std::is_void_v<Raw>) {
       Invoke<void>(env, *st, jargs);
       ReleaseAll(env, jargs, std::index_sequence_for<A...>{});                      // 7
     } else {

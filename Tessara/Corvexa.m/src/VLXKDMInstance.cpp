@@ -1,9 +1,13 @@
 #include "VLXKDMInstance.h"
 
+#include <cstdarg>
 #include <string>
 
 #include "CallFrame.h"
 #include "ProxyMembers.h"
+#include "Variadic.h"
+#include "VLXKDMInstanceValue.h"
+#include "VLXListValVLXKDMInstance.h"
 
 using namespace corvexa;
 
@@ -164,3 +168,270 @@ long VLXKDMInstance::ToString(VLXBoolean withValues, VLXUnicodeString& text)
       .with(withValues)
       .returning(text);
 }
+
+// ---- Values ----------------------------------------------------------------------------------
+
+long VLXKDMInstance::GetValue(const VLXUnicodeString& name, VLXKDMInstanceValue& value)
+{
+  return Call(*this, "VLXKDMInstance::GetValue(const VLXUnicodeString&, VLXKDMInstanceValue&)", Instance_getValueNamed)
+      .rawConversionCode()
+      .with(name)
+      .returning(value);
+}
+
+long VLXKDMInstance::GetValue(int position, VLXKDMInstanceValue& value)
+{
+  return Call(*this, "VLXKDMInstance::GetValue(int, VLXKDMInstanceValue&)", Instance_getValueAt)
+      .with(position)
+      .returning(value);
+}
+
+long VLXKDMInstance::SetValue(const VLXUnicodeString& name, VLXKDMInstanceValue& value)
+{
+  return Call(*this, "VLXKDMInstance::SetValue(const VLXUnicodeString&, VLXKDMInstanceValue&)", Instance_setValueNamed)
+      .with(name, Remote(value))
+      .run();
+}
+
+long VLXKDMInstance::SetValue(int position, VLXKDMInstanceValue& value)
+{
+  return Call(*this, "VLXKDMInstance::SetValue(int, VLXKDMInstanceValue&)", Instance_setValueAt)
+      .with(position, Remote(value))
+      .run();
+}
+
+long VLXKDMInstance::SetValue(const VLXUnicodeString& name, jobject object)
+{
+  return Call(*this, "VLXKDMInstance::SetValue(const VLXUnicodeString&, jobject)", Instance_setValueNamed)
+      .with(name, object)
+      .run();
+}
+
+long VLXKDMInstance::SetValue(int position, jobject object)
+{
+  return Call(*this, "VLXKDMInstance::SetValue(int, jobject)", Instance_setValueAt).with(position, object).run();
+}
+
+// The typed setter's own frame converts the value; the Java call is the private SetValue's.
+template <class Attribute, class T>
+long VLXKDMInstance::SetConverted(const char* methodName, const Attribute& attribute, const T& value)
+{
+  const Slot setValue = std::is_same_v<Attribute, int> ? Instance_setValueAt : Instance_setValueNamed;
+  return Call(*this, methodName, setValue).with(AsJava(value)).forwardTo([&](jobject object) {
+    return SetValue(attribute, object);
+  });
+}
+
+// ---- Typed setters ---------------------------------------------------------------------------
+
+long VLXKDMInstance::SetValue(const VLXUnicodeString& name, int value)
+{
+  return SetConverted("VLXKDMInstance::SetValue(const VLXUnicodeString&, int)", name, value);
+}
+
+long VLXKDMInstance::SetValue(int position, int value)
+{
+  return SetConverted("VLXKDMInstance::SetValue(int, int)", position, value);
+}
+
+long VLXKDMInstance::SetValue(const VLXUnicodeString& name, double value)
+{
+  return SetConverted("VLXKDMInstance::SetValue(const VLXUnicodeString&, double)", name, value);
+}
+
+long VLXKDMInstance::SetValue(int position, double value)
+{
+  return SetConverted("VLXKDMInstance::SetValue(int, double)", position, value);
+}
+
+long VLXKDMInstance::SetValue(const VLXUnicodeString& name, VLXBoolean value)
+{
+  return SetConverted("VLXKDMInstance::SetValue(const VLXUnicodeString&, VLXBoolean)", name, value);
+}
+
+long VLXKDMInstance::SetValue(int position, VLXBoolean value)
+{
+  return SetConverted("VLXKDMInstance::SetValue(int, VLXBoolean)", position, value);
+}
+
+long VLXKDMInstance::SetValue(const VLXUnicodeString& name, const VLXUnicodeString& value)
+{
+  return SetConverted("VLXKDMInstance::SetValue(const VLXUnicodeString&, const VLXUnicodeString&)", name, value);
+}
+
+long VLXKDMInstance::SetValue(int position, const VLXUnicodeString& value)
+{
+  return SetConverted("VLXKDMInstance::SetValue(int, const VLXUnicodeString&)", position, value);
+}
+
+long VLXKDMInstance::SetValue(const VLXUnicodeString& name, const VLXTime& value)
+{
+  return SetConverted("VLXKDMInstance::SetValue(const VLXUnicodeString&, const VLXTime&)", name, value);
+}
+
+long VLXKDMInstance::SetValue(int position, const VLXTime& value)
+{
+  return SetConverted("VLXKDMInstance::SetValue(int, const VLXTime&)", position, value);
+}
+
+long VLXKDMInstance::SetValue(const VLXUnicodeString& name, const VLXBinary& value)
+{
+  return SetConverted("VLXKDMInstance::SetValue(const VLXUnicodeString&, const VLXBinary&)", name, value);
+}
+
+long VLXKDMInstance::SetValue(int position, const VLXBinary& value)
+{
+  return SetConverted("VLXKDMInstance::SetValue(int, const VLXBinary&)", position, value);
+}
+
+long VLXKDMInstance::SetValue(const VLXUnicodeString& name, const VLXKDMInstance& value)
+{
+  return SetConverted("VLXKDMInstance::SetValue(const VLXUnicodeString&, const VLXKDMInstance&)", name, value);
+}
+
+long VLXKDMInstance::SetValue(int position, const VLXKDMInstance& value)
+{
+  return SetConverted("VLXKDMInstance::SetValue(int, const VLXKDMInstance&)", position, value);
+}
+
+long VLXKDMInstance::SetValue(const VLXUnicodeString& name, const VLXListOfInt& value)
+{
+  return SetConverted("VLXKDMInstance::SetValue(const VLXUnicodeString&, const VLXListOfInt&)", name, value);
+}
+
+long VLXKDMInstance::SetValue(int position, const VLXListOfInt& value)
+{
+  return SetConverted("VLXKDMInstance::SetValue(int, const VLXListOfInt&)", position, value);
+}
+
+long VLXKDMInstance::SetValue(const VLXUnicodeString& name, const VLXListOfDouble& value)
+{
+  return SetConverted("VLXKDMInstance::SetValue(const VLXUnicodeString&, const VLXListOfDouble&)", name, value);
+}
+
+long VLXKDMInstance::SetValue(int position, const VLXListOfDouble& value)
+{
+  return SetConverted("VLXKDMInstance::SetValue(int, const VLXListOfDouble&)", position, value);
+}
+
+long VLXKDMInstance::SetValue(const VLXUnicodeString& name, const VLXListOfVLXBoolean& value)
+{
+  return SetConverted("VLXKDMInstance::SetValue(const VLXUnicodeString&, const VLXListOfVLXBoolean&)", name, value);
+}
+
+long VLXKDMInstance::SetValue(int position, const VLXListOfVLXBoolean& value)
+{
+  return SetConverted("VLXKDMInstance::SetValue(int, const VLXListOfVLXBoolean&)", position, value);
+}
+
+long VLXKDMInstance::SetValue(const VLXUnicodeString& name, const VLXListOfVLXUnicodeString& value)
+{
+  return SetConverted("VLXKDMInstance::SetValue(const VLXUnicodeString&, const VLXListOfVLXUnicodeString&)", name,
+                      value);
+}
+
+long VLXKDMInstance::SetValue(int position, const VLXListOfVLXUnicodeString& value)
+{
+  return SetConverted("VLXKDMInstance::SetValue(int, const VLXListOfVLXUnicodeString&)", position, value);
+}
+
+long VLXKDMInstance::SetValue(const VLXUnicodeString& name, const VLXListOfVLXTime& value)
+{
+  return SetConverted("VLXKDMInstance::SetValue(const VLXUnicodeString&, const VLXListOfVLXTime&)", name, value);
+}
+
+long VLXKDMInstance::SetValue(int position, const VLXListOfVLXTime& value)
+{
+  return SetConverted("VLXKDMInstance::SetValue(int, const VLXListOfVLXTime&)", position, value);
+}
+
+long VLXKDMInstance::SetValue(const VLXUnicodeString& name, const VLXListOfVLXBinary& value)
+{
+  return SetConverted("VLXKDMInstance::SetValue(const VLXUnicodeString&, const VLXListOfVLXBinary&)", name, value);
+}
+
+long VLXKDMInstance::SetValue(int position, const VLXListOfVLXBinary& value)
+{
+  return SetConverted("VLXKDMInstance::SetValue(int, const VLXListOfVLXBinary&)", position, value);
+}
+
+long VLXKDMInstance::SetValue(const VLXUnicodeString& name, const VLXListOfVLXKDMInstance& value)
+{
+  return SetConverted("VLXKDMInstance::SetValue(const VLXUnicodeString&, const VLXListOfVLXKDMInstance&)", name,
+                      value);
+}
+
+long VLXKDMInstance::SetValue(int position, const VLXListOfVLXKDMInstance& value)
+{
+  return SetConverted("VLXKDMInstance::SetValue(int, const VLXListOfVLXKDMInstance&)", position, value);
+}
+
+// ---- Variadic setters ------------------------------------------------------------------------
+// Each gathers its count values, then runs its list twin; a null pointer gives the empty value.
+
+namespace {
+
+template <class T>
+T ValueAt(const T* pointer)
+{
+  return pointer ? *pointer : T();
+}
+
+VLXListValVLXBinary GatherBinaries(int count, va_list args)
+{
+  return Gather<VLXListValVLXBinary, const VLXBinary*>(count, args, ValueAt<VLXBinary>);
+}
+
+VLXListValVLXBoolean GatherBooleans(int count, va_list args)
+{
+  return Gather<VLXListValVLXBoolean, int>(count, args, [](int b) { return static_cast<VLXBoolean>(b & 0xFF); });
+}
+
+VLXListValVLXTime GatherDates(int count, va_list args)
+{
+  return Gather<VLXListValVLXTime, const VLXTime*>(count, args, ValueAt<VLXTime>);
+}
+
+VLXRawColldouble GatherDoubles(int count, va_list args)
+{
+  return Gather<VLXRawColldouble, double>(count, args, [](double d) { return d; });
+}
+
+VLXListValVLXKDMInstance GatherInstances(int count, va_list args)
+{
+  return Gather<VLXListValVLXKDMInstance, const VLXKDMInstance*>(count, args, ValueAt<VLXKDMInstance>);
+}
+
+VLXRawCollint GatherIntegers(int count, va_list args)
+{
+  return Gather<VLXRawCollint, int>(count, args, [](int n) { return n; });
+}
+
+}  // namespace
+
+#define VLXKDM_VARIADIC_SETTER(Operation, Attribute, gather) \
+  long VLXKDMInstance::Operation(Attribute attribute, int count, ...) \
+  {                                                                   \
+    va_list args;                                                     \
+    va_start(args, count);                                            \
+    const auto values = gather(count, args);                          \
+    va_end(args);                                                     \
+    return SetValue(attribute, values);                               \
+  }
+
+VLXKDM_VARIADIC_SETTER(SetValueBinaries, const VLXUnicodeString&, GatherBinaries)
+VLXKDM_VARIADIC_SETTER(SetValueBinaries, int, GatherBinaries)
+VLXKDM_VARIADIC_SETTER(SetValueBooleans, const VLXUnicodeString&, GatherBooleans)
+VLXKDM_VARIADIC_SETTER(SetValueBooleans, int, GatherBooleans)
+VLXKDM_VARIADIC_SETTER(SetValueDates, const VLXUnicodeString&, GatherDates)
+VLXKDM_VARIADIC_SETTER(SetValueDates, int, GatherDates)
+VLXKDM_VARIADIC_SETTER(SetValueDoubles, const VLXUnicodeString&, GatherDoubles)
+VLXKDM_VARIADIC_SETTER(SetValueDoubles, int, GatherDoubles)
+VLXKDM_VARIADIC_SETTER(SetValueInstances, const VLXUnicodeString&, GatherInstances)
+VLXKDM_VARIADIC_SETTER(SetValueInstances, int, GatherInstances)
+VLXKDM_VARIADIC_SETTER(SetValueIntegers, const VLXUnicodeString&, GatherIntegers)
+VLXKDM_VARIADIC_SETTER(SetValueIntegers, int, GatherIntegers)
+VLXKDM_VARIADIC_SETTER(SetValueStrings, const VLXUnicodeString&, GatherTexts)
+VLXKDM_VARIADIC_SETTER(SetValueStrings, int, GatherTexts)
+
+#undef VLXKDM_VARIADIC_SETTER

@@ -1245,8 +1245,13 @@ final class BinaryCodec {
                 }
                 case STRING:
                     return in.str("a String value");
-                case STRINGS:
-                    return in.strs("a String value");
+                case STRINGS: {
+                    String[] a = new String[in.count("a String array length", 1)];
+                    for (int i = 0; i < a.length; i++) {
+                        a[i] = in.str("a String value");
+                    }
+                    return a;
+                }
                 case DATE:
                     return in.zlong("a Date value");
                 case DATES: {

@@ -844,7 +844,9 @@ final class XmlSupport {
                 int offset = (zh * 3600 + zm * 60) * (zone.charAt(0) == '-' ? -1 : 1);
                 seconds -= offset;
             }
-            return Math.addExact(Math.multiplyExact(seconds, 1000L), ms);
+            // (seconds + 1) * 1000 - (1000 - ms) reaches Long.MIN_VALUE without overflowing on the way
+            return seconds < 0 && ms > 0 ? Math.addExact(Math.multiplyExact(seconds + 1, 1000L), ms - 1000L)
+                    : Math.addExact(Math.multiplyExact(seconds, 1000L), ms);
         } catch (DateTimeException | ArithmeticException e) {
             throw new IllegalArgumentException("'" + clip(text) + "' is not a valid Date: " + e.getMessage(), e);
         } catch (IllegalArgumentException e) {

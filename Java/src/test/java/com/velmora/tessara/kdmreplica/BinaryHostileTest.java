@@ -1,0 +1,413 @@
+package com.velmora.tessara.kdmreplica;
+
+import static com.velmora.tessara.kdmreplica.BinaryFx.allocated;
+import static com.velmora.tessara.kdmreplica.BinaryFx.dump;
+import static com.velmora.tessara.kdmreplica.BinaryFx.generate;
+import static com.velmora.tessara.kdmreplica.BinaryFx.payloadOf;
+import static com.velmora.tessara.kdmreplica.BinaryFx.refused;
+import static com.velmora.tessara.kdmreplica.BinaryFx.seal;
+import static org.junit.jupiter.api.Assertions.assertArrayEquals;
+import static org.junit.jupiter.api.Assertions.assertEquals;
+import static org.junit.jupiter.api.Assertions.assertTrue;
+
+import java.io.ByteArrayOutputStream;
+import java.util.Arrays;
+import java.util.Random;
+import java.util.function.Consumer;
+import java.util.zip.Deflater;
+import java.util.zip.DeflaterOutputStream;
+import org.junit.jupiter.api.Test;
+import org.junit.jupiter.api.Timeout;
+
+/**
+ * Truncated, corrupted and hostile binary replicas: each is refused with a
+ * {@link ReplicaBinaryException} naming what and where, quickly and without allocating out of
+ * proportion to the input.
+ */
+class BinaryHostileTest {
+    /** Allocation allowed per input byte while refusing (plus a fixed 1 MB). */
+    private static final long FACTOR = 64;
+
+    private static final int INT = 0;
+    private static final int DOUBLE = 1;
+    private static final int STRING = 2;
+    private static final int DATE = 3;
+    private static final int BOOL = 4;
+    private static final int BINARY = 5;
+    private static final int REL = 6;
+    private static final int MULTI = 8;
+
+    // ------------------------------------------------------------ payload building
+
+    private static BinaryCodec.Out start(int classes) {
+        BinaryCodec.Out o = new BinaryCodec.Out(64);
+        o.str("r");
+        o.str("");
+        o.uvar(classes);
+        return o;
+    }
+
+    /** A class whose attributes are named a0, a1, ... with the given codes (type | MULTI). */
+    private static void cls(BinaryCodec.Out o, String name, String sup, int... attrs) {
+        o.str(name);
+        o.str(sup);
+        o.str("");
+        o.str("");
+        o.str("");
+        o.uvar(0);
+        o.u8(4);
+        o.uvar(attrs.length);
+        for (int k = 0; k < attrs.length; k++) {
+            o.str("a" + k);
+            o.u8(attrs[k] & 7);
+            o.u8(attrs[k] >> 3 & 1);
+            o.zint(0);
+            o.str("");
+            o.str("");
+            o.uvar(0);
+            o.uvar(0);
+        }
+    }
+
+    /** One class of one attribute, one live instance without identifier whose value the caller writes. */
+    private static byte[] oneValue(int code, Consumer<BinaryCodec.Out> value) {
+        BinaryCodec.Out o = start(1);
+        cls(o, "A", "", code);
+        o.uvar(1);
+        o.u8(0);
+        o.uvar(0);
+        o.uvar(0);
+        o.u8(1);
+        value.accept(o);
+        return seal(o, false);
+    }
+
+    @Test
+    void theHandBuiltPayloadsAreValidWhenHonest() {
+        Replica r = Replica.getReplicaFromBinary(oneValue(INT | MULTI, o -> {
+            o.uvar(2);
+            o.zint(-5);
+            o.zint(Integer.MAX_VALUE);
+        }), false);
+        assertArrayEquals(new int[] {-5, Integer.MAX_VALUE}, (int[]) r.getModels().getItem(0).getInstances().getItem(0)
+                .getValue("a0"));
+        Replica b = Replica.getReplicaFromBinary(oneValue(REL, o -> o.uvar(0)), false);
+        Instance x = b.getModels().getItem(0).getInstances().getItem(0);
+        assertEquals(x, x.getValue("a0"));
+    }
+
+    // ------------------------------------------------------------ truncation and flips
+
+    @Test
+    @Timeout(120)
+    void everyTruncationIsRefused() {
+        for (boolean compressed : new boolean[] {false, true}) {
+            byte[] b = Replica.getBinaryFromReplica(generate(7, 8), compressed);
+            for (int len = 0; len < b.length; len++) {
+                refused(Arrays.copyOf(b, len), compressed, FACTOR);
+            }
+        }
+        // Truncated payloads behind a correct header and checksum: the parser itself must notice.
+        byte[] p = payloadOf(Replica.getBinaryFromReplica(generate(8, 8), false), false);
+        for (int len = 0; len < p.length; len++) {
+            refused(seal(Arrays.copyOf(p, len), false), false, FACTOR);
+        }
+    }
+
+    @Test
+    @Timeout(300)
+    void randomByteFlipsAreRefusedOrReadAsAValidReplica() {
+        Random rnd = new Random(0x5EED_B175L);
+        byte[][] valid = {Replica.getBinaryFromReplica(generate(21, 6), false),
+            Replica.getBinaryFromReplica(generate(22, 6), true)};
+        // Flips anywhere in the buffer: the header checks, the inflater or the checksum catch them.
+        for (int i = 0; i < 10_000; i++) {
+            boolean compressed = (i & 1) == 1;
+            byte[] m = mutate(valid[i & 1], rnd);
+            refused(m, compressed, FACTOR);
+        }
+        // Flips in the payload behind a recomputed checksum: the parser refuses them, or the
+        // result is a replica that writes and reads back like any other.
+        byte[] payload = payloadOf(valid[0], false);
+        int accepted = 0;
+        for (int i = 0; i < 10_000; i++) {
+            byte[] m = seal(mutate(payload, rnd), false);
+            long before = allocated();
+            Replica r;
+            try {
+                r = Replica.getReplicaFromBinary(m, false);
+            } catch (ReplicaBinaryException e) {
+                long used = allocated() - before;
+                assertTrue(used <= FACTOR * m.length + (1 << 20), "allocated " + used + " for " + m.length + " bytes");
+                continue;
+            }
+            accepted++;
+            byte[] again = Replica.getBinaryFromReplica(r, false);
+            assertEquals(dump(r), dump(Replica.getReplicaFromBinary(again, false)));
+        }
+        assertTrue(accepted < 10_000 / 2, "most mutations must be refused, " + accepted + " were read");
+    }
+
+    private static byte[] mutate(byte[] valid, Random rnd) {
+        byte[] m = valid.clone();
+        int flips = 1 + rnd.nextInt(4);
+        for (int f = 0; f < flips; f++) {
+            int at = rnd.nextInt(m.length);
+            switch (rnd.nextInt(3)) {
+                case 0:
+                    m[at] ^= (byte) (1 << rnd.nextInt(8));
+                    break;
+                case 1:
+                    m[at] = (byte) (rnd.nextBoolean() ? 0xFF : 0x80);
+                    break;
+                default:
+                    m[at] = (byte) (m[at] + 1 + rnd.nextInt(255));
+                    break;
+            }
+        }
+        return m;
+    }
+
+    // ------------------------------------------------------------ impossible counts and lengths
+
+    @Test
+    void countsAndLengthsNearIntegerMaxValueAreRefusedWithoutAllocating() {
+        long max = Integer.MAX_VALUE;
+        BinaryCodec.Out o = start((int) max);
+        refused(seal(o, false), false, FACTOR, "class count is 2147483647");
+        refused(seal(o, true), true, FACTOR, "class count is 2147483647");
+
+        o = new BinaryCodec.Out(16);
+        o.uvar((max - 1) << 1);
+        refused(seal(o, false), false, FACTOR, "replica name announces 2147483646 bytes");
+
+        o = start(1);
+        o.str("A");
+        o.str("");
+        o.str("");
+        o.str("");
+        o.str("");
+        o.uvar(max);
+        refused(seal(o, false), false, FACTOR, "scope name of class 'A' count is 2147483647");
+        o.n -= 5;
+        o.uvar(0);
+        o.u8(4);
+        o.uvar(max - 1);
+        refused(seal(o, false), false, FACTOR, "attribute count of class 'A' is 2147483646");
+
+        o = start(1);
+        cls(o, "A", "", INT);
+        o.uvar(max);
+        refused(seal(o, false), false, FACTOR, "live instance count of class 'A' is 2147483647");
+
+        o = start(1);
+        cls(o, "A", "", INT);
+        o.uvar(0);
+        o.uvar(0);
+        o.uvar(max);
+        refused(seal(o, false), false, FACTOR, "count of instances outside the replica is 2147483647");
+
+        String[] array = {"an Integer", "a Double", "a String", "a Date", "a Boolean", "a Binary", "a Relationship"};
+        for (int type = INT; type <= REL; type++) {
+            String name = array[type];
+            refused(oneValue(type | MULTI, x -> x.uvar(max)), false, FACTOR, name + " array length is 2147483647");
+        }
+        refused(oneValue(DOUBLE | MULTI, x -> {
+            x.uvar(2);
+            x.i64(0);
+            x.u8(0);
+        }), false, FACTOR, "Double array length is 2");
+        refused(oneValue(BINARY, x -> x.uvar(max)), false, FACTOR, "Binary value announces 2147483647 bytes");
+        refused(oneValue(STRING, x -> x.uvar(max << 1 | 1)), false, FACTOR, "String value announces 2147483647");
+        refused(oneValue(REL, x -> x.uvar(max)), false, FACTOR, "target is 2147483647, outside the 1 instances");
+        refused(oneValue(INT, x -> x.raw(new byte[] {(byte) 0xFF, (byte) 0xFF, (byte) 0xFF, (byte) 0xFF, 0x7F})),
+                false, FACTOR, "malformed number in an Integer value");
+        refused(oneValue(DATE, x -> {
+            for (int i = 0; i < 11; i++) {
+                x.u8(0xFF);
+            }
+        }), false, FACTOR, "malformed number in a Date value");
+    }
+
+    @Test
+    void instanceCountsMustLeaveRoomForTheirValues() {
+        // 2000 attributes: each instance owes a 250-byte presence bitmap. 1000 headers fit in the
+        // bytes that remain, their bitmaps do not: refused before 1000 value arrays are made.
+        int[] codes = new int[2000];
+        BinaryCodec.Out o = start(1);
+        cls(o, "Wide", "", codes);
+        o.uvar(1000);
+        for (int i = 0; i < 1100; i++) {
+            o.u8(0);
+        }
+        refused(seal(o, false), false, 4, "live instance count of class 'Wide' is 1000");
+    }
+
+    @Test
+    void headerLengthsThatCannotBeTrueAreRefused() {
+        byte[] plain = Replica.getBinaryFromReplica(generate(5, 3), false);
+        byte[] packed = Replica.getBinaryFromReplica(generate(5, 3), true);
+        byte[] b = plain.clone();
+        Arrays.fill(b, 8, 12, (byte) 0xFF);
+        refused(b, false, FACTOR, "announces a payload of 4294967295 bytes");
+        b = plain.clone();
+        Arrays.fill(b, 12, 16, (byte) 0xFF);
+        refused(b, false, FACTOR, "truncated", "4294967295 stored bytes");
+        b = packed.clone();
+        Arrays.fill(b, 8, 12, (byte) 0xFF);
+        refused(b, true, FACTOR, "more than the cap");
+        b = Arrays.copyOf(plain, plain.length + 3);
+        refused(b, false, FACTOR, "stored bytes but " + (plain.length - 17) + " follow");
+    }
+
+    // ------------------------------------------------------------ inflation
+
+    private static byte[] deflate(byte[] data, int times) {
+        ByteArrayOutputStream bytes = new ByteArrayOutputStream();
+        try (DeflaterOutputStream out = new DeflaterOutputStream(bytes, new Deflater(9))) {
+            for (int i = 0; i < times; i++) {
+                out.write(data);
+            }
+        } catch (java.io.IOException e) {
+            throw new AssertionError(e);
+        }
+        return bytes.toByteArray();
+    }
+
+    private static byte[] compressedBuffer(byte[] stream, long declared) {
+        byte[] b = new byte[BinaryCodec.HEADER_SIZE + stream.length];
+        System.arraycopy(BinaryCodec.MAGIC, 0, b, 0, 4);
+        b[4] = (byte) BinaryCodec.VERSION;
+        b[5] = (byte) BinaryCodec.FLAG_COMPRESSED;
+        for (int i = 0; i < 4; i++) {
+            b[8 + i] = (byte) (declared >>> (24 - 8 * i));
+            b[12 + i] = (byte) (stream.length >>> (24 - 8 * i));
+        }
+        System.arraycopy(stream, 0, b, BinaryCodec.HEADER_SIZE, stream.length);
+        return b;
+    }
+
+    @Test
+    @Timeout(120)
+    void compressedStreamsThatInflateTooFarAreStopped() {
+        byte[] bomb = deflate(new byte[1 << 20], 256); // 256 MB of zeros in about 250 KB
+        assertTrue(bomb.length < 1 << 20);
+        refused(compressedBuffer(bomb, 1000), true, FACTOR, "inflates past the 1000 bytes");
+        refused(compressedBuffer(bomb, 0xFFFFFFFFL), true, FACTOR, "more than the cap");
+        // An honest-looking length under the cap: inflation stops there, allocation stays near it.
+        long declared = 64 << 20;
+        assertTrue(declared < (long) bomb.length * BinaryCodec.MAX_INFLATE_RATIO);
+        long before = allocated();
+        refused(compressedBuffer(bomb, declared), true, 3L * BinaryCodec.MAX_INFLATE_RATIO, "inflates past the "
+                + declared + " bytes");
+        assertTrue(allocated() - before < 3 * declared, "allocated " + (allocated() - before));
+
+        byte[] payload = payloadOf(Replica.getBinaryFromReplica(generate(9, 3), false), false);
+        byte[] stream = deflate(payload, 1);
+        byte[] tail = Arrays.copyOf(stream, stream.length + 4);
+        refused(compressedBuffer(tail, payload.length), true, FACTOR, "4 bytes follow the end of the compressed stream");
+        refused(compressedBuffer(stream, payload.length + 1), true, FACTOR, "inflates to " + payload.length);
+        refused(compressedBuffer(stream, payload.length), true, FACTOR, "checksum mismatch");
+        byte[] garbage = stream.clone();
+        garbage[2] ^= 0x55;
+        refused(compressedBuffer(garbage, payload.length), true, FACTOR, "compressed stream");
+    }
+
+    // ------------------------------------------------------------ invalid contents
+
+    @Test
+    void invalidContentIsRefusedNamingWhatAndWhere() {
+        byte[] valid = Replica.getBinaryFromReplica(generate(2, 2), false);
+        byte[] b = valid.clone();
+        b[0] = 'X';
+        assertEquals(0, refused(b, false, FACTOR, "not a binary replica").getOffset());
+        b = valid.clone();
+        b[4] = 2;
+        refused(b, false, FACTOR, "unsupported version 2");
+        b = valid.clone();
+        b[5] = 4;
+        refused(b, false, FACTOR, "unknown flags 0x4");
+        b = valid.clone();
+        b[7] = 1;
+        refused(b, false, FACTOR, "reserved header bytes");
+        b = valid.clone();
+        b[16] ^= 1;
+        refused(b, false, FACTOR, "checksum mismatch", "offset 16 of the buffer");
+
+        BinaryCodec.Out o = start(2);
+        cls(o, "A", "");
+        cls(o, "A", "");
+        refused(seal(o, false), false, FACTOR, "two classes are named 'A'");
+        o = start(1);
+        cls(o, "1A", "");
+        refused(seal(o, false), false, FACTOR, "'1A' is not a valid name");
+        o = start(1);
+        cls(o, "A", "Zed");
+        refused(seal(o, false), false, FACTOR, "class 'A' names super class 'Zed'");
+        o = start(2);
+        cls(o, "A", "B");
+        cls(o, "B", "A");
+        refused(seal(o, false), false, FACTOR, "cyclic super class chain");
+        o = start(1001);
+        for (int i = 0; i < 1001; i++) {
+            cls(o, "K" + i, i == 0 ? "" : "K" + (i - 1));
+        }
+        refused(seal(o, false), false, FACTOR, "super class chain of class 'K1000' is longer than 1000");
+        o = start(2);
+        cls(o, "A", "", INT);
+        cls(o, "B", "A", STRING);
+        refused(seal(o, false), false, FACTOR, "'B.a0' clashes with attribute 'A.a0'");
+
+        o = start(1);
+        int at = o.n;
+        cls(o, "A", "", INT);
+        o.b[at + 12] = 9; // the type code of a0
+        ReplicaBinaryException e = refused(seal(o, false), false, FACTOR, "unknown type code 9 of attribute 'a0'");
+        assertEquals(at + 12, e.getOffset());
+        assertTrue(e.isPayloadOffset());
+
+        o = start(1);
+        cls(o, "A", "");
+        o.b[at + 7] = 0x40; // class flags
+        refused(seal(o, false), false, FACTOR, "invalid flags 0x40 of class 'A'");
+
+        o = start(1);
+        cls(o, "A", "");
+        o.uvar(2);
+        for (int i = 0; i < 2; i++) {
+            o.u8(1 << 4);
+            o.str("same");
+        }
+        refused(seal(o, false), false, FACTOR, "already has a live instance with identifier \"same\"");
+        o = start(1);
+        cls(o, "A", "");
+        o.uvar(1);
+        o.u8(4);
+        refused(seal(o, false), false, FACTOR, "live instance of class 'A' has the state bits 0x4");
+        o = start(1);
+        cls(o, "A", "");
+        o.uvar(1);
+        o.u8(3 << 4);
+        refused(seal(o, false), false, FACTOR, "unknown identifier kind 3");
+
+        refused(oneValue(BOOL, x -> x.u8(2)), false, FACTOR, "is the byte 2, not a Boolean");
+        refused(oneValue(BOOL | MULTI, x -> {
+            x.uvar(3);
+            x.u8(0x08);
+        }), false, FACTOR, "sets bits beyond its 3 elements");
+        refused(oneValue(STRING, x -> x.raw(new byte[] {4, (byte) 0xC3, 0x28})), false, FACTOR, "not valid UTF-8");
+        refused(oneValue(STRING, x -> x.raw(new byte[] {7, 0, 65, 0})), false, FACTOR, "odd number of bytes");
+        refused(oneValue(INT, x -> {
+            x.zint(1);
+            x.u8(0);
+        }), false, FACTOR, "1 bytes follow the last instance's values");
+        o = start(1);
+        cls(o, "A", "", INT);
+        o.uvar(1);
+        o.u8(0);
+        o.uvar(0);
+        o.uvar(0);
+        o.u8(2);
+        refused(seal(o, false), false, FACTOR, "presence bitmap of A[#0] marks attributes beyond its 1");
+    }
+}

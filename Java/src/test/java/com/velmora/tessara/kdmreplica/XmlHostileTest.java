@@ -1,0 +1,293 @@
+package com.velmora.tessara.kdmreplica;
+
+import static com.velmora.tessara.kdmreplica.Fx.addAttr;
+import static com.velmora.tessara.kdmreplica.Fx.addClass;
+import static com.velmora.tessara.kdmreplica.XmlFx.dump;
+import static com.velmora.tessara.kdmreplica.XmlFx.failsAt;
+import static org.junit.jupiter.api.Assertions.assertEquals;
+import static org.junit.jupiter.api.Assertions.assertFalse;
+import static org.junit.jupiter.api.Assertions.assertThrows;
+import static org.junit.jupiter.api.Assertions.assertTrue;
+
+import java.nio.charset.StandardCharsets;
+import java.nio.file.Files;
+import java.nio.file.Path;
+import java.util.List;
+import java.util.function.Consumer;
+import java.util.stream.Stream;
+import org.junit.jupiter.api.AfterEach;
+import org.junit.jupiter.api.BeforeEach;
+import org.junit.jupiter.api.Test;
+import org.junit.jupiter.api.io.TempDir;
+import org.junit.jupiter.params.ParameterizedTest;
+import org.junit.jupiter.params.provider.Arguments;
+import org.junit.jupiter.params.provider.MethodSource;
+
+/**
+ * Hostile and bad inputs: refused with an exception that names the line, column and offending
+ * name; nothing is read from disk or the network; the replica is unchanged.
+ */
+class XmlHostileTest {
+    private static final String SECRET = "TOP-SECRET-42";
+
+    @TempDir
+    Path dir;
+    private XmlFx.Listener net;
+    private Path secret;
+    private Replica target;
+    private String before;
+
+    @BeforeEach
+    void setUp() throws Exception {
+        net = new XmlFx.Listener();
+        secret = dir.resolve("secret.txt");
+        Files.write(secret, SECRET.getBytes(StandardCharsets.US_ASCII));
+        target = new Replica("target");
+        Model part = addClass(target, "Part", null);
+        addAttr(part, "qty", AttributeType.Integer, false);
+        addAttr(part, "name", AttributeType.String, false);
+        addAttr(part, "tags", AttributeType.String, true);
+        addAttr(part, "peer", AttributeType.Relationship, false).setTargetNames(new String[] {"Part"});
+        addClass(target, "Other", null);
+        Instance p = part.createInstance();
+        p.setID("p0");
+        p.setValue("qty", 1);
+        before = dump(target);
+    }
+
+    @AfterEach
+    void tearDown() throws Exception {
+        Replica.setFeature("validate", false);
+        assertEquals(0, net.connections(), "nothing may be fetched from the network");
+        net.close();
+        assertEquals(before, dump(target), "the replica is unchanged");
+    }
+
+    /** Every way a document reaches the package, so each refusal is checked on each path. */
+    private List<Consumer<String>> readers() throws Exception {
+        Path file = dir.resolve("doc.xml");
+        return List.of(
+                target::populatesFromXmlString,
+                Replica::readFromXmlString,
+                xml -> {
+                    write(file, xml);
+                    target.populatesFromXmlFile(file.toString());
+                },
+                xml -> {
+                    write(file, xml);
+                    Replica.readFromXmlFile(file.toString());
+                },
+                target::insertSchemaString);
+    }
+
+    private static void write(Path p, String text) {
+        try {
+            Files.write(p, text.getBytes(StandardCharsets.UTF_8));
+        } catch (java.io.IOException e) {
+            throw new IllegalStateException(e);
+        }
+    }
+
+    private void refusedEverywhere(String doc, int line, String... fragments) throws Exception {
+        for (Consumer<String> read : readers()) {
+            for (boolean validate : new boolean[] {false, true}) {
+                Replica.setFeature("validate", validate);
+                XmlDocumentException e = failsAt(line, () -> read.accept(doc), fragments);
+                assertFalse(e.getMessage().contains(SECRET) || e.getMessage().contains("FETCHED"), e.getMessage());
+            }
+        }
+    }
+
+    @Test
+    void doctypesAreRefusedOutrightWhateverTheyDeclare() throws Exception {
+        String fileUrl = secret.toUri().toString();
+        String[] doctypes = {
+            // XXE with a file URL and with an http URL
+            "<!DOCTYPE replica [<!ENTITY x SYSTEM \"" + fileUrl + "\">]>",
+            "<!DOCTYPE replica [<!ENTITY x SYSTEM \"" + net.url("xxe") + "\">]>",
+            // external DTD, and an external parameter entity
+            "<!DOCTYPE replica SYSTEM \"" + net.url("ext.dtd") + "\">",
+            "<!DOCTYPE replica PUBLIC \"-//X//Y\" \"" + fileUrl + "\">",
+            "<!DOCTYPE replica [<!ENTITY % p SYSTEM \"" + net.url("p") + "\"> %p;]>",
+            // billion laughs
+            "<!DOCTYPE replica [<!ENTITY a \"ha\"><!ENTITY b \"&a;&a;&a;&a;&a;&a;&a;&a;&a;&a;\">"
+                + "<!ENTITY c \"&b;&b;&b;&b;&b;&b;&b;&b;&b;&b;\"><!ENTITY d \"&c;&c;&c;&c;&c;&c;&c;&c;&c;&c;\">"
+                + "<!ENTITY e \"&d;&d;&d;&d;&d;&d;&d;&d;&d;&d;\"><!ENTITY f \"&e;&e;&e;&e;&e;&e;&e;&e;&e;&e;\">"
+                + "<!ENTITY g \"&f;&f;&f;&f;&f;&f;&f;&f;&f;&f;\"><!ENTITY h \"&g;&g;&g;&g;&g;&g;&g;&g;&g;&g;\">"
+                + "<!ENTITY i \"&h;&h;&h;&h;&h;&h;&h;&h;&h;&h;\">]>",
+            "<!DOCTYPE replica>",
+        };
+        for (String d : doctypes) {
+            refusedEverywhere("<?xml version=\"1.0\"?>\n" + d + "\n<replica xmlns=\"urn:corvexa:replica:1\">"
+                    + "<Part><name>&x;&i;</name></Part></replica>", 2, "DOCTYPE", "refused");
+        }
+    }
+
+    @Test
+    void entityReferencesWithoutADoctypeAreNotWellFormed() throws Exception {
+        refusedEverywhere("<replica xmlns=\"urn:corvexa:replica:1\">\n<Part><name>&x;</name></Part></replica>", 2,
+                "not well-formed", "\"x\"");
+    }
+
+    @Test
+    void schemaLocationsElsewhereAreIgnoredOrRefusedButNeverRead() throws Exception {
+        String embedded = "<replica xmlns=\"urn:corvexa:replica:1\" xmlns:xsi=\"http://www.w3.org/2001/XMLSchema-instance\"\n"
+                + " xsi:schemaLocation=\"urn:corvexa:replica:1 " + net.url("a.xsd") + " urn:other " + secret.toUri()
+                + "\" xsi:noNamespaceSchemaLocation=\"" + net.url("b.xsd") + "\">\n";
+        Replica.setFeature("validate", true);
+        // With an embedded schema (a new replica) or a known one (populating), the locations are not used.
+        Replica fresh = Replica.readFromXmlString(embedded.replace("\">\n", "\">\n" + schemaOf(target))
+                + "<Part><qty>2</qty></Part></replica>");
+        assertEquals(2, fresh.getModels().getItem("Part").getInstances().getItem(0).getValue("qty"));
+        assertEquals(net.url("a.xsd"), fresh.getSchemaLocation());
+        Replica copy = new Replica("copy");
+        copy.insertSchemaString(target.getXsd());
+        copy.populatesFromXmlString(embedded + "<Part><qty>3</qty></Part></replica>");
+        assertEquals(1, copy.getModels().getItem("Part").getInstances().getCount());
+        Replica.setFeature("validate", false);
+        // Without a schema, a URL is refused unread; a location for another namespace is no schema at all.
+        failsAt(2, () -> Replica.readFromXmlString(embedded + "</replica>"), "is not a local file",
+                net.url("a.xsd"), "nothing was fetched");
+        failsAt(1, () -> Replica.readFromXmlString("<replica xmlns=\"urn:corvexa:replica:1\""
+                + " xmlns:xsi=\"http://www.w3.org/2001/XMLSchema-instance\" xsi:schemaLocation=\"urn:other "
+                + secret + "\"/>"), "has no schema");
+    }
+
+    private static String schemaOf(Replica r) {
+        String xsd = r.getXsd();
+        return xsd.substring(xsd.indexOf("<xs:schema"));
+    }
+
+    @Test
+    void schemasImportingFromTheNetworkAreRefusedUnread() throws Exception {
+        for (String construct : new String[] {
+            "<xs:import namespace=\"urn:x\" schemaLocation=\"" + net.url("x.xsd") + "\"/>",
+            "<xs:include schemaLocation=\"" + net.url("y.xsd") + "\"/>",
+            "<xs:import namespace=\"urn:x\" schemaLocation=\"" + secret + "\"/>"}) {
+            String xsd = "<xs:schema xmlns:xs=\"http://www.w3.org/2001/XMLSchema\">\n" + construct
+                    + "\n<xs:complexType name=\"New\"/></xs:schema>";
+            failsAt(2, () -> target.insertSchemaString(xsd), "refused", "nothing was read");
+            Path file = dir.resolve("s.xsd");
+            write(file, xsd);
+            failsAt(2, () -> target.insertSchemaFile(file.toString()), "refused", "nothing was");
+            // embedded in a document, the same schema is refused as well
+            failsAt(2, () -> Replica.readFromXmlString("<replica xmlns=\"urn:corvexa:replica:1\">"
+                    + xsd + "</replica>"), "refused");
+        }
+    }
+
+    private String goodDocument() {
+        return target.getXml(false, true);
+    }
+
+    @Test
+    void everyTruncationOfADocumentFailsCleanly() throws Exception {
+        Replica.setFeature("indent", false);
+        String xml;
+        try {
+            Instance x = target.getModels().getItem("Part").getInstances().getItem(0);
+            target.getModels().getItem("Part").createInstance().setValue("peer", x);
+            x.setValue("tags", new String[] {"a", "b\u0001"});
+            xml = target.getXml(true, true);
+        } finally {
+            Replica.setFeature("indent", true);
+        }
+        Replica copy = new Replica("copy");
+        copy.insertSchemaString(target.getXsd());
+        String copyBefore = dump(copy);
+        int end = xml.lastIndexOf('>');
+        for (int n = 0; n < end; n += 1 + n / 200) {
+            String cut = xml.substring(0, n);
+            IllegalArgumentException e = assertThrows(IllegalArgumentException.class,
+                    () -> Replica.readFromXmlString(cut), () -> "prefix of length " + cut.length());
+            assertTrue(e instanceof XmlDocumentException, e.toString());
+            XmlDocumentException d = assertThrows(XmlDocumentException.class, () -> copy.populatesFromXmlString(cut));
+            assertTrue(d.getLine() > 0 || n == 0, d.getMessage());
+            assertEquals(copyBefore, dump(copy));
+        }
+        Replica.readFromXmlString(xml);
+        target.getModels().getItem("Part").getInstances().remove(1);
+        target.getModels().getItem("Part").getInstances().getItem(0).clearValue("tags");
+    }
+
+    static Stream<Arguments> malformed() {
+        String head = "<replica xmlns=\"urn:corvexa:replica:1\" xmlns:xsi=\"http://www.w3.org/2001/XMLSchema-instance\">\n"
+                + "<Part key=\"k1\" id=\"a\"><qty>5</qty></Part>\n";
+        return Stream.of(
+                Arguments.of(head + "<Part><qty>five</qty></Part>\n</replica>", 3, new String[] {"'five'", "'Part.qty'",
+                    "not an Integer"}),
+                Arguments.of(head + "<Part><qty>99999999999</qty></Part>\n</replica>", 3, new String[] {"'Part.qty'",
+                    "outside the range"}),
+                Arguments.of(head + "<Part>\n<qty><b/></qty></Part>\n</replica>", 4, new String[] {"'b'", "'Part.qty'"}),
+                Arguments.of(head + "<Pert/>\n</replica>", 3, new String[] {"unknown class 'Pert'"}),
+                Arguments.of(head + "<Part><wieght>1</wieght></Part>\n</replica>", 3,
+                        new String[] {"no attribute 'wieght'"}),
+                Arguments.of(head + "<Part id=\"a\"/>\n</replica>", 3, new String[] {"identifier \"a\""}),
+                Arguments.of(head + "<Part id=\"p0\"/>\n</replica>", 3, new String[] {"identifier \"p0\""}),
+                Arguments.of(head + "<Part key=\"k1\"/>\n</replica>", 3, new String[] {"key 'k1' is used twice"}),
+                Arguments.of(head + "<Part>\n<peer ref=\"k9\"/></Part>\n</replica>", 4,
+                        new String[] {"'Part.peer'", "key 'k9'"}),
+                Arguments.of(head + "<Other key=\"o\"/><Part>\n<peer ref=\"o\"/></Part>\n</replica>", 4,
+                        new String[] {"'Part.peer'", "class 'Other'", "target class [Part]"}),
+                Arguments.of(head + "<Part><qty>1</qty>\n<qty>2</qty></Part>\n</replica>", 4,
+                        new String[] {"'Part.qty' is single-valued"}),
+                Arguments.of(head + "<Part><peer ref=\"k1\"/>\n<peer ref=\"k1\"/></Part>\n</replica>", 4,
+                        new String[] {"'Part.peer' is single-valued"}),
+                Arguments.of(head + "<Part>\n<name xsi:nil=\"true\"/></Part>\n</replica>", 4,
+                        new String[] {"'Part.name' is single-valued", "xsi:nil"}),
+                Arguments.of(head + "<Part><tags>a</tags>\n<tags xsi:nil=\"true\"/></Part>\n</replica>", 4,
+                        new String[] {"'Part.tags'", "xsi:nil"}),
+                Arguments.of(head + "<Part>\n<name esc=\"bad\\x\"/></Part>\n</replica>", 4,
+                        new String[] {"'Part.name'", "malformed escape"}),
+                Arguments.of(head + "<Part>\n<name color=\"red\">x</name></Part>\n</replica>", 4,
+                        new String[] {"'color'", "'Part.name'"}),
+                Arguments.of(head + "<Part state=\"gone\"/>\n</replica>", 3, new String[] {"state 'gone'"}),
+                Arguments.of(head + "<Part idBin=\"%%%\"/>\n</replica>", 3, new String[] {"idBin", "'%%%'"}),
+                Arguments.of(head + "<Part>text</Part>\n</replica>", 3, new String[] {"unexpected text 'text'"}),
+                Arguments.of(head + "<x:Part xmlns:x=\"urn:elsewhere\"/>\n</replica>", 3,
+                        new String[] {"'x:Part'", "urn:elsewhere"}),
+                Arguments.of(head.replace("<replica ", "<replica format=\"2\" "), 1, new String[] {"format '2'"}),
+                Arguments.of(head + "</replica>\n<more/>", 4, new String[] {"not well-formed"}),
+                Arguments.of("<replika xmlns=\"urn:corvexa:replica:1\"/>", 1, new String[] {"'replika'"}),
+                Arguments.of(head + "<Part><qty>1</qty></Parts>\n</replica>", 3, new String[] {"not well-formed",
+                    "Parts"}));
+    }
+
+    @ParameterizedTest(name = "{2}")
+    @MethodSource("malformed")
+    void badDocumentsNameTheLineColumnAndOffendingName(String doc, int line, String[] fragments) throws Exception {
+        failsAt(line, () -> target.populatesFromXmlString(doc), fragments);
+        Path file = dir.resolve("bad.xml");
+        write(file, doc);
+        XmlDocumentException e = failsAt(line, () -> target.populatesFromXmlFile(file.toString()), fragments);
+        assertTrue(e.getMessage().startsWith("XML file '" + file), e.getMessage());
+        assertTrue(e.getSource().contains("bad.xml"));
+    }
+
+    @Test
+    void theGoodDocumentOfThoseCasesIsAccepted() {
+        Replica copy = new Replica("copy");
+        copy.insertSchemaString(target.getXsd());
+        copy.populatesFromXmlString(goodDocument());
+        assertEquals(1, copy.getModels().getItem("Part").getInstances().getCount());
+    }
+
+    @Test
+    void inputsThatAreNotXmlAtAllFailClearly() throws Exception {
+        for (String doc : new String[] {"", "   ", "not xml", "<", "\u0000", "<replica xmlns='urn:corvexa:replica:1'>"}) {
+            IllegalArgumentException e = assertThrows(XmlDocumentException.class,
+                    () -> target.populatesFromXmlString(doc));
+            assertTrue(e.getMessage().startsWith("the XML string"), e.getMessage());
+        }
+        Path bin = dir.resolve("bin.xml");
+        Files.write(bin, new byte[] {(byte) 0xff, (byte) 0xfe, 0, 0, 0x3c, 0x00, (byte) 0xc3, 0x28});
+        assertThrows(XmlDocumentException.class, () -> target.populatesFromXmlFile(bin.toString()));
+        IllegalArgumentException missing = assertThrows(IllegalArgumentException.class,
+                () -> target.populatesFromXmlFile(dir.resolve("none.xml").toString()));
+        assertTrue(missing.getMessage().contains("none.xml") && missing.getMessage().contains("NoSuchFile"),
+                missing.getMessage());
+        assertThrows(IllegalArgumentException.class, () -> target.populatesFromXmlString(null));
+        assertThrows(IllegalArgumentException.class, () -> Replica.readFromXmlFile(null));
+        assertThrows(IllegalArgumentException.class, () -> target.insertSchemaString(null));
+    }
+}

@@ -1,0 +1,344 @@
+// The value converters: times at the rounding boundaries, boxed scalars, and the list converters
+// with null elements, elements that throw and proxies without Java object. Every Java call the
+// converters make runs under the JVM's JNI checks: a call with an exception pending or a local
+// reference left behind fails the process.
+#include <climits>
+#include <cmath>
+#include <string>
+#include <vector>
+
+#include <gtest/gtest.h>
+
+#include "ValuesSupport.h"
+#include "VLXListValVLXBinary.h"
+#include "VLXListValVLXTime.h"
+
+using namespace corvexa_test;
+using corvexa::Values;
+
+namespace {
+
+class Converters : public ::testing::Test {
+ protected:
+  static void SetUpTestSuite()
+  {
+    VLXKDMInstanceValue start;
+    start.SetInteger(0);  // starts the Java side
+  }
+  JNIEnv* env = Env();
+};
+
+// ---- Times -----------------------------------------------------------------------------------
+
+TEST_F(Converters, DateMillisecondsRoundToSecondsAtTheBoundaries)
+{
+  const struct {
+    jlong ms;
+    time_t seconds;
+  } cases[] = {{1499, 1}, {1500, 2}, {-1, 0}, {-1500, -1}, {-1501, -1}, {-2500, -2}, {0, 0}, {-499, 0},
+               {-1400, 0}, {999, 1}, {LLONG_MAX, LLONG_MAX / 1000 + 1}, {LLONG_MIN, LLONG_MIN / 1000}};
+  std::vector<jobject> dates;
+  for (const auto& c : cases) {
+    SCOPED_TRACE(c.ms);
+    Local date(NewDate(c.ms));
+    VLXTime time = Seconds(12345);
+    ASSERT_EQ(VLX_S_OK, Values::BuildFromJavaType(env, date.get(), time));
+    EXPECT_EQ(c.seconds, time.Gettime_t());
+    dates.push_back(env->NewLocalRef(date.get()));
+  }
+  // The list converter rounds the same way.
+  Local array(NewArray("java/util/Date", dates));
+  for (jobject d : dates) env->DeleteLocalRef(d);
+  VLXListValVLXTime times;
+  times.Append(Seconds(77));  // emptied first
+  ASSERT_EQ(VLX_S_OK, Values::BuildFromJavaType(env, array.get(), times));
+  ASSERT_EQ(static_cast<int>(std::size(cases)), times.Size());
+  for (int i = 1; i <= times.Size(); ++i) EXPECT_EQ(cases[i - 1].seconds, times[i].Gettime_t()) << i;
+}
+
+TEST_F(Converters, SecondsBecomeMillisecondsAndComeBackUnchanged)
+{
+  const struct {
+    time_t seconds;
+    jlong ms;
+  } cases[] = {{1, 1000}, {2, 2000}, {0, 0}, {-1, -1000}, {-2, -2000}, {1700000000, 1700000000000LL},
+               {LLONG_MAX / 1000, LLONG_MAX / 1000 * 1000}};
+  VLXListValVLXTime list;
+  for (const auto& c : cases) {
+    SCOPED_TRACE(c.seconds);
+    jobject out = nullptr;
+    ASSERT_EQ(VLX_S_OK, Values::ConvertToJavaType(env, Seconds(c.seconds), out));
+    Local date(out);
+    EXPECT_TRUE(IsExactly(date.get(), "java/util/Date"));
+    EXPECT_EQ(c.ms, TimeOf(date.get()));
+    VLXTime back;
+    ASSERT_EQ(VLX_S_OK, Values::BuildFromJavaType(env, date.get(), back));
+    EXPECT_EQ(c.seconds, back.Gettime_t());
+    list.Append(Seconds(c.seconds));
+  }
+  jobject out = nullptr;
+  ASSERT_EQ(VLX_S_OK, Values::ConvertToJavaType(env, list, out));
+  Local array(out);
+  EXPECT_TRUE(IsExactly(array.get(), "[Ljava/util/Date;"));
+  ASSERT_EQ(list.Size(), Length(array.get()));
+  for (int i = 0; i < list.Size(); ++i) {
+    Local date(Element(array.get(), i));
+    EXPECT_EQ(cases[i].ms, TimeOf(date.get()));
+  }
+}
+
+TEST_F(Converters, ATimeBeyondTheRangeOfAJavaDateFailsAndMakesNothing)
+{
+  for (time_t seconds : {static_cast<time_t>(LLONG_MAX), static_cast<time_t>(LLONG_MIN / 1000 - 1)}) {
+    jobject untouched = reinterpret_cast<jobject>(0x1);
+    ClearLastError();
+    EXPECT_LT(Values::ConvertToJavaType(env, Seconds(seconds), untouched), 0);
+    EXPECT_EQ(reinterpret_cast<jobject>(0x1), untouched);
+    EXPECT_EQ("VLXJBXInfraERR_1009", PeekLastError().id);
+
+    VLXListValVLXTime list;
+    list.Append(Seconds(1));
+    list.Append(Seconds(seconds));
+    EXPECT_LT(Values::ConvertToJavaType(env, list, untouched), 0);
+    EXPECT_EQ(reinterpret_cast<jobject>(0x1), untouched);
+  }
+}
+
+// ---- Boxed scalars ---------------------------------------------------------------------------
+
+TEST_F(Converters, BoxedScalarsRoundTripThroughTheirJavaClasses)
+{
+  for (int value : {0, 1, -1, INT_MAX, INT_MIN}) {
+    jobject out = nullptr;
+    ASSERT_EQ(VLX_S_OK, Values::ConvertToJavaType(env, value, out));
+    Local boxed(out);
+    EXPECT_TRUE(IsExactly(boxed.get(), "java/lang/Integer"));
+    int back = 7;
+    ASSERT_EQ(VLX_S_OK, Values::BuildFromJavaType(env, boxed.get(), back));
+    EXPECT_EQ(value, back);
+  }
+  for (double value : {0.0, -0.0, 1.5, -1e308, 4.9e-324, HUGE_VAL, static_cast<double>(NAN)}) {
+    jobject out = nullptr;
+    ASSERT_EQ(VLX_S_OK, Values::ConvertToJavaType(env, value, out));
+    Local boxed(out);
+    EXPECT_TRUE(IsExactly(boxed.get(), "java/lang/Double"));
+    double back = 7;
+    ASSERT_EQ(VLX_S_OK, Values::BuildFromJavaType(env, boxed.get(), back));
+    if (std::isnan(value)) {
+      EXPECT_TRUE(std::isnan(back));
+    } else {
+      EXPECT_EQ(value, back);
+      EXPECT_EQ(std::signbit(value), std::signbit(back));
+    }
+  }
+  for (VLXBoolean value : {VLXBoolean(0), VLXBoolean(1)}) {
+    jobject out = nullptr;
+    ASSERT_EQ(VLX_S_OK, Values::ConvertToJavaType(env, value, out));
+    Local boxed(out);
+    EXPECT_TRUE(IsExactly(boxed.get(), "java/lang/Boolean"));
+    Local cls(FindClass("java/lang/Boolean"));
+    EXPECT_EQ(value, env->CallBooleanMethod(boxed.get(), env->GetMethodID(cls.as<jclass>(), "booleanValue", "()Z")));
+    VLXBoolean back = 7;
+    ASSERT_EQ(VLX_S_OK, Values::BuildFromJavaType(env, boxed.get(), back));
+    EXPECT_EQ(value, back);
+  }
+}
+
+TEST_F(Converters, ANullJavaObjectFailsForAScalarAndEmptiesAList)
+{
+  int integer = 5;
+  double real = 5;
+  VLXBoolean flag = 5;
+  VLXTime time = Seconds(5);
+  ClearLastError();
+  EXPECT_LT(Values::BuildFromJavaType(env, nullptr, integer), 0);
+  EXPECT_EQ("VLXJBXInfraERR_1009", PeekLastError().id);
+  EXPECT_EQ("VLXKDMJavaObject::BuildFromJavaType(JNIEnv*, jobject, int&)", PeekLastError().parameters.at(0));
+  EXPECT_LT(Values::BuildFromJavaType(env, nullptr, real), 0);
+  EXPECT_LT(Values::BuildFromJavaType(env, nullptr, flag), 0);
+  EXPECT_LT(Values::BuildFromJavaType(env, nullptr, time), 0);
+  EXPECT_EQ(5, integer);
+  EXPECT_EQ(5, real);
+  EXPECT_EQ(5, flag);
+  EXPECT_EQ(5, time.Gettime_t());
+
+  VLXListValVLXTime times;
+  times.Append(time);
+  VLXListValVLXBinary binaries;
+  binaries.Append(VLXBinary(3));
+  VLXListValVLXKDMInstance instances;
+  instances.Append(NewInstance());
+  EXPECT_EQ(VLX_S_OK, Values::BuildFromJavaType(env, nullptr, times));
+  EXPECT_EQ(VLX_S_OK, Values::BuildFromJavaType(env, nullptr, binaries));
+  EXPECT_EQ(VLX_S_OK, Values::BuildFromJavaType(env, nullptr, instances));
+  EXPECT_EQ(0, times.Size() + binaries.Size() + instances.Size());
+}
+
+// ---- Lists from Java -------------------------------------------------------------------------
+
+TEST_F(Converters, ADateArrayWithANullOrThrowingElementFailsAfterTheElementsBeforeIt)
+{
+  Local first(NewDate(1000)), last(NewDate(3000)), throwing(NewDate(0, "com/velmora/tessara/testdoubles/ThrowingDate"));
+  const struct {
+    jobject bad;
+    const char* error;
+    const char* says;
+  } cases[] = {{nullptr, "VLXJBXInfraERR_1009", "index 1"},
+               {throwing.get(), "VLXJBXInfraERR_1005", "cannot tell its time"}};
+  for (const auto& c : cases) {
+    SCOPED_TRACE(c.error);
+    Local array(NewArray("java/util/Date", {first.get(), c.bad, last.get()}));
+    VLXListValVLXTime times;
+    ClearLastError();
+    EXPECT_LT(Values::BuildFromJavaType(env, array.get(), times), 0);
+    EXPECT_FALSE(env->ExceptionCheck());
+    ASSERT_EQ(1, times.Size());
+    EXPECT_EQ(1, times[1].Gettime_t());
+    EXPECT_EQ(c.error, PeekLastError().id);
+    EXPECT_NE(std::string::npos, PeekLastError().text.find(c.says)) << PeekLastError().text;
+  }
+  // A single date that throws: the output is left alone.
+  VLXTime time = Seconds(42);
+  EXPECT_LT(Values::BuildFromJavaType(env, throwing.get(), time), 0);
+  EXPECT_EQ(42, time.Gettime_t());
+  EXPECT_FALSE(env->ExceptionCheck());
+}
+
+TEST_F(Converters, AnArrayOfByteArraysKeepsTheElementsBeforeOneThatIsNoByteArray)
+{
+  JNIEnv* e = env;
+  const jbyte raw[] = {1, 2, 3};
+  Local bytes(e->NewByteArray(3));
+  e->SetByteArrayRegion(bytes.as<jbyteArray>(), 0, 3, raw);
+  Local empty(e->NewByteArray(0));
+  Local text(e->NewStringUTF("not bytes"));
+
+  Local good(NewArray("[B", {bytes.get(), nullptr, empty.get()}));
+  VLXListValVLXBinary list;
+  ASSERT_EQ(VLX_S_OK, Values::BuildFromJavaType(env, good.get(), list));
+  ASSERT_EQ(3, list.Size());
+  EXPECT_TRUE(list[1] == VLXBinary(raw, 3));
+  EXPECT_EQ(0, list[2].getLength());  // a null element gives an empty buffer
+  EXPECT_EQ(0, list[3].getLength());
+
+  Local mixed(NewArray("java/lang/Object", {bytes.get(), text.get(), bytes.get()}));
+  EXPECT_LT(Values::BuildFromJavaType(env, mixed.get(), list), 0);
+  ASSERT_EQ(1, list.Size());
+  EXPECT_TRUE(list[1] == VLXBinary(raw, 3));
+
+  // And back: an array of byte arrays, element by element.
+  VLXListValVLXBinary out;
+  out.Append(VLXBinary(raw, 3));
+  out.Append(VLXBinary());
+  jobject made = nullptr;
+  ASSERT_EQ(VLX_S_OK, Values::ConvertToJavaType(env, out, made));
+  Local array(made);
+  EXPECT_TRUE(IsExactly(array.get(), "[[B"));
+  VLXListValVLXBinary back;
+  ASSERT_EQ(VLX_S_OK, Values::BuildFromJavaType(env, array.get(), back));
+  EXPECT_TRUE(back == out);
+}
+
+TEST_F(Converters, AnArrayOfInstancesGivesProxiesOfTheSameObjects)
+{
+  std::vector<VLXKDMInstance> objects = NewInstances(3);
+  Local array(NewArray(kInstanceClass, {objects[0].GetHandle(), nullptr, objects[2].GetHandle()}));
+  VLXListValVLXKDMInstance list;
+  list.Append(objects[1]);  // emptied first
+  const long baseline = VLXJBXJNIUtilities::GetGlobalRefCount();
+  ASSERT_EQ(VLX_S_OK, Values::BuildFromJavaType(env, array.get(), list));
+  ASSERT_EQ(3, list.Size());
+  EXPECT_TRUE(Same(list[1].GetHandle(), objects[0].GetHandle()));
+  EXPECT_EQ(nullptr, list[2].GetHandle());  // a null element: an unattached proxy
+  EXPECT_TRUE(Same(list[3].GetHandle(), objects[2].GetHandle()));
+  EXPECT_NE(list[1].GetHandle(), objects[0].GetHandle());  // a reference of its own
+  EXPECT_EQ(baseline + 2 - 1, VLXJBXJNIUtilities::GetGlobalRefCount());
+
+  VLXKDMInstance single;
+  ASSERT_EQ(VLX_S_OK, Values::BuildFromJavaType(env, objects[1].GetHandle(), single));
+  EXPECT_TRUE(single == objects[1]);
+  ASSERT_EQ(VLX_S_OK, Values::BuildFromJavaType(env, nullptr, single));
+  EXPECT_EQ(nullptr, single.GetHandle());
+}
+
+// ---- Lists to Java ---------------------------------------------------------------------------
+
+TEST_F(Converters, EmptyListsBecomeEmptyArraysOfTheirClass)
+{
+  const struct {
+    const char* cls;
+    long (*convert)(JNIEnv*, jobject&);
+  } cases[] = {
+      {"[Ljava/util/Date;", [](JNIEnv* e, jobject& o) { return Values::ConvertToJavaType(e, VLXListValVLXTime(), o); }},
+      {"[[B", [](JNIEnv* e, jobject& o) { return Values::ConvertToJavaType(e, VLXListValVLXBinary(), o); }},
+      {"[Lcom/velmora/tessara/kdmreplica/Instance;",
+       [](JNIEnv* e, jobject& o) { return Values::ConvertToJavaType(e, VLXListValVLXKDMInstance(), o); }},
+  };
+  for (const auto& c : cases) {
+    jobject out = nullptr;
+    ASSERT_EQ(VLX_S_OK, c.convert(env, out));
+    Local array(out);
+    EXPECT_TRUE(IsExactly(array.get(), c.cls)) << c.cls;
+    EXPECT_EQ(0, Length(array.get()));
+  }
+}
+
+TEST_F(Converters, AnInstanceHandsOutItsOwnReferenceAndAListTheElementsObjects)
+{
+  std::vector<VLXKDMInstance> objects = NewInstances(3);
+  jobject out = nullptr;
+  ASSERT_EQ(VLX_S_OK, Values::ConvertToJavaType(env, objects[0], out));
+  EXPECT_EQ(objects[0].GetHandle(), out);  // the very reference, not to be released
+
+  VLXListValVLXKDMInstance list;
+  for (const VLXKDMInstance& o : objects) list.Append(o);
+  ASSERT_EQ(VLX_S_OK, Values::ConvertToJavaType(env, list, out));
+  Local array(out);
+  EXPECT_TRUE(IsExactly(array.get(), "[Lcom/velmora/tessara/kdmreplica/Instance;"));
+  ASSERT_EQ(3, Length(array.get()));
+  for (int i = 0; i < 3; ++i) {
+    Local element(Element(array.get(), i));
+    EXPECT_TRUE(Same(element.get(), objects[i].GetHandle())) << i;
+  }
+}
+
+TEST_F(Converters, AnUnattachedInstanceIsReportedAndConvertsToNothing)
+{
+  FatalRecorder recorder;
+  VLXKDMInstance unattached;
+  jobject out = reinterpret_cast<jobject>(0x1);
+  ClearLastError();
+  EXPECT_LT(Values::ConvertToJavaType(env, unattached, out), 0);
+  EXPECT_EQ(reinterpret_cast<jobject>(0x1), out);
+  EXPECT_EQ("VLXJBXInfraERR_1009", PeekLastError().id);
+
+  VLXListValVLXKDMInstance list;
+  list.Append(NewInstance());
+  list.Append(unattached);
+  list.Append(unattached);
+  EXPECT_LT(Values::ConvertToJavaType(env, list, out), 0);
+  EXPECT_EQ(reinterpret_cast<jobject>(0x1), out);
+  EXPECT_NE(std::string::npos, PeekLastError().text.find("position 2")) << PeekLastError().text;
+
+  EXPECT_EQ((std::vector<std::string>{"AssertionFailed:input.GetHandle() != NULL@157",
+                                      "AssertionFailed:input[i].GetHandle() != NULL@192"}),
+            Reports());
+  for (const auto& r : FatalRecorder::Reports()) EXPECT_EQ("Tessara\\Corvexa.m\\src\\VLXKDMJavaObject.cpp", r.file);
+}
+
+TEST_F(Converters, AProxyOfAnObjectThatIsNoInstanceCannotBeStoredInAnInstanceArray)
+{
+  VLXKDMInstance notAnInstance;
+  AttachNew(notAnInstance, "java/lang/Object");
+  VLXListValVLXKDMInstance list;
+  list.Append(NewInstance());
+  list.Append(notAnInstance);
+  jobject out = reinterpret_cast<jobject>(0x1);
+  ClearLastError();
+  EXPECT_LT(Values::ConvertToJavaType(env, list, out), 0);
+  EXPECT_EQ(reinterpret_cast<jobject>(0x1), out);
+  EXPECT_FALSE(env->ExceptionCheck());
+  EXPECT_NE(std::string::npos, PeekLastError().text.find("ArrayStoreException")) << PeekLastError().text;
+}
+
+}  // namespace
