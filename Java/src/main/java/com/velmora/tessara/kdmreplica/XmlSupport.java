@@ -1,9 +1,11 @@
 package com.velmora.tessara.kdmreplica;
 
 import java.io.BufferedInputStream;
+import java.io.BufferedReader;
 import java.io.ByteArrayOutputStream;
 import java.io.IOException;
 import java.io.InputStream;
+import java.io.InputStreamReader;
 import java.io.StringReader;
 import java.io.StringWriter;
 import java.net.URI;
@@ -103,7 +105,7 @@ final class XmlSupport {
             XMLInputFactory f = inputFactory();
             try {
                 if (file == null) {
-                    return new In(f.createXMLStreamReader(new StringReader(text)), name, null);
+                    return new In(f.createXMLStreamReader(new StringReader(text)), this, null);
                 }
                 InputStream s;
                 try {
@@ -112,15 +114,85 @@ final class XmlSupport {
                     throw new IllegalArgumentException("cannot read " + name + ": " + describe(e), e);
                 }
                 try {
-                    return new In(f.createXMLStreamReader(file.toUri().toString(), s), name, s);
+                    return new In(f.createXMLStreamReader(file.toUri().toString(), s), this, s);
                 } catch (XMLStreamException | RuntimeException e) {
                     closeQuietly(s);
                     throw e;
                 }
             } catch (XMLStreamException e) {
-                throw In.wrap(name, e);
+                throw In.wrap(this, e);
             }
         }
+
+        /**
+         * The tag the parser stopped in at that place, read again from the input ({@code "</Parts"}),
+         * or null when the place is not inside a tag. Only the markup's name is returned, never
+         * other content of the input. Reads at most up to the place and a few characters beyond.
+         */
+        String tagAt(int line, int column) {
+            if (line < 1 || column < 2) {
+                return null;
+            }
+            try (BufferedReader rd = new BufferedReader(file == null ? new StringReader(text)
+                    : new InputStreamReader(Files.newInputStream(file), StandardCharsets.UTF_8), 8192)) {
+                for (int l = 1; l < line;) {
+                    int c = rd.read();
+                    if (c < 0) {
+                        return null;
+                    }
+                    if (c == '\n') {
+                        l++;
+                    } else if (c == '\r') {
+                        l++;
+                        rd.mark(1);
+                        if (rd.read() != '\n') {
+                            rd.reset();
+                        }
+                    }
+                }
+                // The line up to the place (its last TAG_WINDOW characters) and a name's length beyond.
+                StringBuilder w = new StringBuilder();
+                int at = -1;
+                for (int col = 1; col < column + TAG_WINDOW; col++) {
+                    if (col == column) {
+                        at = w.length();
+                    }
+                    int c = rd.read();
+                    if (c < 0 || c == '\n' || c == '\r') {
+                        break;
+                    }
+                    w.append((char) c);
+                    if (at < 0 && w.length() > 2 * TAG_WINDOW) {
+                        w.delete(0, TAG_WINDOW);
+                    }
+                }
+                if (at < 0) {
+                    at = w.length();
+                }
+                int lt = w.lastIndexOf("<", at - 1);
+                if (lt < 0 || w.indexOf(">", lt) >= 0 && w.indexOf(">", lt) < at) {
+                    return null;
+                }
+                int end = lt + 1;
+                if (end < w.length() && w.charAt(end) == '/') {
+                    end++;
+                }
+                int nameStart = end;
+                while (end < w.length() && isNameChar(w.charAt(end))) {
+                    end++;
+                }
+                return end > nameStart ? w.substring(lt, end) : null;
+            } catch (IOException | RuntimeException e) {
+                return null; // the place is only quoted when it can be read again
+            }
+        }
+    }
+
+    private static final int TAG_WINDOW = 128;
+
+    private static boolean isNameChar(char c) {
+        return c >= 'a' && c <= 'z' || c >= 'A' && c <= 'Z' || c >= '0' && c <= '9' || c == '_' || c == '-'
+                || c == '.' || c == ':' || c >= 0x80 && !Character.isWhitespace(c);
     }
 
     static String describe(IOException e) {
@@ -165,23 +237,71 @@ final class XmlSupport {
     static final class In implements AutoCloseable {
         final XMLStreamReader r;
         final String source;
+        private final Src src;
         private final InputStream stream;
 
-        In(XMLStreamReader r, String source, InputStream stream) {
+        In(XMLStreamReader r, Src src, InputStream stream) {
             this.r = r;
-            this.source = source;
+            this.src = src;
+            this.source = src.name;
             this.stream = stream;
         }
 
-        static XmlDocumentException wrap(String source, XMLStreamException e) {
+        /**
+         * The parser's complaint as an exception naming the input, line and column; when the
+         * parser stopped inside a tag whose name its message does not give (a mistyped end tag),
+         * the tag is quoted from the input.
+         */
+        static XmlDocumentException wrap(Src src, XMLStreamException e) {
             Location l = e.getLocation();
+            int line = l == null ? -1 : l.getLineNumber();
+            int column = l == null ? -1 : l.getColumnNumber();
             String m = e.getMessage() == null ? e.toString() : e.getMessage();
             int at = m.indexOf("Message: ");
             if (at >= 0) {
                 m = m.substring(at + "Message: ".length());
             }
-            return new XmlDocumentException(source, l == null ? -1 : l.getLineNumber(),
-                    l == null ? -1 : l.getColumnNumber(), "the input is not well-formed XML: " + m.trim(), e);
+            m = readable(m.trim());
+            String tag = src.tagAt(line, column);
+            if (tag != null) {
+                String name = tag.substring(tag.startsWith("</") ? 2 : 1);
+                if (!m.contains("\"" + name + "\"")) {
+                    m += " (in the " + (tag.startsWith("</") ? "end" : "start") + " tag '" + tag + ">')";
+                }
+            }
+            return new XmlDocumentException(src.name, line, column, "the input is not well-formed XML: " + m, e);
+        }
+
+        private static final Pattern MESSAGE_KEY = Pattern.compile("http://www\\.w3\\.org/TR/[^#\\s]*#(\\w+)\\?(.*)");
+
+        /** The JDK reports namespace faults as bare message keys ("...#AttributeNotUnique?Part&a"). */
+        private static String readable(String m) {
+            Matcher k = MESSAGE_KEY.matcher(m);
+            if (!k.matches()) {
+                return m;
+            }
+            String[] args = k.group(2).split("&", -1);
+            switch (k.group(1)) {
+                case "AttributeNotUnique":
+                    if (args.length == 2) {
+                        return "attribute '" + args[1] + "' appears twice in element '" + args[0] + "'";
+                    }
+                    break;
+                case "ElementPrefixUnbound":
+                    if (args.length == 2) {
+                        return "the prefix '" + args[0] + "' of element '" + args[1] + "' is not bound to a namespace";
+                    }
+                    break;
+                case "AttributePrefixUnbound":
+                    if (args.length == 3) {
+                        return "the prefix '" + args[2] + "' of attribute '" + args[1] + "' of element '" + args[0]
+                                + "' is not bound to a namespace";
+                    }
+                    break;
+                default:
+                    break;
+            }
+            return k.group(1) + ": " + String.join(", ", args);
         }
 
         /** The next event; a DOCTYPE or an entity reference is refused. */
@@ -190,7 +310,7 @@ final class XmlSupport {
             try {
                 e = r.next();
             } catch (XMLStreamException x) {
-                throw wrap(source, x);
+                throw wrap(src, x);
             } catch (RuntimeException x) {
                 // The JDK reader reports some malformed input (bad encodings) unchecked.
                 throw new XmlDocumentException(source, -1, -1, "the input cannot be read as XML: " + x, x);
@@ -200,8 +320,11 @@ final class XmlSupport {
                         + " declarations) are refused");
             }
             if (e == XMLStreamConstants.ENTITY_REFERENCE) {
-                throw fail("entity reference '&" + r.getLocalName() + ";' is refused: documents may not use"
-                        + " entities other than the predefined ones");
+                // With DTDs refused no entity can be declared, so this is a well-formedness fault the
+                // reader reports as an event rather than as an error.
+                throw fail("the input is not well-formed XML: entity reference '&" + r.getLocalName()
+                        + ";' names an undeclared entity (documents may use only the predefined entities and"
+                        + " character references)");
             }
             return e;
         }

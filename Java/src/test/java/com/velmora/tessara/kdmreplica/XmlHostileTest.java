@@ -89,7 +89,12 @@ class XmlHostileTest {
     }
 
     private void refusedEverywhere(String doc, int line, String... fragments) throws Exception {
-        for (Consumer<String> read : readers()) {
+        refusedEverywhere(readers(), doc, line, fragments);
+    }
+
+    private void refusedEverywhere(List<Consumer<String>> readers, String doc, int line, String... fragments)
+            throws Exception {
+        for (Consumer<String> read : readers) {
             for (boolean validate : new boolean[] {false, true}) {
                 Replica.setFeature("validate", validate);
                 XmlDocumentException e = failsAt(line, () -> read.accept(doc), fragments);
@@ -125,8 +130,17 @@ class XmlHostileTest {
 
     @Test
     void entityReferencesWithoutADoctypeAreNotWellFormed() throws Exception {
-        refusedEverywhere("<replica xmlns=\"urn:corvexa:replica:1\">\n<Part><name>&x;</name></Part></replica>", 2,
-                "not well-formed", "\"x\"");
+        // The document names a local schema, so that reading it as a new replica gets past its root.
+        Path xsd = dir.resolve("target.xsd");
+        write(xsd, target.getXsd());
+        List<Consumer<String>> documents = readers().subList(0, 4);
+        refusedEverywhere(documents, "<replica xmlns=\"urn:corvexa:replica:1\""
+                + " xmlns:xsi=\"http://www.w3.org/2001/XMLSchema-instance\""
+                + " xsi:schemaLocation=\"urn:corvexa:replica:1 " + xsd.toUri() + "\">\n"
+                + "<Part><name>&x;</name></Part></replica>", 2, "not well-formed", "'&x;'", "undeclared");
+        refusedEverywhere(List.of(target::insertSchemaString), "<xs:schema xmlns:xs=\"http://www.w3.org/2001/XMLSchema\">"
+                + "\n<xs:annotation><xs:documentation>&x;</xs:documentation></xs:annotation></xs:schema>", 2,
+                "not well-formed", "'&x;'");
     }
 
     @Test
@@ -160,20 +174,37 @@ class XmlHostileTest {
 
     @Test
     void schemasImportingFromTheNetworkAreRefusedUnread() throws Exception {
+        Path file = dir.resolve("s.xsd");
         for (String construct : new String[] {
             "<xs:import namespace=\"urn:x\" schemaLocation=\"" + net.url("x.xsd") + "\"/>",
             "<xs:include schemaLocation=\"" + net.url("y.xsd") + "\"/>",
             "<xs:import namespace=\"urn:x\" schemaLocation=\"" + secret + "\"/>"}) {
-            String xsd = "<xs:schema xmlns:xs=\"http://www.w3.org/2001/XMLSchema\">\n" + construct
-                    + "\n<xs:complexType name=\"New\"/></xs:schema>";
+            String xsd = schemaWith(construct);
             failsAt(2, () -> target.insertSchemaString(xsd), "refused", "nothing was read");
-            Path file = dir.resolve("s.xsd");
-            write(file, xsd);
-            failsAt(2, () -> target.insertSchemaFile(file.toString()), "refused", "nothing was");
             // embedded in a document, the same schema is refused as well
             failsAt(2, () -> Replica.readFromXmlString("<replica xmlns=\"urn:corvexa:replica:1\">"
                     + xsd + "</replica>"), "refused");
+            if (construct.contains("http:")) {
+                write(file, xsd);
+                failsAt(2, () -> target.insertSchemaFile(file.toString()), "refused", "nothing was fetched");
+            }
         }
+        // From a schema file, a local file next to it is read as a schema (here: it is not one, and
+        // the fault is reported in that file without quoting it); a file elsewhere is refused unread.
+        write(file, schemaWith("<xs:import namespace=\"urn:x\" schemaLocation=\"" + secret + "\"/>"));
+        XmlDocumentException e = failsAt(1, () -> target.insertSchemaFile(file.toString()), "not well-formed");
+        assertEquals("XSD file '" + secret.toRealPath() + "'", e.getSource());
+        assertFalse(e.getMessage().contains(SECRET), e.getMessage());
+        Path sub = Files.createDirectories(dir.resolve("sub"));
+        Path inner = sub.resolve("s.xsd");
+        write(inner, schemaWith("<xs:include schemaLocation=\"../secret.txt\"/>"));
+        failsAt(2, () -> target.insertSchemaFile(inner.toString()), "'../secret.txt'", "outside the directory",
+                "nothing was read");
+    }
+
+    private static String schemaWith(String construct) {
+        return "<xs:schema xmlns:xs=\"http://www.w3.org/2001/XMLSchema\">\n" + construct
+                + "\n<xs:complexType name=\"New\"/></xs:schema>";
     }
 
     private String goodDocument() {
@@ -250,7 +281,14 @@ class XmlHostileTest {
                 Arguments.of(head + "</replica>\n<more/>", 4, new String[] {"not well-formed"}),
                 Arguments.of("<replika xmlns=\"urn:corvexa:replica:1\"/>", 1, new String[] {"'replika'"}),
                 Arguments.of(head + "<Part><qty>1</qty></Parts>\n</replica>", 3, new String[] {"not well-formed",
-                    "Parts"}));
+                    "'</Parts>'"}),
+                Arguments.of(head + "<Part>\n<qty>1</qty></Pxrt>\n</replica>", 4, new String[] {"not well-formed",
+                    "'</Pxrt>'"}),
+                Arguments.of(head + "<Part key=\"a\" key=\"b\"/>\n</replica>", 3, new String[] {"not well-formed",
+                    "attribute 'key' appears twice in element 'Part'"}),
+                Arguments.of(head + "<y:Part/>\n</replica>", 3, new String[] {"prefix 'y'", "'y:Part'", "not bound"}),
+                Arguments.of(head + "<Part><qty y:n=\"1\">1</qty>\n</Part></replica>", 3, new String[] {"prefix 'y'",
+                    "'y:n'", "'qty'", "not bound"}));
     }
 
     @ParameterizedTest(name = "{2}")
