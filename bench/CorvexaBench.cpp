@@ -1,0 +1,720 @@
+// corvexa-bench: the cost of the library's operations against hand-written JNI doing the same work,
+// measured in the same process and the same run, and the cost of filling a replica from C++ against
+// the same filling done in Java.
+//
+// Each pair is one operation done two ways:
+//   <operation>/library   through the library's proxies
+//   <operation>/handJNI   by hand-written JNI: identifiers looked up once, the environment fetched
+//                         once, strings converted exactly (UTF-8 <-> UTF-16), every exception
+//                         checked, every local reference deleted
+// The summary at the end gives each pair's times (the median over repetitions when there are
+// several), their ratio against the target, and the heap allocations one call makes on the
+// calling thread once the operation has run before (counted by a replacement of operator new and
+// malloc that this program links in).
+//
+// Options of our own (besides Google Benchmark's):
+//   --fill_instances=N    instances per fill (default 100000)
+//   --fill_iterations=N   measured fills per side (default 5)
+//   --warmup_calls=N      calls of each operation before anything is measured (default 20000)
+#include <jni.h>
+
+#include <algorithm>
+#include <cstdio>
+#include <cstdlib>
+#include <cstring>
+#include <ctime>
+#include <map>
+#include <memory>
+#include <string>
+#include <utility>
+#include <vector>
+
+#include <benchmark/benchmark.h>
+
+#include "AllocationCounter.h"
+#include "HandStrings.h"
+#include "VLXBinary.h"
+#include "VLXJBXJNIUtilities.h"
+#include "VLXKDMAttributeDef.h"
+#include "VLXKDMAttributeDefList.h"
+#include "VLXKDMClassDef.h"
+#include "VLXKDMInstance.h"
+#include "VLXKDMInstanceSet.h"
+#include "VLXKDMInstanceValue.h"
+#include "VLXKDMModel.h"
+#include "VLXKDMModelSet.h"
+#include "VLXKDMReplica.h"
+#include "VLXListValVLXUnicodeString.h"
+#include "VLXRawCollint.h"
+#include "VLXTime.h"
+#include "VLXUnicodeString.h"
+
+using namespace corvexa_bench;
+
+namespace {
+
+struct Options {
+  int fillInstances = 100000;
+  int fillIterations = 5;
+  int warmupCalls = 20000;
+};
+Options gOptions;
+
+constexpr int kListLength = 1000;
+constexpr time_t kBaseSeconds = 1700000000;
+
+// Owns one local reference of the hand-written code and deletes it on every path.
+class Local {
+ public:
+  Local(JNIEnv* env, jobject ref) : _env(env), _ref(ref) {}
+  ~Local() {
+    if (_ref) _env->DeleteLocalRef(_ref);
+  }
+  Local(const Local&) = delete;
+  Local& operator=(const Local&) = delete;
+  jobject get() const { return _ref; }
+
+ private:
+  JNIEnv* _env;
+  jobject _ref;
+};
+
+// After a Java call of the hand-written code: true when it threw (the exception is cleared).
+bool Threw(JNIEnv* env)
+{
+  if (!env->ExceptionCheck()) return false;
+  env->ExceptionClear();
+  return true;
+}
+
+// The objects the per-operation benchmarks work on, and the hand-written code's identifiers.
+struct World {
+  // The library's side.
+  VLXKDMReplica replica;
+  VLXKDMModel model;
+  VLXKDMInstance instance;
+  VLXKDMModelSet models;
+  VLXKDMInstanceValue value;
+  VLXUnicodeString name;
+  const VLXUnicodeString integerName{"integer"};
+  const VLXUnicodeString integersName{"integers"};
+  const int textPosition = 1;  // the attribute "text"
+  const VLXUnicodeString textValue{"a short text value"};
+  std::vector<int> thousand;
+  VLXRawCollint thousandList;
+
+  // The hand-written side: its own global references to the same Java objects.
+  JNIEnv* env = nullptr;
+  jobject replicaRef = nullptr;
+  jobject instanceRef = nullptr;
+  jobject modelsRef = nullptr;  // the holder GetModels fills
+  jclass integerClass = nullptr;
+  jmethodID integerValueOf = nullptr;
+  jmethodID integerIntValue = nullptr;
+  jmethodID replicaGetName = nullptr;
+  jmethodID replicaGetModels = nullptr;
+  jmethodID instanceSetValueNamed = nullptr;
+  jmethodID instanceSetValueAt = nullptr;
+  jmethodID instanceGetValueNamed = nullptr;
+  int handInteger = 0;
+
+  // The fill's Java baseline and the collector, called between measured fills.
+  jclass fillClass = nullptr;
+  jmethodID fill = nullptr;
+  jclass systemClass = nullptr;
+  jmethodID systemGc = nullptr;
+};
+World* gWorld = nullptr;
+
+// ---- Set-up ----------------------------------------------------------------------------------
+
+bool Fail(std::string& why, const std::string& what)
+{
+  why = what;
+  return false;
+}
+
+// Adds the class className with its attributes (name, type, multi-valued) and its model.
+bool AddClass(VLXKDMReplica& replica, const char* className,
+              const std::vector<std::pair<const char*, std::pair<VLXKDMAttributeType::Type, bool>>>& attributes,
+              VLXKDMModel& model)
+{
+  VLXKDMClassDef classDef;
+  VLXKDMAttributeDefList list;
+  if (classDef.Build(VLXUnicodeString(className)) < 0 || classDef.GetAttributes(list) < 0) return false;
+  for (const auto& a : attributes) {
+    VLXKDMAttributeDef attribute;
+    if (attribute.Build(VLXUnicodeString(a.first), a.second.first) < 0) return false;
+    if (attribute.SetMultiValuation(a.second.second ? 1 : 0) < 0) return false;
+    if (list.Add(attribute) < 0) return false;
+  }
+  VLXKDMModelSet models;
+  return model.Build(classDef) >= 0 && replica.GetModels(models) >= 0 && models.Add(model) >= 0;
+}
+
+jclass GlobalClass(JNIEnv* env, const char* path)
+{
+  Local local(env, env->FindClass(path));
+  if (Threw(env) || !local.get()) return nullptr;
+  return static_cast<jclass>(env->NewGlobalRef(local.get()));
+}
+
+jmethodID Method(JNIEnv* env, jclass cls, const char* name, const char* signature, bool isStatic = false)
+{
+  if (!cls) return nullptr;
+  const jmethodID id = isStatic ? env->GetStaticMethodID(cls, name, signature) : env->GetMethodID(cls, name, signature);
+  return Threw(env) ? nullptr : id;
+}
+
+bool SetUp(World& w, std::string& why)
+{
+  // The first library call starts the JVM.
+  if (w.replica.Build(VLXUnicodeString("bench")) < 0) return Fail(why, "VLXKDMReplica::Build failed (JVM start)");
+  if (!AddClass(w.replica, "Sample",
+                {{"integer", {VLXKDMAttributeType::Integer, false}},
+                 {"text", {VLXKDMAttributeType::String, false}},
+                 {"integers", {VLXKDMAttributeType::Integer, true}}},
+                w.model))
+    return Fail(why, "building the class Sample failed");
+  if (w.model.CreateInstance(w.instance) < 0) return Fail(why, "VLXKDMModel::CreateInstance failed");
+  if (w.instance.SetValue(w.integerName, 42) < 0) return Fail(why, "VLXKDMInstance::SetValue failed");
+  for (int i = 0; i < kListLength; ++i) {
+    w.thousand.push_back(i * 7 - 3000);
+    w.thousandList.Append(i * 7 - 3000);
+  }
+
+  if (VLXJBXJNIUtilities::GetJNIEnv(w.env, VLXListValVLXUnicodeString()) < 0 || !w.env)
+    return Fail(why, "no JNIEnv from the bridge");
+  JNIEnv* env = w.env;
+  w.replicaRef = env->NewGlobalRef(w.replica.GetHandle());
+  w.instanceRef = env->NewGlobalRef(w.instance.GetHandle());
+  w.integerClass = GlobalClass(env, "java/lang/Integer");
+  w.integerValueOf = Method(env, w.integerClass, "valueOf", "(I)Ljava/lang/Integer;", true);
+  w.integerIntValue = Method(env, w.integerClass, "intValue", "()I");
+  Local replicaClass(env, env->GetObjectClass(w.replicaRef));
+  Local instanceClass(env, env->GetObjectClass(w.instanceRef));
+  w.replicaGetName = Method(env, static_cast<jclass>(replicaClass.get()), "getName", "()Ljava/lang/String;");
+  w.replicaGetModels = Method(env, static_cast<jclass>(replicaClass.get()), "getModels",
+                              "()Lcom/velmora/tessara/kdmreplica/ModelSet;");
+  const jclass instance = static_cast<jclass>(instanceClass.get());
+  w.instanceSetValueNamed = Method(env, instance, "setValue", "(Ljava/lang/String;Ljava/lang/Object;)V");
+  w.instanceSetValueAt = Method(env, instance, "setValue", "(ILjava/lang/Object;)V");
+  w.instanceGetValueNamed = Method(env, instance, "getValue", "(Ljava/lang/String;)Ljava/lang/Object;");
+  if (!w.integerValueOf || !w.integerIntValue || !w.replicaGetName || !w.replicaGetModels ||
+      !w.instanceSetValueNamed || !w.instanceSetValueAt || !w.instanceGetValueNamed)
+    return Fail(why, "a hand-written lookup failed");
+
+  w.fillClass = GlobalClass(env, "com/velmora/tessara/bench/FillBaseline");
+  w.fill = Method(env, w.fillClass, "fill", "(Lcom/velmora/tessara/kdmreplica/Model;IJ)I", true);
+  if (!w.fill) return Fail(why, "class com.velmora.tessara.bench.FillBaseline not found (is the bench jar on VLXJBX_CLASSPATH?)");
+  w.systemClass = GlobalClass(env, "java/lang/System");
+  w.systemGc = Method(env, w.systemClass, "gc", "()V", true);
+  if (!w.systemGc) return Fail(why, "System.gc not found");
+  return true;
+}
+
+void TearDown(World& w)
+{
+  JNIEnv* env = w.env;
+  if (!env) return;
+  for (jobject ref : {w.replicaRef, w.instanceRef, w.modelsRef, static_cast<jobject>(w.integerClass),
+                      static_cast<jobject>(w.fillClass), static_cast<jobject>(w.systemClass)})
+    if (ref) env->DeleteGlobalRef(ref);
+}
+
+// ---- The pairs -------------------------------------------------------------------------------
+// Each operation takes the iteration number (so that written values change) and says whether it
+// succeeded.
+
+bool LibGetName(World& w, int) { return w.replica.GetName(w.name) == VLX_S_OK; }
+
+bool HandGetName(World& w, int)
+{
+  JNIEnv* env = w.env;
+  Local name(env, env->CallObjectMethod(w.replicaRef, w.replicaGetName));
+  if (Threw(env)) return false;
+  if (!name.get()) {
+    w.name = VLXUnicodeString();
+    return true;
+  }
+  if (ReadJavaString(env, static_cast<jstring>(name.get()), w.name)) return true;
+  Threw(env);
+  return false;
+}
+
+bool LibGetModels(World& w, int) { return w.replica.GetModels(w.models) == VLX_S_OK; }
+
+bool HandGetModels(World& w, int)
+{
+  JNIEnv* env = w.env;
+  Local models(env, env->CallObjectMethod(w.replicaRef, w.replicaGetModels));
+  if (Threw(env)) return false;
+  const jobject held = models.get() ? env->NewGlobalRef(models.get()) : nullptr;
+  if (w.modelsRef) env->DeleteGlobalRef(w.modelsRef);
+  w.modelsRef = held;
+  return true;
+}
+
+bool LibSetNamedInteger(World& w, int i) { return w.instance.SetValue(w.integerName, i) == VLX_S_OK; }
+
+bool HandSetNamedInteger(World& w, int i)
+{
+  JNIEnv* env = w.env;
+  Local name(env, NewJavaString(env, w.integerName));
+  if (!name.get()) {
+    Threw(env);  // malformed text (nothing pending) or a failed NewString
+    return false;
+  }
+  Local boxed(env, env->CallStaticObjectMethod(w.integerClass, w.integerValueOf, static_cast<jint>(i)));
+  if (Threw(env)) return false;
+  env->CallVoidMethod(w.instanceRef, w.instanceSetValueNamed, name.get(), boxed.get());
+  return !Threw(env);
+}
+
+bool LibSetTextAt(World& w, int) { return w.instance.SetValue(w.textPosition, w.textValue) == VLX_S_OK; }
+
+bool HandSetTextAt(World& w, int)
+{
+  JNIEnv* env = w.env;
+  Local text(env, NewJavaString(env, w.textValue));
+  if (!text.get()) {
+    Threw(env);  // malformed text (nothing pending) or a failed NewString
+    return false;
+  }
+  env->CallVoidMethod(w.instanceRef, w.instanceSetValueAt, static_cast<jint>(w.textPosition), text.get());
+  return !Threw(env);
+}
+
+bool LibGetNamedInteger(World& w, int)
+{
+  return w.instance.GetValue(w.integerName, w.value) == VLX_S_OK &&
+         w.value.GetType() == VLXKDMInstanceValue::IntegerType && !w.value.IsMultiValuated() &&
+         (benchmark::DoNotOptimize(w.value.GetInteger()), true);
+}
+
+bool HandGetNamedInteger(World& w, int)
+{
+  JNIEnv* env = w.env;
+  Local name(env, NewJavaString(env, w.integerName));
+  if (!name.get()) {
+    Threw(env);  // malformed text (nothing pending) or a failed NewString
+    return false;
+  }
+  Local value(env, env->CallObjectMethod(w.instanceRef, w.instanceGetValueNamed, name.get()));
+  if (Threw(env) || !value.get()) return false;
+  // Unboxing anything but an Integer would be a JNI error: check the class first.
+  if (!env->IsInstanceOf(value.get(), w.integerClass)) return false;
+  w.handInteger = env->CallIntMethod(value.get(), w.integerIntValue);
+  benchmark::DoNotOptimize(w.handInteger);
+  return !Threw(env);
+}
+
+template <std::size_t... I>
+long SetThousand(VLXKDMInstance& instance, const VLXUnicodeString& name, const int* v, std::index_sequence<I...>)
+{
+  return instance.SetValueIntegers(name, static_cast<int>(sizeof...(I)), v[I]...);
+}
+
+bool LibSetIntegers(World& w, int)
+{
+  return SetThousand(w.instance, w.integersName, w.thousand.data(), std::make_index_sequence<kListLength>()) ==
+         VLX_S_OK;
+}
+
+bool LibSetIntegerList(World& w, int) { return w.instance.SetValue(w.integersName, w.thousandList) == VLX_S_OK; }
+
+bool HandSetIntegers(World& w, int)
+{
+  JNIEnv* env = w.env;
+  const jsize count = static_cast<jsize>(w.thousand.size());
+  Local array(env, env->NewIntArray(count));
+  if (Threw(env) || !array.get()) return false;
+  env->SetIntArrayRegion(static_cast<jintArray>(array.get()), 0, count, w.thousand.data());
+  if (Threw(env)) return false;
+  Local name(env, NewJavaString(env, w.integersName));
+  if (!name.get()) {
+    Threw(env);  // malformed text (nothing pending) or a failed NewString
+    return false;
+  }
+  env->CallVoidMethod(w.instanceRef, w.instanceSetValueNamed, name.get(), array.get());
+  return !Threw(env);
+}
+
+using Operation = bool (*)(World&, int);
+
+struct Pair {
+  const char* key;
+  const char* what;
+  double target;  // 0: none
+  Operation library;
+  Operation hand;
+};
+
+const std::vector<Pair>& Pairs()
+{
+  static const std::vector<Pair> pairs = {
+      {"GetName", "VLXKDMReplica::GetName", 1.25, LibGetName, HandGetName},
+      {"GetModels", "VLXKDMReplica::GetModels", 1.25, LibGetModels, HandGetModels},
+      {"SetValueNamedInt", "VLXKDMInstance::SetValue(name, int)", 1.3, LibSetNamedInteger, HandSetNamedInteger},
+      {"SetValueAtText", "VLXKDMInstance::SetValue(position, text)", 1.3, LibSetTextAt, HandSetTextAt},
+      {"GetValueNamedInt", "VLXKDMInstance::GetValue(name) of an int", 1.3, LibGetNamedInteger, HandGetNamedInteger},
+      {"SetValueIntegers1000", "VLXKDMInstance::SetValueIntegers, 1000 values", 1.3, LibSetIntegers, HandSetIntegers},
+      {"SetValueIntList1000", "VLXKDMInstance::SetValue(name, list of 1000 ints)", 0, LibSetIntegerList,
+       HandSetIntegers},
+  };
+  return pairs;
+}
+
+void RunOperation(benchmark::State& state, Operation operation)
+{
+  World& w = *gWorld;
+  int i = 0;
+  for (auto _ : state) {
+    if (!operation(w, i++)) {
+      state.SkipWithError("the operation failed");
+      break;
+    }
+  }
+}
+
+// ---- The fill --------------------------------------------------------------------------------
+
+struct FillReplica {
+  VLXKDMReplica replica;
+  VLXKDMModel model;
+};
+
+bool MakeFillReplica(FillReplica& f)
+{
+  using T = VLXKDMAttributeType::Type;
+  const auto single = [](T type) { return std::make_pair(type, false); };
+  return f.replica.Build(VLXUnicodeString("fill")) >= 0 &&
+         AddClass(f.replica, "Item",
+                  {{"code", single(VLXKDMAttributeType::Integer)},
+                   {"price", single(VLXKDMAttributeType::Double)},
+                   {"label", single(VLXKDMAttributeType::String)},
+                   {"created", single(VLXKDMAttributeType::Date)},
+                   {"active", single(VLXKDMAttributeType::Boolean)},
+                   {"payload", single(VLXKDMAttributeType::Binary)},
+                   {"quantity", single(VLXKDMAttributeType::Integer)},
+                   {"note", single(VLXKDMAttributeType::String)}},
+                  f.model);
+}
+
+// The same instances as FillBaseline.fill, through the library, attributes by name.
+bool LibraryFill(VLXKDMModel& model, int count)
+{
+  static const VLXUnicodeString code("code"), price("price"), label("label"), created("created"), active("active"),
+      payload("payload"), quantity("quantity"), note("note"), noteText("fixed note");
+  VLXKDMInstance x;
+  char text[32];
+  unsigned char bytes[8];
+  bool ok = true;
+  for (int i = 0; i < count && ok; ++i) {
+    ok = model.CreateInstance(x) >= 0;
+    ok = ok && x.SetValue(code, i) >= 0;
+    ok = ok && x.SetValue(price, i * 0.25) >= 0;
+    std::snprintf(text, sizeof text, "item-%d", i);
+    ok = ok && x.SetValue(label, VLXUnicodeString(text)) >= 0;
+    VLXTime when;
+    when.Settime_t(kBaseSeconds + i);
+    ok = ok && x.SetValue(created, when) >= 0;
+    ok = ok && x.SetValue(active, static_cast<VLXBoolean>((i & 1) != 0)) >= 0;
+    for (int b = 0; b < 8; ++b) bytes[b] = static_cast<unsigned char>(static_cast<unsigned>(i) >> (b * 4));
+    ok = ok && x.SetValue(payload, VLXBinary(bytes, 8)) >= 0;
+    ok = ok && x.SetValue(quantity, i % 100) >= 0;
+    ok = ok && x.SetValue(note, noteText) >= 0;
+  }
+  return ok;
+}
+
+bool JavaFill(World& w, VLXKDMModel& model, int count)
+{
+  JNIEnv* env = w.env;
+  const jint made = env->CallStaticIntMethod(w.fillClass, w.fill, model.GetHandle(), static_cast<jint>(count),
+                                             static_cast<jlong>(kBaseSeconds));
+  return !Threw(env) && made == count;
+}
+
+void CollectGarbage(World& w)
+{
+  w.env->CallStaticVoidMethod(w.systemClass, w.systemGc);
+  Threw(w.env);
+}
+
+// The text form (with values) of every instance of model, in order.
+bool InstanceTexts(VLXKDMModel& model, std::vector<std::string>& texts)
+{
+  VLXKDMInstanceSet set;
+  int count = 0;
+  if (model.GetInstances(set) < 0 || set.GetCount(count) < 0) return false;
+  for (int p = 0; p < count; ++p) {
+    VLXKDMInstance x;
+    VLXUnicodeString text;
+    if (set.GetItem(p, x) < 0 || x.ToString(1, text) < 0) return false;
+    texts.emplace_back(text.c_str(), text.GetLengthInByte());
+  }
+  return true;
+}
+
+// Both fills make the same instances: their text forms, values included, are equal.
+bool FillsAgree(World& w, std::string& why)
+{
+  FillReplica viaLibrary, viaJava;
+  if (!MakeFillReplica(viaLibrary) || !MakeFillReplica(viaJava)) return Fail(why, "building the fill replica failed");
+  if (!LibraryFill(viaLibrary.model, 50)) return Fail(why, "the library's fill failed");
+  if (!JavaFill(w, viaJava.model, 50)) return Fail(why, "the Java fill failed");
+  std::vector<std::string> a, b;
+  if (!InstanceTexts(viaLibrary.model, a) || !InstanceTexts(viaJava.model, b)) return Fail(why, "reading back failed");
+  if (a.size() != 50 || a != b) {
+    for (size_t k = 0; k < std::min(a.size(), b.size()); ++k)
+      if (a[k] != b[k]) return Fail(why, "the fills differ at instance " + std::to_string(k) + ":\n  " + a[k] + "\n  " + b[k]);
+    return Fail(why, "the fills made different numbers of instances");
+  }
+  return true;
+}
+
+template <bool kLibrary>
+void RunFill(benchmark::State& state)
+{
+  World& w = *gWorld;
+  const int count = gOptions.fillInstances;
+  for (auto _ : state) {
+    state.PauseTiming();
+    auto f = std::make_unique<FillReplica>();
+    const bool made = MakeFillReplica(*f);
+    CollectGarbage(w);
+    state.ResumeTiming();
+    const bool ok = made && (kLibrary ? LibraryFill(f->model, count) : JavaFill(w, f->model, count));
+    state.PauseTiming();
+    f.reset();
+    state.ResumeTiming();
+    if (!ok) {
+      state.SkipWithError("the fill failed");
+      break;
+    }
+  }
+  state.counters["instances"] = count;
+}
+
+// ---- Allocations -----------------------------------------------------------------------------
+
+struct PerCall {
+  double news = 0;
+  double mallocs = 0;
+};
+
+struct AllocationFinding {
+  PerCall library;
+  PerCall hand;
+  bool ok = true;
+};
+
+PerCall Count(World& w, Operation operation, int calls, bool& ok)
+{
+  StartCountingAllocations();
+  for (int i = 0; i < calls; ++i) ok = operation(w, i) && ok;
+  const AllocationCounts counts = StopCountingAllocations();
+  return PerCall{static_cast<double>(counts.news) / calls, static_cast<double>(counts.mallocs) / calls};
+}
+
+// ---- The summary -----------------------------------------------------------------------------
+
+// The console output, plus each benchmark's real time per iteration in ns for the summary.
+class SummaryReporter : public benchmark::ConsoleReporter {
+ public:
+  void ReportRuns(const std::vector<Run>& runs) override
+  {
+    for (const Run& run : runs) {
+      const std::string name = run.run_name.function_name;
+      if (run.error_occurred) {
+        _failed[name] = run.error_message;
+        continue;
+      }
+      const double ns = run.GetAdjustedRealTime() * 1e9 / benchmark::GetTimeUnitMultiplier(run.time_unit);
+      if (run.run_type == Run::RT_Iteration)
+        _iterations[name].push_back(ns);
+      else if (run.aggregate_name == "median")
+        _median[name] = ns;
+    }
+    ConsoleReporter::ReportRuns(runs);
+  }
+
+  // The median over repetitions of the benchmark's time per iteration in ns, or a negative value.
+  double Nanoseconds(const std::string& name) const
+  {
+    const auto median = _median.find(name);
+    if (median != _median.end()) return median->second;
+    const auto found = _iterations.find(name);
+    if (found == _iterations.end() || found->second.empty()) return -1;
+    std::vector<double> v = found->second;
+    std::sort(v.begin(), v.end());
+    return v.size() % 2 ? v[v.size() / 2] : (v[v.size() / 2 - 1] + v[v.size() / 2]) / 2;
+  }
+  std::string Failure(const std::string& name) const
+  {
+    const auto found = _failed.find(name);
+    return found == _failed.end() ? std::string() : found->second;
+  }
+
+ private:
+  std::map<std::string, std::vector<double>> _iterations;
+  std::map<std::string, double> _median;
+  std::map<std::string, std::string> _failed;
+};
+
+std::string Figure(double ns)
+{
+  char text[32];
+  if (ns < 0) return "-";
+  if (ns >= 1e6)
+    std::snprintf(text, sizeof text, "%.1f ms", ns / 1e6);
+  else if (ns >= 1e4)
+    std::snprintf(text, sizeof text, "%.1f us", ns / 1e3);
+  else
+    std::snprintf(text, sizeof text, "%.1f ns", ns);
+  return text;
+}
+
+void PrintSummary(const SummaryReporter& reporter, const std::map<std::string, AllocationFinding>& allocations,
+                  const PerCall& fillAllocations)
+{
+  std::printf("\n==== Corvexa: library against hand-written JNI (same process, same run) ====\n");
+  std::printf("%-48s %11s %11s %7s %7s  %s\n", "operation", "library", "hand JNI", "ratio", "target", "");
+  int misses = 0;
+  const auto row = [&](const char* what, const std::string& lib, const std::string& base, double target) {
+    const double l = reporter.Nanoseconds(lib), h = reporter.Nanoseconds(base);
+    const double ratio = l > 0 && h > 0 ? l / h : -1;
+    std::string verdict;
+    if (!reporter.Failure(lib).empty() || !reporter.Failure(base).empty())
+      verdict = "FAILED: " + reporter.Failure(lib) + reporter.Failure(base);
+    else if (ratio < 0)
+      verdict = "not run";
+    else if (target > 0)
+      verdict = ratio <= target ? "meets target" : (++misses, "MISSES target");
+    char ratioText[16] = "-", targetText[16] = "-";
+    if (ratio >= 0) std::snprintf(ratioText, sizeof ratioText, "%.2f", ratio);
+    if (target > 0) std::snprintf(targetText, sizeof targetText, "<=%.2f", target);
+    std::printf("%-48s %11s %11s %7s %7s  %s\n", what, Figure(l).c_str(), Figure(h).c_str(), ratioText, targetText,
+                verdict.c_str());
+  };
+  for (const Pair& pair : Pairs())
+    row(pair.what, std::string(pair.key) + "/library", std::string(pair.key) + "/handJNI", pair.target);
+  const std::string fillWhat = "fill " + std::to_string(gOptions.fillInstances) + " instances x 8 attributes";
+  std::printf("%-48s %11s %11s %7s\n", "", "library", "pure Java", "ratio");
+  row(fillWhat.c_str(), "Fill/library", "Fill/pureJava", 0);
+
+  std::printf("\nHeap allocations per call on the calling thread, after warm-up (operator new | malloc):\n");
+  std::printf("%-48s %17s %17s\n", "operation", "library", "hand JNI");
+  for (const Pair& pair : Pairs()) {
+    const auto found = allocations.find(pair.key);
+    if (found == allocations.end()) continue;
+    const AllocationFinding& a = found->second;
+    char lib[40], hand[40];
+    std::snprintf(lib, sizeof lib, "%6.2f | %6.2f", a.library.news, a.library.mallocs);
+    std::snprintf(hand, sizeof hand, "%6.2f | %6.2f", a.hand.news, a.hand.mallocs);
+    std::printf("%-48s %17s %17s%s\n", pair.what, lib, hand, a.ok ? "" : "  (some calls failed)");
+  }
+  std::printf("%-48s %6.2f | %6.2f per instance (9 library calls each)\n", "fill through the library",
+              fillAllocations.news, fillAllocations.mallocs);
+  if (misses) std::printf("\n%d ratio(s) miss their target.\n", misses);
+}
+
+bool ParseOption(const char* arg, const char* name, int& value)
+{
+  const size_t length = std::strlen(name);
+  if (std::strncmp(arg, name, length) != 0 || arg[length] != '=') return false;
+  char* end = nullptr;
+  const long parsed = std::strtol(arg + length + 1, &end, 10);
+  if (*end != '\0' || parsed < 1 || parsed > 100000000) {
+    std::fprintf(stderr, "corvexa-bench: bad value in %s\n", arg);
+    std::exit(2);
+  }
+  value = static_cast<int>(parsed);
+  return true;
+}
+
+}  // namespace
+
+int main(int argc, char** argv)
+{
+  benchmark::Initialize(&argc, argv);
+  int kept = 1;
+  for (int i = 1; i < argc; ++i) {
+    if (ParseOption(argv[i], "--fill_instances", gOptions.fillInstances) ||
+        ParseOption(argv[i], "--fill_iterations", gOptions.fillIterations) ||
+        ParseOption(argv[i], "--warmup_calls", gOptions.warmupCalls))
+      continue;
+    argv[kept++] = argv[i];
+  }
+  argc = kept;
+  if (benchmark::ReportUnrecognizedArguments(argc, argv)) return 1;
+
+  // The Java baseline's jar goes before anything else the user put on the class path; the bridge
+  // reads this when the first library call creates the JVM.
+  std::string classPath = CORVEXA_BENCH_JAR;
+  if (const char* more = std::getenv("VLXJBX_CLASSPATH"); more && *more) classPath += std::string(":") + more;
+  setenv("VLXJBX_CLASSPATH", classPath.c_str(), 1);
+
+  auto world = std::make_unique<World>();
+  gWorld = world.get();
+  std::string why;
+  if (!SetUp(*world, why) || !FillsAgree(*world, why)) {
+    std::fprintf(stderr, "corvexa-bench: set-up failed: %s\n", why.c_str());
+    TearDown(*world);
+    return 1;
+  }
+
+  // Warm-up (the JIT compiles the Java side), then the allocations of one call.
+  std::map<std::string, AllocationFinding> allocations;
+  for (const Pair& pair : Pairs()) {
+    AllocationFinding& a = allocations[pair.key];
+    for (int i = 0; i < gOptions.warmupCalls; ++i) {
+      a.ok = pair.library(*world, i) && a.ok;
+      a.ok = pair.hand(*world, i) && a.ok;
+    }
+    const int calls = 1000;
+    a.library = Count(*world, pair.library, calls, a.ok);
+    a.hand = Count(*world, pair.hand, calls, a.ok);
+  }
+  PerCall fillAllocations;
+  {
+    FillReplica f;
+    const int count = std::min(gOptions.fillInstances, 10000);
+    bool ok = MakeFillReplica(f) && LibraryFill(f.model, count);  // warm
+    f = FillReplica();
+    ok = MakeFillReplica(f) && ok;
+    StartCountingAllocations();
+    ok = LibraryFill(f.model, count) && ok;
+    const AllocationCounts counts = StopCountingAllocations();
+    fillAllocations = PerCall{static_cast<double>(counts.news) / count, static_cast<double>(counts.mallocs) / count};
+    if (!ok) std::fprintf(stderr, "corvexa-bench: the fill failed while counting allocations\n");
+  }
+
+  for (const Pair& pair : Pairs()) {
+    const Operation library = pair.library, hand = pair.hand;
+    benchmark::RegisterBenchmark((std::string(pair.key) + "/library").c_str(),
+                                 [library](benchmark::State& s) { RunOperation(s, library); });
+    benchmark::RegisterBenchmark((std::string(pair.key) + "/handJNI").c_str(),
+                                 [hand](benchmark::State& s) { RunOperation(s, hand); });
+  }
+  for (int warm = 0; warm < 2; ++warm) {  // the Java fill's first runs are interpreted
+    FillReplica f;
+    if (MakeFillReplica(f)) JavaFill(*world, f.model, std::min(gOptions.fillInstances, 20000));
+  }
+  benchmark::RegisterBenchmark("Fill/library", RunFill<true>)
+      ->Iterations(gOptions.fillIterations)
+      ->Unit(benchmark::kMillisecond)
+      ->UseRealTime();
+  benchmark::RegisterBenchmark("Fill/pureJava", RunFill<false>)
+      ->Iterations(gOptions.fillIterations)
+      ->Unit(benchmark::kMillisecond)
+      ->UseRealTime();
+
+  SummaryReporter reporter;
+  benchmark::RunSpecifiedBenchmarks(&reporter);
+  PrintSummary(reporter, allocations, fillAllocations);
+  benchmark::Shutdown();
+  TearDown(*world);
+  return 0;
+}
