@@ -46,23 +46,40 @@ TEST_F(Converters, DateMillisecondsRoundToSecondsAtTheBoundaries)
     EXPECT_EQ(c.seconds, time.Gettime_t());
     dates.push_back(env->NewLocalRef(date.get()));
   }
-  // The list converter rounds the same way.
+  // The list converter rounds the same way, and so does the value holder reading a date or a date
+  // array.
   Local array(NewArray("java/util/Date", dates));
-  for (jobject d : dates) env->DeleteLocalRef(d);
   VLXListValVLXTime times;
   times.Append(Seconds(77));  // emptied first
   ASSERT_EQ(VLX_S_OK, Values::BuildFromJavaType(env, array.get(), times));
   ASSERT_EQ(static_cast<int>(std::size(cases)), times.Size());
   for (int i = 1; i <= times.Size(); ++i) EXPECT_EQ(cases[i - 1].seconds, times[i].Gettime_t()) << i;
+
+  VLXKDMInstanceValue list;
+  ASSERT_EQ(VLX_S_OK, list.SetHandle(env, array.get()));
+  ASSERT_EQ(VLX_S_OK, list.BuildLocal());
+  EXPECT_TRUE(list.GetListOfDate() == times);
+  for (size_t i = 0; i < dates.size(); ++i) {
+    SCOPED_TRACE(cases[i].ms);
+    VLXKDMInstanceValue single;
+    ASSERT_EQ(VLX_S_OK, single.SetHandle(env, dates[i]));
+    ASSERT_EQ(VLX_S_OK, single.BuildLocal());
+    EXPECT_EQ(cases[i].seconds, single.GetDate().Gettime_t());
+  }
+  for (jobject d : dates) env->DeleteLocalRef(d);
 }
 
-TEST_F(Converters, SecondsBecomeMillisecondsAndComeBackUnchanged)
+// Seconds become milliseconds exactly; read back, they go through the rounding above, so a
+// negative whole second comes back one second later (-1 000 ms + 500 = -500, rounded toward zero).
+TEST_F(Converters, SecondsBecomeMillisecondsAndComeBackThroughTheRounding)
 {
   const struct {
     time_t seconds;
     jlong ms;
-  } cases[] = {{1, 1000}, {2, 2000}, {0, 0}, {-1, -1000}, {-2, -2000}, {1700000000, 1700000000000LL},
-               {LLONG_MAX / 1000, LLONG_MAX / 1000 * 1000}};
+    time_t back;
+  } cases[] = {{1, 1000, 1},   {2, 2000, 2},   {0, 0, 0}, {-1, -1000, 0}, {-2, -2000, -1},
+               {1700000000, 1700000000000LL, 1700000000}, {LLONG_MAX / 1000, LLONG_MAX / 1000 * 1000, LLONG_MAX / 1000},
+               {LLONG_MIN / 1000, LLONG_MIN / 1000 * 1000, LLONG_MIN / 1000 + 1}};
   VLXListValVLXTime list;
   for (const auto& c : cases) {
     SCOPED_TRACE(c.seconds);
@@ -73,7 +90,7 @@ TEST_F(Converters, SecondsBecomeMillisecondsAndComeBackUnchanged)
     EXPECT_EQ(c.ms, TimeOf(date.get()));
     VLXTime back;
     ASSERT_EQ(VLX_S_OK, Values::BuildFromJavaType(env, date.get(), back));
-    EXPECT_EQ(c.seconds, back.Gettime_t());
+    EXPECT_EQ(c.back, back.Gettime_t());
     list.Append(Seconds(c.seconds));
   }
   jobject out = nullptr;
@@ -85,6 +102,18 @@ TEST_F(Converters, SecondsBecomeMillisecondsAndComeBackUnchanged)
     Local date(Element(array.get(), i));
     EXPECT_EQ(cases[i].ms, TimeOf(date.get()));
   }
+  // The value holder sends the same milliseconds.
+  VLXKDMInstanceValue value;
+  value.SetListOfDate(list);
+  ASSERT_EQ(VLX_S_OK, value.BuildRemote());
+  ASSERT_EQ(list.Size(), Length(value.GetHandle()));
+  for (int i = 0; i < list.Size(); ++i) {
+    Local date(Element(value.GetHandle(), i));
+    EXPECT_EQ(cases[i].ms, TimeOf(date.get()));
+  }
+  value.SetDate(Seconds(-1));
+  ASSERT_EQ(VLX_S_OK, value.BuildRemote());
+  EXPECT_EQ(-1000, TimeOf(value.GetHandle()));
 }
 
 TEST_F(Converters, ATimeBeyondTheRangeOfAJavaDateFailsAndMakesNothing)
@@ -136,8 +165,7 @@ TEST_F(Converters, BoxedScalarsRoundTripThroughTheirJavaClasses)
     ASSERT_EQ(VLX_S_OK, Values::ConvertToJavaType(env, value, out));
     Local boxed(out);
     EXPECT_TRUE(IsExactly(boxed.get(), "java/lang/Boolean"));
-    Local cls(FindClass("java/lang/Boolean"));
-    EXPECT_EQ(value, env->CallBooleanMethod(boxed.get(), env->GetMethodID(cls.as<jclass>(), "booleanValue", "()Z")));
+    EXPECT_EQ(value, BooleanOf(boxed.get()));
     VLXBoolean back = 7;
     ASSERT_EQ(VLX_S_OK, Values::BuildFromJavaType(env, boxed.get(), back));
     EXPECT_EQ(value, back);

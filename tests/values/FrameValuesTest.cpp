@@ -69,7 +69,7 @@ TEST(FrameValues, NativeValuesGoAsTheirJavaObjectsAndComeBackIntoAHolder)
   ASSERT_EQ(VLX_S_OK, Call(t.first, kSet, Instance_setValueNamed).with(count, AsJava(42)).run());
   VLXListValVLXTime times;
   times.Append(Seconds(10));
-  times.Append(Seconds(-3));
+  times.Append(Seconds(3));
   ASSERT_EQ(VLX_S_OK, Call(t.first, kSet, Instance_setValueNamed).with(dates, AsJava(times)).run());
   VLXListValVLXKDMInstance both;
   both.Append(t.first);

@@ -59,7 +59,7 @@ std::vector<Case> Cases(int n, const std::vector<VLXKDMInstance>& instances)
   };
   auto dates = [n] {
     VLXListValVLXTime l;
-    for (int i = 0; i < n; ++i) l.Append(Seconds(1700000000 - i * 86400));
+    for (int i = 0; i < n; ++i) l.Append(Seconds(1700000000 - i * 3600));
     return l;
   };
   auto binaries = [n] {
@@ -91,8 +91,8 @@ std::vector<Case> Cases(int n, const std::vector<VLXKDMInstance>& instances)
        [](VLXKDMInstanceValue& v) { v.SetString(VLXUnicodeString("caf\xC3\xA9 \xF0\x9F\x98\x80")); },
        [](const VLXKDMInstanceValue& v) { EXPECT_EQ("caf\xC3\xA9 \xF0\x9F\x98\x80", Text(v.GetString())); }},
       {"date", VLXKDMInstanceValue::DateType, false, "java/util/Date",
-       [](VLXKDMInstanceValue& v) { v.SetDate(Seconds(-86401)); },
-       [](const VLXKDMInstanceValue& v) { EXPECT_EQ(-86401, v.GetDate().Gettime_t()); }},
+       [](VLXKDMInstanceValue& v) { v.SetDate(Seconds(86401)); },
+       [](const VLXKDMInstanceValue& v) { EXPECT_EQ(86401, v.GetDate().Gettime_t()); }},
       {"binary", VLXKDMInstanceValue::BinaryType, false, "[B",
        [raw](VLXKDMInstanceValue& v) { v.SetBinary(VLXBinary(raw, 4)); },
        [raw](const VLXKDMInstanceValue& v) { EXPECT_TRUE(v.GetBinary() == VLXBinary(raw, 4)); }},

@@ -39,10 +39,23 @@ class Local {
   jobject _ref;
 };
 
+// Every JNI call the tests make themselves is followed by this check, so that the library is never
+// entered with an exception left pending by the test (the JVM's checks would blame the library).
+// A pending exception is printed, cleared and counted as a failure of the test.
+inline bool NoPending(const char* what)
+{
+  JNIEnv* env = Env();
+  if (!env->ExceptionCheck()) return true;
+  env->ExceptionDescribe();
+  env->ExceptionClear();
+  ADD_FAILURE() << "a Java exception is pending after " << what;
+  return false;
+}
+
 inline jclass FindClass(const char* path)
 {
   jclass cls = Env()->FindClass(path);
-  if (!cls) ADD_FAILURE() << "class not found: " << path;
+  if (!NoPending(path) || !cls) ADD_FAILURE() << "class not found: " << path;
   return cls;
 }
 
@@ -53,29 +66,48 @@ inline bool IsExactly(jobject object, const char* path)
   JNIEnv* env = Env();
   Local cls(env->GetObjectClass(object));
   Local expected(FindClass(path));
-  return env->IsSameObject(cls.get(), expected.get()) == JNI_TRUE;
+  return expected.get() && env->IsSameObject(cls.get(), expected.get()) == JNI_TRUE;
 }
 
+// A new date of class cls (java.util.Date or a subclass with a (long) constructor); null, with a
+// test failure, when it cannot be made.
 inline jobject NewDate(jlong ms, const char* cls = "java/util/Date")
 {
   JNIEnv* env = Env();
   Local date(FindClass(cls));
-  return env->NewObject(date.as<jclass>(), env->GetMethodID(date.as<jclass>(), "<init>", "(J)V"), ms);
+  if (!date.get()) return nullptr;
+  const jmethodID ctor = env->GetMethodID(date.as<jclass>(), "<init>", "(J)V");
+  if (!NoPending("looking up the (long) constructor") || !ctor) return nullptr;
+  jobject made = env->NewObject(date.as<jclass>(), ctor, ms);
+  return NoPending("making a date") ? made : nullptr;
 }
 
 inline jobject NewLong(jlong value)
 {
   JNIEnv* env = Env();
   Local cls(FindClass("java/lang/Long"));
-  return env->CallStaticObjectMethod(cls.as<jclass>(),
-                                     env->GetStaticMethodID(cls.as<jclass>(), "valueOf", "(J)Ljava/lang/Long;"), value);
+  const jmethodID valueOf = env->GetStaticMethodID(cls.as<jclass>(), "valueOf", "(J)Ljava/lang/Long;");
+  if (!NoPending("looking up Long.valueOf") || !valueOf) return nullptr;
+  jobject made = env->CallStaticObjectMethod(cls.as<jclass>(), valueOf, value);
+  return NoPending("Long.valueOf") ? made : nullptr;
 }
 
+// Date.getTime of a date (a test failure, and 0, when it throws).
 inline jlong TimeOf(jobject date)
 {
   JNIEnv* env = Env();
   Local cls(FindClass("java/util/Date"));
-  return env->CallLongMethod(date, env->GetMethodID(cls.as<jclass>(), "getTime", "()J"));
+  const jlong ms = env->CallLongMethod(date, env->GetMethodID(cls.as<jclass>(), "getTime", "()J"));
+  return NoPending("Date.getTime") ? ms : 0;
+}
+
+// Boolean.booleanValue of a boxed boolean.
+inline jboolean BooleanOf(jobject boxed)
+{
+  JNIEnv* env = Env();
+  Local cls(FindClass("java/lang/Boolean"));
+  const jboolean value = env->CallBooleanMethod(boxed, env->GetMethodID(cls.as<jclass>(), "booleanValue", "()Z"));
+  return NoPending("Boolean.booleanValue") ? value : JNI_FALSE;
 }
 
 // An array of class elementClass holding the given objects (nulls allowed).
@@ -84,16 +116,21 @@ inline jobjectArray NewArray(const char* elementClass, const std::vector<jobject
   JNIEnv* env = Env();
   Local cls(FindClass(elementClass));
   jobjectArray array = env->NewObjectArray(static_cast<jsize>(elements.size()), cls.as<jclass>(), nullptr);
-  for (size_t i = 0; i < elements.size(); ++i) env->SetObjectArrayElement(array, static_cast<jsize>(i), elements[i]);
+  if (!NoPending("making an array")) return nullptr;
+  for (size_t i = 0; i < elements.size(); ++i) {
+    env->SetObjectArrayElement(array, static_cast<jsize>(i), elements[i]);
+    if (!NoPending("storing an array element")) break;
+  }
   return array;
 }
 
 inline jobject Element(jobject array, int index)
 {
-  return Env()->GetObjectArrayElement(static_cast<jobjectArray>(array), index);
+  jobject element = Env()->GetObjectArrayElement(static_cast<jobjectArray>(array), index);
+  return NoPending("reading an array element") ? element : nullptr;
 }
 
-inline int Length(jobject array) { return Env()->GetArrayLength(static_cast<jarray>(array)); }
+inline int Length(jobject array) { return array ? Env()->GetArrayLength(static_cast<jarray>(array)) : -1; }
 
 inline bool Same(jobject a, jobject b) { return Env()->IsSameObject(a, b) == JNI_TRUE; }
 
