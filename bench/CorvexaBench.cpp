@@ -14,8 +14,9 @@
 //
 // Options of our own (besides Google Benchmark's):
 //   --fill_instances=N    instances per fill (default 100000)
-//   --fill_iterations=N   measured fills per side (default 5)
+//   --fill_iterations=N   measured fills per side, one per repetition (default 5)
 //   --warmup_calls=N      calls of each operation before anything is measured (default 20000)
+// The JVM gets the options of VLXJBX_JVM_OPTIONS, or when it is unset kDefaultJvmOptions below.
 #include <jni.h>
 
 #include <algorithm>
@@ -61,6 +62,7 @@ struct Options {
 Options gOptions;
 
 constexpr int kListLength = 1000;
+const char* const kDefaultJvmOptions = "-Xms1g -Xmx1g -XX:+AlwaysPreTouch";
 constexpr time_t kBaseSeconds = 1700000000;
 
 // Owns one local reference of the hand-written code and deletes it on every path.
@@ -377,6 +379,50 @@ void RunOperation(benchmark::State& state, Operation operation)
   }
 }
 
+// ---- Single JNI costs ------------------------------------------------------------------------
+// Not pairs: the price of the JNI functions the frame calls around every Java call, so that a
+// ratio's excess can be read as a count of them.
+
+bool JustExceptionCheck(World& w, int)
+{
+  return !w.env->ExceptionCheck();
+}
+
+bool JustIsInstanceOf(World& w, int)
+{
+  return w.env->IsInstanceOf(w.instanceRef, w.integerClass) == JNI_FALSE;
+}
+
+bool JustGetJNIEnv(World& w, int)
+{
+  JNIEnv* env = nullptr;
+  return VLXJBXJNIUtilities::GetJNIEnv(env, VLXListValVLXUnicodeString()) >= 0 && env == w.env;
+}
+
+bool JustGlobalRefPair(World& w, int)
+{
+  const jobject ref = w.env->NewGlobalRef(w.instanceRef);
+  w.env->DeleteGlobalRef(ref);
+  return ref != nullptr;
+}
+
+struct Single {
+  const char* key;
+  const char* what;
+  Operation operation;
+};
+
+const std::vector<Single>& Singles()
+{
+  static const std::vector<Single> singles = {
+      {"JNI/ExceptionCheck", "ExceptionCheck", JustExceptionCheck},
+      {"JNI/IsInstanceOf", "IsInstanceOf", JustIsInstanceOf},
+      {"JNI/NewGlobalRef+DeleteGlobalRef", "NewGlobalRef + DeleteGlobalRef", JustGlobalRefPair},
+      {"Bridge/GetJNIEnv", "VLXJBXJNIUtilities::GetJNIEnv (cached)", JustGetJNIEnv},
+  };
+  return singles;
+}
+
 // ---- The fill --------------------------------------------------------------------------------
 
 struct FillReplica {
@@ -520,9 +566,14 @@ PerCall Count(World& w, Operation operation, int calls, bool& ok)
 
 // ---- The summary -----------------------------------------------------------------------------
 
-// The console output, plus each benchmark's real time per iteration in ns for the summary.
+// The console output, plus each benchmark's times per iteration in ns for the summary.
 class SummaryReporter : public benchmark::ConsoleReporter {
  public:
+  struct Times {
+    double real = -1;
+    double cpu = -1;  // CPU time of the benchmark's own thread
+  };
+
   void ReportRuns(const std::vector<Run>& runs) override
   {
     for (const Run& run : runs) {
@@ -531,25 +582,29 @@ class SummaryReporter : public benchmark::ConsoleReporter {
         _failed[name] = run.error_message;
         continue;
       }
-      const double ns = run.GetAdjustedRealTime() * 1e9 / benchmark::GetTimeUnitMultiplier(run.time_unit);
+      const double scale = 1e9 / benchmark::GetTimeUnitMultiplier(run.time_unit);
+      const Times times{run.GetAdjustedRealTime() * scale, run.GetAdjustedCPUTime() * scale};
       if (run.run_type == Run::RT_Iteration)
-        _iterations[name].push_back(ns);
+        _iterations[name].push_back(times);
       else if (run.aggregate_name == "median")
-        _median[name] = ns;
+        _median[name] = times;
     }
     ConsoleReporter::ReportRuns(runs);
   }
 
-  // The median over repetitions of the benchmark's time per iteration in ns, or a negative value.
-  double Nanoseconds(const std::string& name) const
+  // The benchmark's times per iteration (the median over repetitions); negative when not run.
+  Times Nanoseconds(const std::string& name) const
   {
     const auto median = _median.find(name);
     if (median != _median.end()) return median->second;
     const auto found = _iterations.find(name);
-    if (found == _iterations.end() || found->second.empty()) return -1;
-    std::vector<double> v = found->second;
-    std::sort(v.begin(), v.end());
-    return v.size() % 2 ? v[v.size() / 2] : (v[v.size() / 2 - 1] + v[v.size() / 2]) / 2;
+    if (found == _iterations.end() || found->second.empty()) return Times{};
+    std::vector<double> real, cpu;
+    for (const Times& t : found->second) {
+      real.push_back(t.real);
+      cpu.push_back(t.cpu);
+    }
+    return Times{Median(real), Median(cpu)};
   }
   std::string Failure(const std::string& name) const
   {
@@ -558,8 +613,14 @@ class SummaryReporter : public benchmark::ConsoleReporter {
   }
 
  private:
-  std::map<std::string, std::vector<double>> _iterations;
-  std::map<std::string, double> _median;
+  static double Median(std::vector<double> v)
+  {
+    std::sort(v.begin(), v.end());
+    return v.size() % 2 ? v[v.size() / 2] : (v[v.size() / 2 - 1] + v[v.size() / 2]) / 2;
+  }
+
+  std::map<std::string, std::vector<Times>> _iterations;
+  std::map<std::string, Times> _median;
   std::map<std::string, std::string> _failed;
 };
 
@@ -576,15 +637,33 @@ std::string Figure(double ns)
   return text;
 }
 
+std::string Excess(double lib, double base)
+{
+  if (lib <= 0 || base <= 0) return "-";
+  return (lib >= base ? "+" : "-") + Figure(lib >= base ? lib - base : base - lib);
+}
+
+std::string Ratio(double a, double b)
+{
+  char text[16] = "-";
+  if (a > 0 && b > 0) std::snprintf(text, sizeof text, "%.2f", a / b);
+  return text;
+}
+
 void PrintSummary(const SummaryReporter& reporter, const std::map<std::string, AllocationFinding>& allocations,
                   const PerCall& fillAllocations)
 {
   std::printf("\n==== Corvexa: library against hand-written JNI (same process, same run) ====\n");
-  std::printf("%-48s %11s %11s %7s %7s  %s\n", "operation", "library", "hand JNI", "ratio", "target", "");
+  std::printf("Times per call; \"cpu\" is the CPU time of the calling thread, \"real\" the wall-clock time.\n");
+  std::printf("The target applies to the cpu ratio for single operations (steadier on a shared machine) and\n"
+              "is shown against both.\n\n");
+  std::printf("%-46s %10s %10s %10s %10s %10s %6s %6s %7s  %s\n", "operation", "lib cpu", "base cpu", "excess",
+              "lib real", "base real", "cpu x", "real x", "target", "");
   int misses = 0;
-  const auto row = [&](const char* what, const std::string& lib, const std::string& base, double target) {
-    const double l = reporter.Nanoseconds(lib), h = reporter.Nanoseconds(base);
-    const double ratio = l > 0 && h > 0 ? l / h : -1;
+  const auto row = [&](const char* what, const std::string& lib, const std::string& base, double target, bool byReal) {
+    const SummaryReporter::Times l = reporter.Nanoseconds(lib), b = reporter.Nanoseconds(base);
+    const double ratio = byReal ? (l.real > 0 && b.real > 0 ? l.real / b.real : -1)
+                                : (l.cpu > 0 && b.cpu > 0 ? l.cpu / b.cpu : -1);
     std::string verdict;
     if (!reporter.Failure(lib).empty() || !reporter.Failure(base).empty())
       verdict = "FAILED: " + reporter.Failure(lib) + reporter.Failure(base);
@@ -592,20 +671,30 @@ void PrintSummary(const SummaryReporter& reporter, const std::map<std::string, A
       verdict = "not run";
     else if (target > 0)
       verdict = ratio <= target ? "meets target" : (++misses, "MISSES target");
-    char ratioText[16] = "-", targetText[16] = "-";
-    if (ratio >= 0) std::snprintf(ratioText, sizeof ratioText, "%.2f", ratio);
+    char targetText[16] = "-";
     if (target > 0) std::snprintf(targetText, sizeof targetText, "<=%.2f", target);
-    std::printf("%-48s %11s %11s %7s %7s  %s\n", what, Figure(l).c_str(), Figure(h).c_str(), ratioText, targetText,
-                verdict.c_str());
+    std::printf("%-46s %10s %10s %10s %10s %10s %6s %6s %7s  %s\n", what, Figure(l.cpu).c_str(), Figure(b.cpu).c_str(),
+                Excess(l.cpu, b.cpu).c_str(), Figure(l.real).c_str(),
+                Figure(b.real).c_str(), Ratio(l.cpu, b.cpu).c_str(),
+                Ratio(l.real, b.real).c_str(), targetText, verdict.c_str());
   };
+  std::printf("  base: hand-written JNI\n");
   for (const Pair& pair : Pairs())
-    row(pair.what, std::string(pair.key) + "/library", std::string(pair.key) + "/handJNI", pair.target);
+    row(pair.what, std::string(pair.key) + "/library", std::string(pair.key) + "/handJNI", pair.target, false);
+  std::printf("  base: the same fill in pure Java, called once through JNI (ratio of real times)\n");
   const std::string fillWhat = "fill " + std::to_string(gOptions.fillInstances) + " instances x 8 attributes";
-  std::printf("%-48s %11s %11s %7s\n", "", "library", "pure Java", "ratio");
-  row(fillWhat.c_str(), "Fill/library", "Fill/pureJava", 0);
+  row(fillWhat.c_str(), "Fill/library", "Fill/pureJava", 0, true);
+  const SummaryReporter::Times fl = reporter.Nanoseconds("Fill/library"), fj = reporter.Nanoseconds("Fill/pureJava");
+  if (fl.real > 0 && fj.real > 0)
+    std::printf("%-46s %10s %10s   (real time per instance: library | pure Java)\n", "",
+                Figure(fl.real / gOptions.fillInstances).c_str(), Figure(fj.real / gOptions.fillInstances).c_str());
+
+  std::printf("\nSingle JNI costs, for reading the excess (cpu time per call):\n");
+  for (const Single& single : Singles())
+    std::printf("  %-44s %10s\n", single.what, Figure(reporter.Nanoseconds(single.key).cpu).c_str());
 
   std::printf("\nHeap allocations per call on the calling thread, after warm-up (operator new | malloc):\n");
-  std::printf("%-48s %17s %17s\n", "operation", "library", "hand JNI");
+  std::printf("%-46s %17s %17s\n", "operation", "library", "hand JNI");
   for (const Pair& pair : Pairs()) {
     const auto found = allocations.find(pair.key);
     if (found == allocations.end()) continue;
@@ -613,10 +702,10 @@ void PrintSummary(const SummaryReporter& reporter, const std::map<std::string, A
     char lib[40], hand[40];
     std::snprintf(lib, sizeof lib, "%6.2f | %6.2f", a.library.news, a.library.mallocs);
     std::snprintf(hand, sizeof hand, "%6.2f | %6.2f", a.hand.news, a.hand.mallocs);
-    std::printf("%-48s %17s %17s%s\n", pair.what, lib, hand, a.ok ? "" : "  (some calls failed)");
+    std::printf("%-46s %17s %17s%s\n", pair.what, lib, hand, a.ok ? "" : "  (some calls failed)");
   }
-  std::printf("%-48s %6.2f | %6.2f per instance (9 library calls each)\n", "fill through the library",
-              fillAllocations.news, fillAllocations.mallocs);
+  std::printf("%-46s %6.2f | %6.2f per instance: 9 library calls, and the caller's own VLXBinary (1 new)\n",
+              "fill through the library", fillAllocations.news, fillAllocations.mallocs);
   if (misses) std::printf("\n%d ratio(s) miss their target.\n", misses);
 }
 
@@ -655,6 +744,13 @@ int main(int argc, char** argv)
   std::string classPath = CORVEXA_BENCH_JAR;
   if (const char* more = std::getenv("VLXJBX_CLASSPATH"); more && *more) classPath += std::string(":") + more;
   setenv("VLXJBX_CLASSPATH", classPath.c_str(), 1);
+
+  // A heap of fixed size, touched in advance: otherwise the first use of each new heap page costs a
+  // page fault inside whichever operation happens to allocate there, which swamps the array
+  // benchmarks with noise. Both sides of every pair share the one JVM and its options.
+  if (const char* options = std::getenv("VLXJBX_JVM_OPTIONS"); !options || !*options)
+    setenv("VLXJBX_JVM_OPTIONS", kDefaultJvmOptions, 1);
+  std::printf("JVM options: %s\n", std::getenv("VLXJBX_JVM_OPTIONS"));
 
   auto world = std::make_unique<World>();
   gWorld = world.get();
@@ -702,14 +798,14 @@ int main(int argc, char** argv)
     FillReplica f;
     if (MakeFillReplica(f)) JavaFill(*world, f.model, std::min(gOptions.fillInstances, 20000));
   }
-  benchmark::RegisterBenchmark("Fill/library", RunFill<true>)
-      ->Iterations(gOptions.fillIterations)
-      ->Unit(benchmark::kMillisecond)
-      ->UseRealTime();
-  benchmark::RegisterBenchmark("Fill/pureJava", RunFill<false>)
-      ->Iterations(gOptions.fillIterations)
-      ->Unit(benchmark::kMillisecond)
-      ->UseRealTime();
+  for (const Single& single : Singles()) {
+    const Operation operation = single.operation;
+    benchmark::RegisterBenchmark(single.key, [operation](benchmark::State& s) { RunOperation(s, operation); });
+  }
+  // One fill per repetition, so that the summary takes the median fill.
+  for (auto* fill : {benchmark::RegisterBenchmark("Fill/library", RunFill<true>),
+                     benchmark::RegisterBenchmark("Fill/pureJava", RunFill<false>)})
+    fill->Iterations(1)->Repetitions(gOptions.fillIterations)->Unit(benchmark::kMillisecond)->UseRealTime();
 
   SummaryReporter reporter;
   benchmark::RunSpecifiedBenchmarks(&reporter);
