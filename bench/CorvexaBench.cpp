@@ -125,6 +125,15 @@ struct World {
   jmethodID fill = nullptr;
   jclass systemClass = nullptr;
   jmethodID systemGc = nullptr;
+
+  // The hand-written fill's identifiers.
+  jmethodID modelCreateInstance = nullptr;
+  jclass doubleClass = nullptr;
+  jmethodID doubleValueOf = nullptr;
+  jclass booleanClass = nullptr;
+  jmethodID booleanValueOf = nullptr;
+  jclass dateClass = nullptr;
+  jmethodID dateNew = nullptr;
 };
 World* gWorld = nullptr;
 
@@ -212,6 +221,18 @@ bool SetUp(World& w, std::string& why)
   w.systemClass = GlobalClass(env, "java/lang/System");
   w.systemGc = Method(env, w.systemClass, "gc", "()V", true);
   if (!w.systemGc) return Fail(why, "System.gc not found");
+
+  Local modelClass(env, env->GetObjectClass(w.model.GetHandle()));
+  w.modelCreateInstance = Method(env, static_cast<jclass>(modelClass.get()), "createInstance",
+                                 "()Lcom/velmora/tessara/kdmreplica/Instance;");
+  w.doubleClass = GlobalClass(env, "java/lang/Double");
+  w.doubleValueOf = Method(env, w.doubleClass, "valueOf", "(D)Ljava/lang/Double;", true);
+  w.booleanClass = GlobalClass(env, "java/lang/Boolean");
+  w.booleanValueOf = Method(env, w.booleanClass, "valueOf", "(Z)Ljava/lang/Boolean;", true);
+  w.dateClass = GlobalClass(env, "java/util/Date");
+  w.dateNew = Method(env, w.dateClass, "<init>", "(J)V");
+  if (!w.modelCreateInstance || !w.doubleValueOf || !w.booleanValueOf || !w.dateNew)
+    return Fail(why, "a lookup of the hand-written fill failed");
   return true;
 }
 
@@ -220,7 +241,9 @@ void TearDown(World& w)
   JNIEnv* env = w.env;
   if (!env) return;
   for (jobject ref : {w.replicaRef, w.instanceRef, w.modelsRef, static_cast<jobject>(w.integerClass),
-                      static_cast<jobject>(w.fillClass), static_cast<jobject>(w.systemClass)})
+                      static_cast<jobject>(w.fillClass), static_cast<jobject>(w.systemClass),
+                      static_cast<jobject>(w.doubleClass), static_cast<jobject>(w.booleanClass),
+                      static_cast<jobject>(w.dateClass)})
     if (ref) env->DeleteGlobalRef(ref);
 }
 
@@ -474,6 +497,57 @@ bool LibraryFill(VLXKDMModel& model, int count)
   return ok;
 }
 
+// The same fill by hand-written JNI, doing what the library does for each value: the attribute
+// name converted on every call, the value boxed (valueOf where Java has it), one setValue call.
+bool HandFill(World& w, VLXKDMModel& model, int count)
+{
+  static const VLXUnicodeString code("code"), price("price"), label("label"), created("created"), active("active"),
+      payload("payload"), quantity("quantity"), note("note"), noteText("fixed note");
+  JNIEnv* env = w.env;
+  const jobject modelRef = model.GetHandle();
+  // Sends value (a local reference, consumed) as the attribute name's new value.
+  const auto set = [&](jobject x, const VLXUnicodeString& name, jobject value) {
+    Local owned(env, value);
+    if (!value || env->ExceptionCheck()) {
+      Threw(env);
+      return false;
+    }
+    Local jname(env, NewJavaString(env, name));
+    if (!jname.get()) {
+      Threw(env);
+      return false;
+    }
+    env->CallVoidMethod(x, w.instanceSetValueNamed, jname.get(), value);
+    return !Threw(env);
+  };
+  char text[32];
+  jbyte bytes[8];
+  bool ok = true;
+  for (int i = 0; i < count && ok; ++i) {
+    Local x(env, env->CallObjectMethod(modelRef, w.modelCreateInstance));
+    if (Threw(env) || !x.get()) return false;
+    const jobject instance = x.get();
+    ok = set(instance, code, env->CallStaticObjectMethod(w.integerClass, w.integerValueOf, static_cast<jint>(i)));
+    ok = ok && set(instance, price, env->CallStaticObjectMethod(w.doubleClass, w.doubleValueOf, i * 0.25));
+    std::snprintf(text, sizeof text, "item-%d", i);
+    ok = ok && set(instance, label, NewJavaString(env, VLXUnicodeString(text)));
+    ok = ok && set(instance, created,
+                   env->NewObject(w.dateClass, w.dateNew, static_cast<jlong>(kBaseSeconds + i) * 1000));
+    ok = ok && set(instance, active,
+                   env->CallStaticObjectMethod(w.booleanClass, w.booleanValueOf, static_cast<jboolean>((i & 1) != 0)));
+    for (int b = 0; b < 8; ++b) bytes[b] = static_cast<jbyte>(static_cast<unsigned>(i) >> (b * 4));
+    if (ok) {
+      const jbyteArray array = env->NewByteArray(8);
+      if (array && !env->ExceptionCheck()) env->SetByteArrayRegion(array, 0, 8, bytes);
+      ok = set(instance, payload, array);
+    }
+    ok = ok && set(instance, quantity,
+                   env->CallStaticObjectMethod(w.integerClass, w.integerValueOf, static_cast<jint>(i % 100)));
+    ok = ok && set(instance, note, NewJavaString(env, noteText));
+  }
+  return ok;
+}
+
 bool JavaFill(World& w, VLXKDMModel& model, int count)
 {
   JNIEnv* env = w.env;
@@ -504,24 +578,42 @@ bool InstanceTexts(VLXKDMModel& model, std::vector<std::string>& texts)
 }
 
 // Both fills make the same instances: their text forms, values included, are equal.
+enum class FillBy { Library, HandJni, PureJava };
+
+bool Fill(World& w, FillBy by, VLXKDMModel& model, int count)
+{
+  switch (by) {
+    case FillBy::Library: return LibraryFill(model, count);
+    case FillBy::HandJni: return HandFill(w, model, count);
+    case FillBy::PureJava: return JavaFill(w, model, count);
+  }
+  return false;
+}
+
+// The three fills make the same instances: their text forms, values included, are equal.
 bool FillsAgree(World& w, std::string& why)
 {
-  FillReplica viaLibrary, viaJava;
-  if (!MakeFillReplica(viaLibrary) || !MakeFillReplica(viaJava)) return Fail(why, "building the fill replica failed");
-  if (!LibraryFill(viaLibrary.model, 50)) return Fail(why, "the library's fill failed");
-  if (!JavaFill(w, viaJava.model, 50)) return Fail(why, "the Java fill failed");
-  std::vector<std::string> a, b;
-  if (!InstanceTexts(viaLibrary.model, a) || !InstanceTexts(viaJava.model, b)) return Fail(why, "reading back failed");
-  if (a.size() != 50 || a != b) {
-    for (size_t k = 0; k < std::min(a.size(), b.size()); ++k)
-      if (a[k] != b[k]) return Fail(why, "the fills differ at instance " + std::to_string(k) + ":\n  " + a[k] + "\n  " + b[k]);
-    return Fail(why, "the fills made different numbers of instances");
+  const int count = 50;
+  std::vector<std::string> reference;
+  for (FillBy by : {FillBy::Library, FillBy::HandJni, FillBy::PureJava}) {
+    FillReplica f;
+    std::vector<std::string> texts;
+    if (!MakeFillReplica(f)) return Fail(why, "building the fill replica failed");
+    if (!Fill(w, by, f.model, count)) return Fail(why, "a fill failed");
+    if (!InstanceTexts(f.model, texts) || texts.size() != static_cast<size_t>(count))
+      return Fail(why, "reading a fill back failed");
+    if (by == FillBy::Library) {
+      reference = texts;
+      continue;
+    }
+    for (int k = 0; k < count; ++k)
+      if (texts[k] != reference[k])
+        return Fail(why, "the fills differ at instance " + std::to_string(k) + ":\n  " + reference[k] + "\n  " + texts[k]);
   }
   return true;
 }
 
-template <bool kLibrary>
-void RunFill(benchmark::State& state)
+void RunFill(benchmark::State& state, FillBy by)
 {
   World& w = *gWorld;
   const int count = gOptions.fillInstances;
@@ -531,7 +623,7 @@ void RunFill(benchmark::State& state)
     const bool made = MakeFillReplica(*f);
     CollectGarbage(w);
     state.ResumeTiming();
-    const bool ok = made && (kLibrary ? LibraryFill(f->model, count) : JavaFill(w, f->model, count));
+    const bool ok = made && Fill(w, by, f->model, count);
     state.PauseTiming();
     f.reset();
     state.ResumeTiming();
@@ -681,13 +773,17 @@ void PrintSummary(const SummaryReporter& reporter, const std::map<std::string, A
   std::printf("  base: hand-written JNI\n");
   for (const Pair& pair : Pairs())
     row(pair.what, std::string(pair.key) + "/library", std::string(pair.key) + "/handJNI", pair.target, false);
-  std::printf("  base: the same fill in pure Java, called once through JNI (ratio of real times)\n");
   const std::string fillWhat = "fill " + std::to_string(gOptions.fillInstances) + " instances x 8 attributes";
+  std::printf("  base: the same fill in pure Java, called once through JNI\n");
   row(fillWhat.c_str(), "Fill/library", "Fill/pureJava", 0, true);
-  const SummaryReporter::Times fl = reporter.Nanoseconds("Fill/library"), fj = reporter.Nanoseconds("Fill/pureJava");
-  if (fl.real > 0 && fj.real > 0)
-    std::printf("%-46s %10s %10s   (real time per instance: library | pure Java)\n", "",
-                Figure(fl.real / gOptions.fillInstances).c_str(), Figure(fj.real / gOptions.fillInstances).c_str());
+  std::printf("  base: the same fill by hand-written JNI\n");
+  row(fillWhat.c_str(), "Fill/library", "Fill/handJNI", 0, true);
+  const SummaryReporter::Times fl = reporter.Nanoseconds("Fill/library"), fh = reporter.Nanoseconds("Fill/handJNI"),
+                               fj = reporter.Nanoseconds("Fill/pureJava");
+  const double n = gOptions.fillInstances;
+  if (fl.real > 0 && fh.real > 0 && fj.real > 0)
+    std::printf("  real time per instance: library %s, hand-written JNI %s, pure Java %s\n",
+                Figure(fl.real / n).c_str(), Figure(fh.real / n).c_str(), Figure(fj.real / n).c_str());
 
   std::printf("\nSingle JNI costs, for reading the excess (cpu time per call):\n");
   for (const Single& single : Singles())
@@ -794,17 +890,20 @@ int main(int argc, char** argv)
     benchmark::RegisterBenchmark((std::string(pair.key) + "/handJNI").c_str(),
                                  [hand](benchmark::State& s) { RunOperation(s, hand); });
   }
-  for (int warm = 0; warm < 2; ++warm) {  // the Java fill's first runs are interpreted
-    FillReplica f;
-    if (MakeFillReplica(f)) JavaFill(*world, f.model, std::min(gOptions.fillInstances, 20000));
+  for (int warm = 0; warm < 2; ++warm) {  // the first runs of the Java code they reach are interpreted
+    for (FillBy by : {FillBy::HandJni, FillBy::PureJava}) {
+      FillReplica f;
+      if (MakeFillReplica(f)) Fill(*world, by, f.model, std::min(gOptions.fillInstances, 20000));
+    }
   }
   for (const Single& single : Singles()) {
     const Operation operation = single.operation;
     benchmark::RegisterBenchmark(single.key, [operation](benchmark::State& s) { RunOperation(s, operation); });
   }
   // One fill per repetition, so that the summary takes the median fill.
-  for (auto* fill : {benchmark::RegisterBenchmark("Fill/library", RunFill<true>),
-                     benchmark::RegisterBenchmark("Fill/pureJava", RunFill<false>)})
+  for (auto* fill : {benchmark::RegisterBenchmark("Fill/library", RunFill, FillBy::Library),
+                     benchmark::RegisterBenchmark("Fill/handJNI", RunFill, FillBy::HandJni),
+                     benchmark::RegisterBenchmark("Fill/pureJava", RunFill, FillBy::PureJava)})
     fill->Iterations(1)->Repetitions(gOptions.fillIterations)->Unit(benchmark::kMillisecond)->UseRealTime();
 
   SummaryReporter reporter;
