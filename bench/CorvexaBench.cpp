@@ -10,7 +10,8 @@
 // The summary at the end gives each pair's times (the median over repetitions when there are
 // several), their ratio against the target, and the heap allocations one call makes on the
 // calling thread once the operation has run before (counted by a replacement of operator new and
-// malloc that this program links in).
+// malloc that this program links in), and the JNI functions one call makes (counted through a
+// counting copy of the thread's JNI function table), to read each pair's excess against.
 //
 // Options of our own (besides Google Benchmark's):
 //   --fill_instances=N    instances per fill (default 100000)
@@ -34,6 +35,7 @@
 
 #include "AllocationCounter.h"
 #include "HandStrings.h"
+#include "JniCallCounter.h"
 #include "VLXBinary.h"
 #include "VLXJBXJNIUtilities.h"
 #include "VLXKDMAttributeDef.h"
@@ -646,7 +648,30 @@ struct AllocationFinding {
   PerCall library;
   PerCall hand;
   bool ok = true;
+  std::string libraryJni;  // the JNI calls of one call, as text
+  std::string handJni;
 };
+
+// The JNI functions that one call of operation makes, averaged over calls, as "Name n, ...".
+std::string JniCallsOf(World& w, Operation operation, int calls, bool& ok)
+{
+  StartCountingJni(w.env);
+  for (int i = 0; i < calls; ++i) ok = operation(w, i) && ok;
+  const JniCounts counts = StopCountingJni(w.env);
+  std::string text;
+  std::uint64_t total = 0;
+  for (int f = 0; f < kJniFunctionCount; ++f) {
+    if (!counts[f]) continue;
+    total += counts[f];
+    char item[64];
+    std::snprintf(item, sizeof item, "%s%s %.3g", text.empty() ? "" : ", ", JniFunctionName(static_cast<JniFunction>(f)),
+                  static_cast<double>(counts[f]) / calls);
+    text += item;
+  }
+  char sum[32];
+  std::snprintf(sum, sizeof sum, " (%.3g in all)", static_cast<double>(total) / calls);
+  return text + sum;
+}
 
 PerCall Count(World& w, Operation operation, int calls, bool& ok)
 {
@@ -802,6 +827,14 @@ void PrintSummary(const SummaryReporter& reporter, const std::map<std::string, A
   }
   std::printf("%-46s %6.2f | %6.2f per instance: 9 library calls, and the caller's own VLXBinary (1 new)\n",
               "fill through the library", fillAllocations.news, fillAllocations.mallocs);
+
+  std::printf("\nJNI calls per call (counted through the thread's JNI function table, not while timing):\n");
+  for (const Pair& pair : Pairs()) {
+    const auto found = allocations.find(pair.key);
+    if (found == allocations.end()) continue;
+    std::printf("%s\n  library:  %s\n  hand JNI: %s\n", pair.what, found->second.libraryJni.c_str(),
+                found->second.handJni.c_str());
+  }
   if (misses) std::printf("\n%d ratio(s) miss their target.\n", misses);
 }
 
@@ -868,6 +901,8 @@ int main(int argc, char** argv)
     const int calls = 1000;
     a.library = Count(*world, pair.library, calls, a.ok);
     a.hand = Count(*world, pair.hand, calls, a.ok);
+    a.libraryJni = JniCallsOf(*world, pair.library, 100, a.ok);
+    a.handJni = JniCallsOf(*world, pair.hand, 100, a.ok);
   }
   PerCall fillAllocations;
   {
