@@ -781,6 +781,23 @@ final class BinaryCodec {
             this.pos = base;
         }
 
+        /**
+         * What is being read, for the {@code {class}} and {@code {attr}} in descriptions: kept as
+         * parts and joined only when a message is made, so reading a schema builds no texts.
+         */
+        String className = "";
+        String attrName = "";
+        int index;
+
+        private String expand(String what) {
+            if (what.indexOf('{') < 0) {
+                return what;
+            }
+            return what.replace("{class}", "class '" + className + "'")
+                    .replace("{attr}", "attribute '" + className + "." + attrName + "'")
+                    .replace("{k}", Integer.toString(index));
+        }
+
         int remaining() {
             return end - pos;
         }
@@ -799,7 +816,7 @@ final class BinaryCodec {
 
         int u8(String what) {
             if (pos >= end) {
-                throw fail("truncated: " + what + " is missing");
+                throw fail("truncated: " + expand(what) + " is missing");
             }
             return b[pos++] & 0xFF;
         }
@@ -810,12 +827,12 @@ final class BinaryCodec {
             long v = 0;
             for (int i = 0;; i++) {
                 if (pos >= end) {
-                    throw failAt("truncated: " + what + " is cut short", start, null);
+                    throw failAt("truncated: " + expand(what) + " is cut short", start, null);
                 }
                 int c = b[pos++] & 0xFF;
                 if (i == maxBytes - 1) {
                     if (c > lastMax) {
-                        throw failAt("malformed number in " + what + ": too many bytes", start, null);
+                        throw failAt("malformed number in " + expand(what) + ": too many bytes", start, null);
                     }
                     return v | (long) c << (7 * i);
                 }
@@ -836,7 +853,7 @@ final class BinaryCodec {
             long v = u32(what);
             long room = Math.max(0, remaining() - owed);
             if (v > room / minBytes) {
-                throw failAt(what + " is " + v + ", more than the " + remaining() + " remaining bytes can hold",
+                throw failAt(expand(what) + " is " + v + ", more than the " + remaining() + " remaining bytes can hold",
                         start, null);
             }
             return (int) v;
@@ -850,7 +867,7 @@ final class BinaryCodec {
             int start = pos;
             long v = u32(what);
             if (v >= size) {
-                throw failAt(what + " is " + v + ", outside the " + size + " instances of the table", start, null);
+                throw failAt(expand(what) + " is " + v + ", outside the " + size + " instances of the table", start, null);
             }
             return (int) v;
         }
@@ -867,7 +884,7 @@ final class BinaryCodec {
 
         long i64(String what) {
             if (remaining() < 8) {
-                throw fail("truncated: " + what + " needs 8 bytes, " + remaining() + " remain");
+                throw fail("truncated: " + expand(what) + " needs 8 bytes, " + remaining() + " remain");
             }
             long v = 0;
             for (int i = 0; i < 8; i++) {
@@ -880,7 +897,7 @@ final class BinaryCodec {
             int start = pos;
             long len = u32(what);
             if (len > remaining()) {
-                throw failAt("truncated: " + what + " announces " + len + " bytes, " + remaining() + " remain", start,
+                throw failAt("truncated: " + expand(what) + " announces " + len + " bytes, " + remaining() + " remain", start,
                         null);
             }
             byte[] a = Arrays.copyOfRange(b, pos, pos + (int) len);
@@ -893,7 +910,7 @@ final class BinaryCodec {
             long tag = u32(what);
             long len = tag >>> 1;
             if (len > remaining()) {
-                throw failAt("truncated: " + what + " announces " + len + " bytes, " + remaining() + " remain", start,
+                throw failAt("truncated: " + expand(what) + " announces " + len + " bytes, " + remaining() + " remain", start,
                         null);
             }
             int n = (int) len;
@@ -907,12 +924,12 @@ final class BinaryCodec {
                     try {
                         StandardCharsets.UTF_8.newDecoder().decode(ByteBuffer.wrap(b, pos, n));
                     } catch (CharacterCodingException e) {
-                        throw failAt(what + " is not valid UTF-8", start, e);
+                        throw failAt(expand(what) + " is not valid UTF-8", start, e);
                     }
                 }
             } else {
                 if ((n & 1) != 0) {
-                    throw failAt(what + " holds an odd number of bytes (" + n + ") of UTF-16", start, null);
+                    throw failAt(expand(what) + " holds an odd number of bytes (" + n + ") of UTF-16", start, null);
                 }
                 s = ByteBuffer.wrap(b, pos, n).asCharBuffer().toString();
             }
@@ -920,8 +937,8 @@ final class BinaryCodec {
             return s;
         }
 
-        String[] strs(String what) {
-            int n = count(what + " count", 1);
+        String[] strs(String what, String countWhat) {
+            int n = count(countWhat, 1);
             String[] a = new String[n];
             for (int i = 0; i < n; i++) {
                 a[i] = str(what);
@@ -1062,7 +1079,8 @@ final class BinaryCodec {
 
         private ClassDef readClass(int i) {
             int at = in.pos;
-            String name = in.str("the name of class " + i);
+            in.index = i;
+            String name = in.str("the name of class {k}");
             ClassDef c;
             try {
                 c = new ClassDef(name);
@@ -1070,13 +1088,14 @@ final class BinaryCodec {
                 throw wrap(e, at);
             }
             String cn = "class '" + name + "'";
-            c.superName = in.str("the super class name of " + cn);
-            c.uuid = in.str("the uuid of " + cn);
-            c.comment = in.str("the comment of " + cn);
-            c.derivability = in.str("the derivability of " + cn);
-            c.scopeNames = in.strs("a scope name of " + cn);
+            in.className = name;
+            c.superName = in.str("the super class name of {class}");
+            c.uuid = in.str("the uuid of {class}");
+            c.comment = in.str("the comment of {class}");
+            c.derivability = in.str("the derivability of {class}");
+            c.scopeNames = in.strs("a scope name of {class}", "a scope name of {class} count");
             int flagsAt = in.pos;
-            int flags = in.u8("the flags of " + cn);
+            int flags = in.u8("the flags of {class}");
             if ((flags & ~0x3F) != 0 || (flags >>> 3 & 3) == 3) {
                 throw in.failAt("invalid flags 0x" + Integer.toHexString(flags) + " of " + cn, flagsAt, null);
             }
@@ -1085,7 +1104,7 @@ final class BinaryCodec {
             c.persistent = (flags & 4) != 0;
             c.visibility = VISIBILITIES[flags >>> 3 & 3];
             c.classType = (flags & 32) != 0 ? ClassType.Extension : ClassType.Class;
-            int na = in.count("the attribute count of " + cn, 8);
+            int na = in.count("the attribute count of {class}", 8);
             HashSet<String> names = new HashSet<>();
             for (int k = 0; k < na; k++) {
                 AttributeDef a = readAttribute(name, k);
@@ -1099,13 +1118,15 @@ final class BinaryCodec {
         }
 
         private AttributeDef readAttribute(String className, int k) {
-            String cn = "class '" + className + "'";
             int at = in.pos;
-            String name = in.str("the name of attribute " + k + " of " + cn);
+            in.index = k;
+            String name = in.str("the name of attribute {k} of {class}");
+            in.attrName = name;
             int typeAt = in.pos;
-            int type = in.u8("the type of attribute '" + name + "' of " + cn);
+            int type = in.u8("the type of {attr}");
             if (type >= TYPES.length) {
-                throw in.failAt("unknown type code " + type + " of attribute '" + name + "' of " + cn, typeAt, null);
+                throw in.failAt("unknown type code " + type + " of attribute '" + name + "' of class '" + className
+                        + "'", typeAt, null);
             }
             AttributeDef a;
             try {
@@ -1113,11 +1134,11 @@ final class BinaryCodec {
             } catch (IllegalArgumentException e) {
                 throw wrap(e, at);
             }
-            String an = "attribute '" + className + "." + name + "'";
             int flagsAt = in.pos;
-            int flags = in.u8("the flags of " + an);
+            int flags = in.u8("the flags of {attr}");
             if ((flags >>> 4 & 3) == 3 || (flags >>> 6 & 3) == 3) {
-                throw in.failAt("invalid flags 0x" + Integer.toHexString(flags) + " of " + an, flagsAt, null);
+                throw in.failAt("invalid flags 0x" + Integer.toHexString(flags) + " of attribute '" + className + "."
+                        + name + "'", flagsAt, null);
             }
             a.multi = (flags & 1) != 0;
             a.mandatory = (flags & 2) != 0;
@@ -1125,11 +1146,11 @@ final class BinaryCodec {
             a.aggregation = (flags & 8) != 0 ? AggregationType.Composition : AggregationType.Shared;
             a.accessMode = ACCESS_MODES[flags >>> 4 & 3];
             a.visibility = VISIBILITIES[flags >>> 6 & 3];
-            a.length = in.zint("the length of " + an);
-            a.uuid = in.str("the uuid of " + an);
-            a.comment = in.str("the comment of " + an);
-            a.targetNames = in.strs("a target name of " + an);
-            a.targetRefs = in.strs("a target reference of " + an);
+            a.length = in.zint("the length of {attr}");
+            a.uuid = in.str("the uuid of {attr}");
+            a.comment = in.str("the comment of {attr}");
+            a.targetNames = in.strs("a target name of {attr}", "a target name of {attr} count");
+            a.targetRefs = in.strs("a target reference of {attr}", "a target reference of {attr} count");
             return a;
         }
 
