@@ -1,0 +1,262 @@
+package com.velmora.tessara.bench;
+
+import com.velmora.tessara.kdmreplica.AttributeDef;
+import com.velmora.tessara.kdmreplica.AttributeType;
+import com.velmora.tessara.kdmreplica.ClassDef;
+import com.velmora.tessara.kdmreplica.Instance;
+import com.velmora.tessara.kdmreplica.Model;
+import com.velmora.tessara.kdmreplica.Replica;
+import java.io.StringReader;
+import java.nio.charset.StandardCharsets;
+import java.util.Arrays;
+import java.util.Date;
+import java.util.Random;
+import java.util.function.Supplier;
+import javax.xml.stream.XMLInputFactory;
+import javax.xml.stream.XMLStreamException;
+import javax.xml.stream.XMLStreamReader;
+
+/**
+ * Documents of the replica package, measured against a baseline taken in the same run: XML reading
+ * against a bare StAX pass over the same document, the binary form against XML, and the heap an
+ * instance costs beyond its values.
+ *
+ * <p>Usage: {@code ReplicaDocumentsBench [instances [repetitions]]} (default 200000 and 5). Each
+ * timing is preceded by warm-up runs and reported as the median of the repetitions. Targets are
+ * printed beside the figures; nothing here asserts them.
+ */
+public final class ReplicaDocumentsBench {
+    private static final String CLASS = "Item";
+    /** Eight attributes of mixed scalar types. */
+    private static final String[] NAMES = {"code", "count", "price", "weight", "label", "note", "since", "active"};
+    private static final AttributeType[] TYPES = {AttributeType.Integer, AttributeType.Integer, AttributeType.Double,
+        AttributeType.Double, AttributeType.String, AttributeType.String, AttributeType.Date, AttributeType.Boolean};
+
+    private ReplicaDocumentsBench() {
+    }
+
+    public static void main(String[] args) throws Exception {
+        int n = args.length > 0 ? Integer.parseInt(args[0]) : 200_000;
+        int reps = args.length > 1 ? Integer.parseInt(args[1]) : 5;
+        int warm = Math.max(1, Math.min(2, reps));
+        System.out.printf("Replica documents: %d instances of one class with %d scalar attributes,"
+                + " %d warm-up + %d measured runs, medians%n", n, NAMES.length, warm, reps);
+        System.out.printf("JVM: %s %s, max heap %d MB%n%n", System.getProperty("java.vm.name"),
+                System.getProperty("java.version"), Runtime.getRuntime().maxMemory() >> 20);
+
+        heapPerInstance(n);
+
+        Replica replica = build(n, values(n, 42));
+        String xml = replica.getXml(true);
+        byte[] xmlBytes = xml.getBytes(StandardCharsets.UTF_8);
+        double mb = xmlBytes.length / 1e6;
+
+        double stax = median(reps, warm, () -> staxPass(xml));
+        double xmlRead = median(reps, warm, () -> Replica.readFromXmlString(xml));
+        double xmlWrite = median(reps, warm, () -> replica.getXml(true));
+        byte[] bin = Replica.getBinaryFromReplica(replica, false);
+        byte[] packed = Replica.getBinaryFromReplica(replica, true);
+        double binRead = median(reps, warm, () -> Replica.getReplicaFromBinary(bin, false));
+        double binWrite = median(reps, warm, () -> Replica.getBinaryFromReplica(replica, false));
+        double packedRead = median(reps, warm, () -> Replica.getReplicaFromBinary(packed, true));
+        double packedWrite = median(reps, warm, () -> Replica.getBinaryFromReplica(replica, true));
+        checkSame(replica, Replica.getReplicaFromBinary(bin, false), n);
+        checkSame(replica, Replica.readFromXmlString(xml), n);
+
+        System.out.printf("XML document (schema embedded): %.1f MB%n", mb);
+        System.out.printf("  bare StAX pass       %8.1f ms  %7.1f MB/s%n", stax * 1e3, mb / stax);
+        System.out.printf("  XML read             %8.1f ms  %7.1f MB/s%n", xmlRead * 1e3, mb / xmlRead);
+        System.out.printf("  ratio XML read / bare StAX throughput: %.2f   (target >= 0.5)%n%n", stax / xmlRead);
+        System.out.printf("  XML write            %8.1f ms%n", xmlWrite * 1e3);
+        System.out.printf("  binary read          %8.1f ms   XML read / binary read:   %5.1fx (target >= 4)%n",
+                binRead * 1e3, xmlRead / binRead);
+        System.out.printf("  binary write         %8.1f ms   XML write / binary write: %5.1fx (target >= 4)%n",
+                binWrite * 1e3, xmlWrite / binWrite);
+        System.out.printf("  compressed read      %8.1f ms   compressed write %8.1f ms%n%n", packedRead * 1e3,
+                packedWrite * 1e3);
+        System.out.printf("Sizes: XML %d bytes, binary %d bytes, compressed binary %d bytes%n", xmlBytes.length,
+                bin.length, packed.length);
+        System.out.printf("  binary / XML size:            %.3f   (target <= 0.5)%n", (double) bin.length
+                / xmlBytes.length);
+        System.out.printf("  compressed binary / XML size: %.3f%n", (double) packed.length / xmlBytes.length);
+    }
+
+    // ------------------------------------------------------------------ data
+
+    /** The values of n instances, eight per instance in attribute order, in the forms setValue takes. */
+    private static Object[] values(int n, long seed) {
+        Random rnd = new Random(seed);
+        Object[] v = new Object[n * NAMES.length];
+        for (int i = 0; i < n; i++) {
+            int b = i * NAMES.length;
+            v[b] = 1_000_000 + i; // distinct boxes, none from the small-integer cache
+            v[b + 1] = 1000 + rnd.nextInt(1_000_000);
+            v[b + 2] = rnd.nextDouble() * 1000;
+            v[b + 3] = (double) rnd.nextInt(100_000) / 8;
+            v[b + 4] = "item-" + i;
+            v[b + 5] = "note " + Long.toString(rnd.nextLong() & Long.MAX_VALUE, 36);
+            v[b + 6] = new Date(1_600_000_000_000L + rnd.nextInt(Integer.MAX_VALUE) * 17L);
+            v[b + 7] = rnd.nextBoolean();
+        }
+        return v;
+    }
+
+    private static Replica build(int n, Object[] values) {
+        Replica r = new Replica("bench");
+        ClassDef c = new ClassDef(CLASS);
+        for (int k = 0; k < NAMES.length; k++) {
+            c.getAttributes().add(new AttributeDef(NAMES[k], TYPES[k]));
+        }
+        Model m = new Model(c);
+        r.getModels().add(m);
+        for (int i = 0; i < n; i++) {
+            Instance x = m.createInstance();
+            for (int k = 0; k < NAMES.length; k++) {
+                x.setValue(k, values[i * NAMES.length + k]);
+            }
+        }
+        r.commit();
+        return r;
+    }
+
+    /** Compares a replica read back with the original (counts and the values of a sample), so no timing measures a failure. */
+    private static void checkSame(Replica a, Replica b, int n) {
+        Model ma = a.getModels().getItem(CLASS);
+        Model mb = b.getModels().getItem(CLASS);
+        if (mb.getInstances().getCount() != n) {
+            throw new IllegalStateException("read back " + mb.getInstances().getCount() + " instances, not " + n);
+        }
+        for (int i = 0; i < n; i += Math.max(1, n / 997)) {
+            for (int k = 0; k < NAMES.length; k++) {
+                Object x = ma.getInstances().getItem(i).getValue(k);
+                Object y = mb.getInstances().getItem(i).getValue(k);
+                if (!x.equals(y)) {
+                    throw new IllegalStateException("instance " + i + ", " + NAMES[k] + ": " + x + " read back as " + y);
+                }
+            }
+        }
+    }
+
+    // ------------------------------------------------------------------ baseline
+
+    /** Walks every event of the document and touches each text, with the JDK's StAX set as the package sets it. */
+    private static long staxPass(String xml) {
+        XMLInputFactory f = XMLInputFactory.newDefaultFactory();
+        f.setProperty(XMLInputFactory.SUPPORT_DTD, Boolean.FALSE);
+        f.setProperty(XMLInputFactory.IS_SUPPORTING_EXTERNAL_ENTITIES, Boolean.FALSE);
+        f.setProperty(XMLInputFactory.IS_REPLACING_ENTITY_REFERENCES, Boolean.FALSE);
+        long sum = 0;
+        try {
+            XMLStreamReader r = f.createXMLStreamReader(new StringReader(xml));
+            while (r.hasNext()) {
+                int e = r.next();
+                if (e == XMLStreamReader.CHARACTERS) {
+                    sum += r.getTextLength();
+                } else if (e == XMLStreamReader.START_ELEMENT) {
+                    sum += r.getAttributeCount();
+                }
+            }
+            r.close();
+        } catch (XMLStreamException e) {
+            throw new IllegalStateException(e);
+        }
+        return sum;
+    }
+
+    // ------------------------------------------------------------------ timing
+
+    private static volatile Object sink;
+
+    /** Median seconds of {@code reps} runs after {@code warm} unmeasured ones. */
+    private static double median(int reps, int warm, Supplier<Object> work) {
+        for (int i = 0; i < warm; i++) {
+            sink = work.get();
+        }
+        double[] t = new double[reps];
+        for (int i = 0; i < reps; i++) {
+            sink = null;
+            gc();
+            long start = System.nanoTime();
+            sink = work.get();
+            t[i] = (System.nanoTime() - start) / 1e9;
+        }
+        sink = null;
+        Arrays.sort(t);
+        return reps % 2 == 1 ? t[reps / 2] : (t[reps / 2 - 1] + t[reps / 2]) / 2;
+    }
+
+    // ------------------------------------------------------------------ heap
+
+    private static long usedAfterGc() {
+        long best = Long.MAX_VALUE;
+        for (int i = 0; i < 4; i++) {
+            gc();
+            Runtime rt = Runtime.getRuntime();
+            best = Math.min(best, rt.totalMemory() - rt.freeMemory());
+        }
+        return best;
+    }
+
+    private static void gc() {
+        System.gc();
+        try {
+            Thread.sleep(20);
+        } catch (InterruptedException e) {
+            Thread.currentThread().interrupt();
+        }
+    }
+
+    /**
+     * Heap per instance beyond the values' own objects. Measured as differences of the heap in use
+     * after GC, all in this run:
+     * <ol>
+     * <li>{@code values}: the value objects alone, in the forms the replica stores (a boxed Integer,
+     * Double or Boolean, the String, and a Long of milliseconds for a Date), held by one flat array
+     * whose own size (a header and a 4-byte slot per value, or 8 without compressed references) is
+     * subtracted;</li>
+     * <li>{@code replica}: a replica built from those very objects (it keeps the boxes and strings
+     * it is given and makes a Long per Date, the same size as the one in step 1), after the flat
+     * array is dropped.</li>
+     * </ol>
+     * {@code (replica - values) / n} is then what the replica adds per instance: the instance
+     * object, its value array, its place in the model's list and anything else the package keeps.
+     */
+    private static void heapPerInstance(int n) {
+        long empty = usedAfterGc();
+        Object[] stored = values(n, 7);
+        for (int i = 6; i < stored.length; i += NAMES.length) {
+            stored[i] = ((Date) stored[i]).getTime(); // the stored form of a Date
+        }
+        long withValues = usedAfterGc();
+        long slot = slotBytes();
+        long valueBytes = withValues - empty - (16 + slot * stored.length);
+        Object[] given = stored.clone();
+        for (int i = 6; i < given.length; i += NAMES.length) {
+            given[i] = new Date((Long) given[i]);
+        }
+        Replica r = build(n, given);
+        given = null;
+        stored = null;
+        long withReplica = usedAfterGc();
+        sink = r;
+        double per = (double) (withReplica - empty - valueBytes) / n;
+        System.out.printf("Heap: the values' own objects %.1f bytes per instance; the replica %.1f bytes per"
+                + " instance with them%n", (double) valueBytes / n, (double) (withReplica - empty) / n);
+        System.out.printf("  heap per instance beyond its values: %.1f bytes   (target <= 200)%n%n", per);
+        sink = null;
+        if (r.getModels().getItem(CLASS).getInstances().getCount() != n) {
+            throw new IllegalStateException("the replica lost instances");
+        }
+    }
+
+    /** Bytes of one reference in an object array, from the heap that a large array occupies. */
+    private static long slotBytes() {
+        long before = usedAfterGc();
+        Object[] probe = new Object[1 << 22];
+        long after = usedAfterGc();
+        sink = probe;
+        long bytes = Math.round((double) (after - before) / probe.length);
+        sink = null;
+        return bytes == 8 ? 8 : 4;
+    }
+}
