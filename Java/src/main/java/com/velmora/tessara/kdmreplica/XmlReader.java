@@ -273,7 +273,7 @@ final class XmlReader {
     private void values(Instance x, Model m, String cls) {
         AttributeDef[] layout = m.alignedTo;
         Collect[] multi = null;
-        while (in.nextTag("instance of '" + cls + "'") == XMLStreamConstants.START_ELEMENT) {
+        while (in.nextTag("instance of", cls) == XMLStreamConstants.START_ELEMENT) {
             String n = in.r.getLocalName();
             int p = NS.equals(in.nsOf()) ? m.classDef.positionOf(n) : -1;
             if (p < 0) {
@@ -361,15 +361,16 @@ final class XmlReader {
                         + " other values");
             }
             c.nil = true;
-            String t = in.text("the value of '" + def.qualifiedName() + "'");
+            String t = in.valueText(def);
             if (!t.isEmpty() || esc != null || ref != null || bits != null) {
                 throw in.fail("attribute '" + def.qualifiedName() + "': an element with xsi:nil has no content");
             }
             return null;
         }
-        int line = in.line();
-        int column = in.column();
-        String text = in.text("the value of '" + def.qualifiedName() + "'");
+        javax.xml.stream.Location at = in.r.getLocation();
+        int line = at.getLineNumber();
+        int column = at.getColumnNumber();
+        String text = in.valueText(def);
         try {
             switch (def.type) {
                 case Integer: return XmlSupport.parseInt(text);

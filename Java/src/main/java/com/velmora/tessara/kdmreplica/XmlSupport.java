@@ -334,6 +334,11 @@ final class XmlSupport {
          * whitespace; other text is refused, naming {@code where}.
          */
         int nextTag(String where) {
+            return nextTag(where, null);
+        }
+
+        /** {@link #nextTag(String)} for {@code where} followed by a quoted name, joined only on failure. */
+        int nextTag(String where, String name) {
             for (;;) {
                 int e = next();
                 switch (e) {
@@ -345,7 +350,8 @@ final class XmlSupport {
                     case XMLStreamConstants.CDATA:
                     case XMLStreamConstants.SPACE:
                         if (!r.isWhiteSpace()) {
-                            throw fail("unexpected text '" + clip(r.getText().trim()) + "' in " + where);
+                            throw fail("unexpected text '" + clip(r.getText().trim()) + "' in "
+                                    + (name == null ? where : where + " '" + name + "'"));
                         }
                         break;
                     default:
@@ -356,6 +362,15 @@ final class XmlSupport {
 
         /** The text of the current element up to its end tag; a child element is refused. */
         String text(String where) {
+            return text(where, null);
+        }
+
+        /** The text of the value of an attribute ({@link #text(String)}, its description made only on failure). */
+        String valueText(AttributeDef def) {
+            return text(null, def);
+        }
+
+        private String text(String where, AttributeDef def) {
             StringBuilder b = null;
             String first = null;
             for (;;) {
@@ -376,7 +391,9 @@ final class XmlSupport {
                     case XMLStreamConstants.END_ELEMENT:
                         return b != null ? b.toString() : first == null ? "" : first;
                     case XMLStreamConstants.START_ELEMENT:
-                        throw fail("element " + qname() + " is not expected inside " + where + ", which holds text");
+                        throw fail("element " + qname() + " is not expected inside "
+                                + (def == null ? where : "the value of '" + def.qualifiedName() + "'")
+                                + ", which holds text");
                     default:
                         break;
                 }
@@ -770,8 +787,48 @@ final class XmlSupport {
         return null;
     }
 
-    private static final Pattern DOUBLE = Pattern.compile("[+-]?(\\d+(\\.\\d*)?|\\.\\d+)([eE][+-]?\\d+)?");
-    private static final Pattern INTEGER = Pattern.compile("[+-]?\\d+");
+
+    /** Whether {@code t} is a decimal xs:double: [+-]?(d+(.d*)?|.d+)([eE][+-]?d+)? with ASCII digits d. */
+    private static boolean isDecimal(String t) {
+        int n = t.length();
+        int i = 0;
+        if (i < n && (t.charAt(i) == '+' || t.charAt(i) == '-')) {
+            i++;
+        }
+        int digits = 0;
+        while (i < n && isDigit(t.charAt(i))) {
+            i++;
+            digits++;
+        }
+        if (i < n && t.charAt(i) == '.') {
+            i++;
+            while (i < n && isDigit(t.charAt(i))) {
+                i++;
+                digits++;
+            }
+        }
+        if (digits == 0) {
+            return false;
+        }
+        if (i < n && (t.charAt(i) == 'e' || t.charAt(i) == 'E')) {
+            i++;
+            if (i < n && (t.charAt(i) == '+' || t.charAt(i) == '-')) {
+                i++;
+            }
+            int exp = i;
+            while (i < n && isDigit(t.charAt(i))) {
+                i++;
+            }
+            if (i == exp) {
+                return false;
+            }
+        }
+        return i == n;
+    }
+
+    private static boolean isDigit(char c) {
+        return c >= '0' && c <= '9';
+    }
 
     /** @throws IllegalArgumentException for a text that is not an xs:double */
     static double parseDouble(String text, String bits) {
@@ -789,7 +846,7 @@ final class XmlSupport {
                 d = Double.NaN;
                 break;
             default:
-                if (!DOUBLE.matcher(t).matches()) {
+                if (!isDecimal(t)) {
                     throw new IllegalArgumentException("'" + clip(text) + "' is not a Double");
                 }
                 d = Double.parseDouble(t);
@@ -814,7 +871,12 @@ final class XmlSupport {
     /** @throws IllegalArgumentException for a text that is not a 32-bit integer */
     static int parseInt(String text) {
         String t = text.strip();
-        if (INTEGER.matcher(t).matches()) {
+        int start = t.isEmpty() || t.charAt(0) != '+' && t.charAt(0) != '-' ? 0 : 1;
+        boolean digits = start < t.length();
+        for (int i = start; i < t.length() && digits; i++) {
+            digits = isDigit(t.charAt(i));
+        }
+        if (digits) {
             try {
                 return Integer.parseInt(t.charAt(0) == '+' ? t.substring(1) : t);
             } catch (NumberFormatException e) {
@@ -906,6 +968,46 @@ final class XmlSupport {
         return b.append('Z').toString();
     }
 
+    /**
+     * The milliseconds of a date in the form {@link #formatDate} writes for years 1 to 9999
+     * ({@code 2024-03-01T12:00:00.250Z}), or Long.MIN_VALUE for any other text, which
+     * {@link #parseDate} then reads (and refuses) the general way.
+     */
+    private static long canonicalDate(String t) {
+        if (t.length() != 24 || t.charAt(4) != '-' || t.charAt(7) != '-' || t.charAt(10) != 'T' || t.charAt(13) != ':'
+                || t.charAt(16) != ':' || t.charAt(19) != '.' || t.charAt(23) != 'Z') {
+            return Long.MIN_VALUE;
+        }
+        int year = digits(t, 0, 4);
+        int month = digits(t, 5, 2);
+        int day = digits(t, 8, 2);
+        int hour = digits(t, 11, 2);
+        int minute = digits(t, 14, 2);
+        int second = digits(t, 17, 2);
+        int ms = digits(t, 20, 3);
+        if (year <= 0 || month < 0 || day < 0 || hour < 0 || hour > 23 || minute < 0 || second < 0 || ms < 0) {
+            return Long.MIN_VALUE;
+        }
+        try {
+            return LocalDateTime.of(year, month, day, hour, minute, second).toEpochSecond(ZoneOffset.UTC) * 1000L + ms;
+        } catch (DateTimeException e) {
+            return Long.MIN_VALUE;
+        }
+    }
+
+    /** The number written by {@code n} ASCII digits at {@code from}, or -1. */
+    private static int digits(String t, int from, int n) {
+        int v = 0;
+        for (int i = from; i < from + n; i++) {
+            char c = t.charAt(i);
+            if (!isDigit(c)) {
+                return -1;
+            }
+            v = v * 10 + (c - '0');
+        }
+        return v;
+    }
+
     private static final Pattern DATE = Pattern.compile(
             "(-?)(\\d{4,})-(\\d\\d)-(\\d\\d)T(\\d\\d):(\\d\\d):(\\d\\d)(?:\\.(\\d+))?(Z|[+-]\\d\\d:\\d\\d)?");
 
@@ -917,6 +1019,10 @@ final class XmlSupport {
      */
     static long parseDate(String text) {
         String t = text.strip();
+        long fast = canonicalDate(t);
+        if (fast != Long.MIN_VALUE) {
+            return fast;
+        }
         Matcher m = DATE.matcher(t);
         if (!m.matches()) {
             throw new IllegalArgumentException("'" + clip(text) + "' is not a Date (xs:dateTime such as"
