@@ -401,6 +401,31 @@ TEST(ValueFailures, AValueWithoutTypeMakesNoJavaCall)
   EXPECT_EQ(41, kept.GetInteger());
 }
 
+TEST(ValueFailures, AHolderThatCannotBeBuiltReachesNoJavaMethod)
+{
+  VLXKDMInstance counting;
+  AttachNew(counting, "com/velmora/tessara/testdoubles/CountingInstance");
+  FatalRecorder fatal;
+  VLXKDMInstanceValue untyped, unattached, unattachedList;
+  unattached.SetInstance(VLXKDMInstance());
+  VLXListValVLXKDMInstance list;
+  list.Append(VLXKDMInstance());
+  unattachedList.SetListOfInstance(list);
+  for (VLXKDMInstanceValue* value : {&untyped, &unattached, &unattachedList}) {
+    EXPECT_LT(counting.SetValue(VLXUnicodeString("any"), *value), 0);
+    EXPECT_LT(counting.SetValue(3, *value), 0);
+    EXPECT_EQ(nullptr, value->GetHandle());
+  }
+  EXPECT_EQ(6u, FatalRecorder::Reports().size());
+  EXPECT_EQ(0, IntField(counting.GetHandle(), "setValueCalls"));
+  // The same double counts a holder that can be built, and a typed setter.
+  VLXKDMInstanceValue typed;
+  typed.SetInteger(1);
+  EXPECT_EQ(VLX_S_OK, counting.SetValue(3, typed));
+  EXPECT_EQ(VLX_S_OK, counting.SetValue(VLXUnicodeString("any"), 2));
+  EXPECT_EQ(2, IntField(counting.GetHandle(), "setValueCalls"));
+}
+
 TEST(ValueFailures, UnattachedInstancesFailWithoutClearingTheAttribute)
 {
   SampleReplica s;
