@@ -274,6 +274,7 @@ long VLXKDMJavaObject::ConvertToJavaType(JNIEnv* env, const VLXListValVLXTime& i
     LocalRef date(env, H::NewObject(env, dateClass, dateNew, ms));
     if (H::ExceptionCheck(env)) return Translate(env, VLX_E_FAIL, kConvertTimes);
     H::SetObjectArrayElement(env, static_cast<jobjectArray>(array.get()), i - 1, date.get());
+    if (H::ExceptionCheck(env)) return Translate(env, VLX_E_FAIL, kConvertTimes);
   }
   output = array.release();
   return Translate(env, status, kConvertTimes);
