@@ -79,8 +79,8 @@ TEST(Identifiers, AnIdentifierOfAnotherClassFailsNamingIt)
     const char* testDouble;
     const char* named;
   } cases[] = {
-      {"com/velmora/tessara/testdoubles/IntegerIdInstance", "java/lang/Integer"},
-      {"com/velmora/tessara/testdoubles/LongInstance", "a Java class the library does not know"},
+      {"com/velmora/tessara/testdoubles/IntegerIdInstance", "a java.lang.Integer,"},
+      {"com/velmora/tessara/testdoubles/LongInstance", "a java.lang.Long,"},
   };
   for (const auto& c : cases) {
     SCOPED_TRACE(c.testDouble);

@@ -7,6 +7,7 @@
 #include "ProxyMembers.h"
 #include "Variadic.h"
 #include "VLXKDMInstanceValue.h"
+#include "VLXJBXJNIUtilities.h"
 #include "VLXListValVLXKDMInstance.h"
 
 using namespace corvexa;
@@ -21,42 +22,36 @@ struct IdentifierOut {
   VLXBinary& bytes;
 };
 
-// The Java name of a class of the binding table ("java/lang/Integer", "[I"), or null for a class
-// the table does not hold.
-inline const char* TableClassPath(JNIEnv* env, jclass cls)
+// The Java name of a class ("java.lang.Long"), or "" when it cannot be read. A rare error path: the
+// name is looked up here rather than kept in the binding table.
+inline std::string JavaClassName(JNIEnv* env, jclass cls)
 {
-  static const struct {
-    Slot slot;
-    const char* path;
-  } kClasses[] = {
-#define CLASS(name, path) {name, path},
-#define METHOD(name, member, signature)
-#define STATIC(name, member, signature)
-#define SETTER_FIRST(name, member, signature)
-#define CONSTANT(name, field)
-#define RESERVED(name)
-#include "BindingTable.def"
-#undef CLASS
-#undef METHOD
-#undef STATIC
-#undef SETTER_FIRST
-#undef CONSTANT
-#undef RESERVED
-  };
-  const ReplicaStubs* st = FrameAccess::Table();
-  for (const auto& c : kClasses)
-    if (VLXJBXJNIHelper::IsSameObject(env, cls, st->Class(c.slot))) return c.path;
-  return nullptr;
+  const LocalRef classClass(env, VLXJBXJNIHelper::GetObjectClass(env, cls));
+  jmethodID getName = nullptr;
+  if (!classClass.get() ||
+      VLXJBXJNIUtilities::GetMethodID(env, static_cast<jclass>(classClass.get()), "getName", "()Ljava/lang/String;",
+                                      getName) < 0 ||
+      !getName)
+    return std::string();
+  const LocalRef name(env, VLXJBXJNIHelper::CallObjectMethod(env, cls, getName));
+  if (VLXJBXJNIHelper::ExceptionCheck(env)) {
+    VLXJBXJNIUtilities::HandleJavaError(env, VLX_E_FAIL, "Class.getName", nullptr, 0);  // clears it
+    return std::string();
+  }
+  VLXUnicodeString text;
+  if (VLXJBXJNIConverter::BuildFromJavaType(env, name.get(), text) < 0) return std::string();
+  return std::string(text.c_str(), static_cast<size_t>(text.GetLengthInByte()));
 }
 
-// An identifier that is neither a text nor bytes: records a last error naming its class and
+// An identifier that is neither a text nor bytes: records a last error naming its Java class and
 // returns VLX_E_FAIL.
 inline long RejectIdentifier(JNIEnv* env, jclass cls, const char* name)
 {
-  const char* path = TableClassPath(env, cls);
-  const std::string what = std::string("the identifier is ") +
-                           (path ? std::string("a ") + path : std::string("of a Java class the library does not know")) +
-                           ", neither a java/lang/String nor a byte array ([B)";
+  const std::string javaName = JavaClassName(env, cls);
+  const std::string what = "the identifier is " +
+                           (javaName.empty() ? std::string("of a Java class whose name cannot be read")
+                                             : "a " + javaName) +
+                           ", neither a java.lang.String nor a byte array";
   VLXJBXException* error = new VLXJBXException(VLXJBXMessages::ConversionFailed);
   const VLXUnicodeString parameters[2] = {VLXUnicodeString(name), VLXUnicodeString(what.c_str())};
   error->SetNLSRequestParams(2, parameters);
