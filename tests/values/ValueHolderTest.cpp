@@ -181,6 +181,42 @@ TEST(ValueStates, ANewValueHasNoTypeAndCannotBeReadFromJava)
   EXPECT_EQ(kNoType, value.GetType());
 }
 
+// Empty -> Local -> Synchronized -> Attached -> Synchronized -> Local, as seen from outside.
+TEST(ValueStates, EmptyAttachedLocalAndSynchronized)
+{
+  JNIEnv* env = Env();
+  VLXKDMInstanceValue value;  // Empty
+  EXPECT_EQ(kNoType, value.GetType());
+  EXPECT_EQ(nullptr, value.GetHandle());
+  EXPECT_LT(value.BuildLocal(), 0);
+
+  value.SetInteger(5);  // Local
+  EXPECT_EQ(VLXKDMInstanceValue::IntegerType, value.GetType());
+  EXPECT_EQ(nullptr, value.GetHandle());
+
+  ASSERT_EQ(VLX_S_OK, value.BuildRemote());  // Synchronized
+  const jobject integer = value.GetHandle();
+  EXPECT_TRUE(IsExactly(integer, "java/lang/Integer"));
+
+  Local text(env->NewStringUTF("attached"));
+  ASSERT_EQ(VLX_S_OK, value.SetHandle(env, text.get()));  // Attached: the local form is not read yet
+  EXPECT_TRUE(Same(text.get(), value.GetHandle()));
+  EXPECT_EQ(VLXKDMInstanceValue::IntegerType, value.GetType());
+  EXPECT_EQ(5, value.GetInteger());
+
+  ASSERT_EQ(VLX_S_OK, value.BuildLocal());  // Synchronized with what Java holds
+  EXPECT_EQ(VLXKDMInstanceValue::StringType, value.GetType());
+  EXPECT_EQ("attached", Text(value.GetString()));
+  const jobject attached = value.GetHandle();
+  ASSERT_EQ(VLX_S_OK, value.BuildRemote());
+  EXPECT_EQ(attached, value.GetHandle());
+
+  value.SetListOfDouble(VLXRawColldouble());  // Local again
+  EXPECT_EQ(nullptr, value.GetHandle());
+  EXPECT_EQ(VLXKDMInstanceValue::DoubleType, value.GetType());
+  EXPECT_EQ(1, value.IsMultiValuated());
+}
+
 TEST(ValueStates, SettersDropTheJavaObjectAndBuildRemoteConvertsOnce)
 {
   VLXKDMInstanceValue value;
