@@ -31,7 +31,7 @@
 class CORVEXA_API VLXKDMInstanceValue : public VLXKDMJavaObject {
  public:
   // The value types. A value without type answers (Type) -1.
-  enum Type {
+  enum Type : int {
     IntegerType = 0,
     DoubleType = 1,
     StringType = 2,
