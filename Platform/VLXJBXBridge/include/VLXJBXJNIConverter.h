@@ -32,7 +32,13 @@ class VLXJBXJNIConverter
 public:
   // VLXUnicodeString <-> java.lang.String
   static long ConvertToJavaType(JNIEnv* env, const VLXUnicodeString& input, jstring& output);
+  // The same for a caller that knows no exception is pending (not checked again); failures and
+  // their last errors are the same.
+  static long ConvertToJavaString(JNIEnv* env, const VLXUnicodeString& input, jstring& output);
   static long BuildFromJavaType(JNIEnv* env, jobject input, VLXUnicodeString& output);
+  // The same for a reference known to be null or a java.lang.String (a method's declared String
+  // result), read with no exception pending: neither is checked again.
+  static long BuildFromJavaString(JNIEnv* env, jstring input, VLXUnicodeString& output);
 
   // VLXListValVLXUnicodeString <-> String[] (a null element of the Java array gives an empty string;
   // building also accepts any Object[] whose elements are strings)

@@ -87,12 +87,10 @@ long NewJavaString(JNIEnv* env, const char* bytes, int length, const char* opera
       units[n++] = static_cast<jchar>(c);
     }
   }
+  // NewString fails only with a null result (and an OutOfMemoryError pending).
   jstring result = env->NewString(units, n);
-  if (result == nullptr || env->ExceptionCheck()) {
-    if (result != nullptr)
-      env->DeleteLocalRef(result);
+  if (result == nullptr)
     return JavaFailed(env, operation, "NewString");
-  }
   output = result;
   return VLX_S_OK;
 }
@@ -158,13 +156,22 @@ long FromJavaArray(JNIEnv* env, jobject input, jclass VLXJBXDetail::JavaLang::*c
 
 // ---- strings ----
 
+namespace
+{
+const char kStringOperation[] = "VLXJBXJNIConverter::ConvertToJavaType(const VLXUnicodeString&, jstring&)";
+}
+
 long VLXJBXJNIConverter::ConvertToJavaType(JNIEnv* env, const VLXUnicodeString& input, jstring& output)
 {
-  static const char kOperation[] = "VLXJBXJNIConverter::ConvertToJavaType(const VLXUnicodeString&, jstring&)";
-  const long rc = Enter(env, kOperation);
+  const long rc = Enter(env, kStringOperation);
   if (VLX_FAILED(rc))
     return rc;
-  return NewJavaString(env, input.c_str(), input.GetLengthInByte(), kOperation, "the text", output);
+  return NewJavaString(env, input.c_str(), input.GetLengthInByte(), kStringOperation, "the text", output);
+}
+
+long VLXJBXJNIConverter::ConvertToJavaString(JNIEnv* env, const VLXUnicodeString& input, jstring& output)
+{
+  return NewJavaString(env, input.c_str(), input.GetLengthInByte(), kStringOperation, "the text", output);
 }
 
 long VLXJBXJNIConverter::BuildFromJavaType(JNIEnv* env, jobject input, VLXUnicodeString& output)
@@ -175,6 +182,11 @@ long VLXJBXJNIConverter::BuildFromJavaType(JNIEnv* env, jobject input, VLXUnicod
     rc = CheckClass(env, input, VLXJBXDetail::Lang(env).stringClass, kOperation, "java.lang.String");
   if (VLX_FAILED(rc))
     return rc;
+  return StringFromJava(env, input, output);
+}
+
+long VLXJBXJNIConverter::BuildFromJavaString(JNIEnv* env, jstring input, VLXUnicodeString& output)
+{
   return StringFromJava(env, input, output);
 }
 

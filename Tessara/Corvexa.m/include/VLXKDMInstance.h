@@ -130,6 +130,10 @@ class CORVEXA_API VLXKDMInstance : public VLXKDMJavaObject {
   // Sends object, which the caller owns, as the attribute's new value. Every typed setter ends here.
   long SetValue(const VLXUnicodeString& name, jobject object);
   long SetValue(int position, jobject object);
+  // Their frame; with started, the rest of it inside a typed setter's frame already started on that
+  // environment.
+  template <class Attribute>
+  long SetObject(JNIEnv* started, const Attribute& attribute, jobject object);
   // A typed setter: the Java form of value, made under the setter's method name text, goes to the
   // SetValue above.
   template <class Attribute, class T>

@@ -11,7 +11,9 @@
 //   7. release the arguments' local references
 //   8. no exception pending: land the result in the out-parameter (converter, SetHandle, or a
 //      primitive written as it came) and release it; an exception pending: leave it alone
-//   9. the error translation of the status
+//   9. the error translation of the status; a success already known to leave no exception pending
+//      (a landing after step 8 found none, or a forwarded operation's) returns VLX_S_OK at once, so
+//      that the success path checks for an exception once per Java call
 //
 // An operation declares its slot, method name text, arguments and out-parameter:
 //
@@ -118,7 +120,15 @@ struct PassedArg {  // passed as it is
   }
 };
 
-template <> struct ArgOf<VLXUnicodeString> : ConvertedArg<VLXUnicodeString, jstring> {};
+// A text: steps 2 and 3 (or the conversion before it) have found no exception pending.
+template <> struct ArgOf<VLXUnicodeString> {
+  using J = jstring;
+  static constexpr bool kOwnsRef = true;
+  static constexpr bool kEarly = false;
+  static long To(JNIEnv* env, const VLXUnicodeString& value, J& out) {
+    return VLXJBXJNIConverter::ConvertToJavaString(env, value, out);
+  }
+};
 template <> struct ArgOf<VLXListValVLXUnicodeString> : ConvertedArg<VLXListValVLXUnicodeString, jobjectArray> {};
 template <> struct ArgOf<VLXBinary> : ConvertedArg<VLXBinary, jbyteArray> {};
 template <> struct ArgOf<int> : PassedArg<jint> {};
@@ -162,7 +172,15 @@ struct PrimitiveResult {  // written as it came; the status stays
   }
 };
 
-template <> struct ResultOf<VLXUnicodeString> : ConvertedResult<VLXUnicodeString> {};
+// Every method answering a VLXUnicodeString is declared to return a java.lang.String, and step 8
+// has found no exception: the text is read without checking either again.
+template <> struct ResultOf<VLXUnicodeString> {
+  using Raw = jobject;
+  static long Land(JNIEnv* env, jobject result, VLXUnicodeString& out, long) {
+    LocalRef owned(env, result);
+    return VLXJBXJNIConverter::BuildFromJavaString(env, static_cast<jstring>(result), out);
+  }
+};
 template <> struct ResultOf<VLXListValVLXUnicodeString> : ConvertedResult<VLXListValVLXUnicodeString> {};
 template <> struct ResultOf<VLXBinary> : ConvertedResult<VLXBinary> {};
 template <> struct ResultOf<int> : PrimitiveResult<int, jint> {};
@@ -356,7 +374,16 @@ struct ArgOf<JavaForm<T>> {
   using J = jobject;
   static constexpr bool kOwnsRef = !std::is_same_v<T, VLXKDMInstance>;
   static constexpr bool kEarly = false;
-  static long To(JNIEnv* env, const JavaForm<T>& arg, J& out) { return Values::ConvertToJavaType(env, arg.value, out); }
+  static long To(JNIEnv* env, const JavaForm<T>& arg, J& out) {
+    if constexpr (std::is_same_v<T, VLXUnicodeString>) {  // a text, as a text argument goes
+      jstring text = nullptr;
+      const long status = ArgOf<VLXUnicodeString>::To(env, arg.value, text);
+      out = text;
+      return status;
+    } else {
+      return Values::ConvertToJavaType(env, arg.value, out);
+    }
+  }
 };
 
 // A value holder sent as its Java object: BuildRemote runs first, before any other argument is
@@ -421,6 +448,13 @@ class Call {
     return call;
   }
 
+  // The rest of a frame that an operation forwarding here has started on env (steps 1 to 3 done
+  // for the same proxy, no exception pending); null runs the whole frame.
+  Call& startedOn(JNIEnv* env) {
+    _started = env;
+    return *this;
+  }
+
   // A failed argument conversion returns the converter's code as it is, untranslated.
   Call& rawConversionCode() {
     _rawConversionCode = true;
@@ -445,6 +479,7 @@ class Call {
 
   VLXKDMJavaObject* _self;
   VLXKDMJavaObject* _created = nullptr;
+  JNIEnv* _started = nullptr;
   const char* _name;
   Slot _method;
   Slot _class;
@@ -469,8 +504,9 @@ class Bound {
   }
   // The constructor's new object is attached to the proxy given to Call::Construct.
   long construct() { return Execute<ResultOf<VLXKDMJavaObject>>(*_call._created); }
-  // In place of step 6, the converted arguments go to next, an operation of the library that makes
-  // the Java call; its result is the status that step 9 translates under this operation's name.
+  // In place of step 6, the environment and the converted arguments go to next, which makes the
+  // Java call through an operation of the library (usually started on that environment); its result
+  // is the status that step 9 translates under this operation's name.
   template <class Next>
   long forwardTo(Next&& next) {
     return Execute<Forwarded>(next);
@@ -483,9 +519,12 @@ class Bound {
   template <class Result, class Out>
   long Execute(Out& out) {
     const char* const name = _call._name;
-    JNIEnv* env = nullptr;                                                          // 1
-    long status = FrameAccess::Start(_call._self, env, name);                       // 2
-    if (status < 0) return VLXKDMJavaObject::HandleReplicaError(env, status, name);  // 3
+    JNIEnv* env = _call._started;                                                   // 1
+    long status = VLX_S_OK;
+    if (!env) {
+      status = FrameAccess::Start(_call._self, env, name);                          // 2
+      if (status < 0) return VLXKDMJavaObject::HandleReplicaError(env, status, name);  // 3
+    }
     ReplicaStubs* st = FrameAccess::Table();                                        // 4
     if (!st) return VLX_E_FAIL;
     if (!st->IsBound()) return st->ReportUnbound(name);
@@ -501,16 +540,22 @@ class Bound {
 
     using Raw = typename Result::Raw;                                               // 6
     if constexpr (std::is_same_v<Result, Forwarded>) {
-      status = std::apply(out, jargs);
+      status = std::apply([&](auto... j) { return out(env, j...); }, jargs);
       ReleaseAll(env, jargs, std::index_sequence_for<A...>{});                      // 7
+      // The other operation ran the whole frame: its success leaves no exception pending.
+      if (status >= 0) return VLX_S_OK;
     } else if constexpr (std::is_void_v<Raw>) {
       Invoke<void>(env, *st, jargs);
       ReleaseAll(env, jargs, std::index_sequence_for<A...>{});                      // 7
     } else {
       const Raw result = Invoke<Raw>(env, *st, jargs);
       ReleaseAll(env, jargs, std::index_sequence_for<A...>{});                      // 7
-      if (!VLXJBXJNIHelper::ExceptionCheck(env))                                    // 8
+      if (!VLXJBXJNIHelper::ExceptionCheck(env)) {                                  // 8
         status = Result::Land(env, result, out, status);
+        // A landing that succeeds leaves no exception behind: the converters and the value
+        // holder fail on any exception they meet.
+        if (status >= 0) return VLX_S_OK;
+      }
     }
     return VLXKDMJavaObject::HandleReplicaError(env, status, name);                 // 9
   }

@@ -195,25 +195,29 @@ long VLXKDMInstance::SetValue(int position, VLXKDMInstanceValue& value)
       .run();
 }
 
-long VLXKDMInstance::SetValue(const VLXUnicodeString& name, jobject object)
+template <class Attribute>
+long VLXKDMInstance::SetObject(JNIEnv* started, const Attribute& attribute, jobject object)
 {
-  return Call(*this, "VLXKDMInstance::SetValue(const VLXUnicodeString&, jobject)", Instance_setValueNamed)
-      .with(name, object)
+  constexpr bool kAt = std::is_same_v<Attribute, int>;
+  return Call(*this, kAt ? "VLXKDMInstance::SetValue(int, jobject)" : "VLXKDMInstance::SetValue(const VLXUnicodeString&, jobject)",
+              kAt ? Instance_setValueAt : Instance_setValueNamed)
+      .startedOn(started)
+      .with(attribute, object)
       .run();
 }
 
-long VLXKDMInstance::SetValue(int position, jobject object)
-{
-  return Call(*this, "VLXKDMInstance::SetValue(int, jobject)", Instance_setValueAt).with(position, object).run();
-}
+long VLXKDMInstance::SetValue(const VLXUnicodeString& name, jobject object) { return SetObject(nullptr, name, object); }
 
-// The typed setter's own frame converts the value; the Java call is the private SetValue's.
+long VLXKDMInstance::SetValue(int position, jobject object) { return SetObject(nullptr, position, object); }
+
+// The typed setter's own frame converts the value; the Java call is the private SetValue's, in the
+// same frame.
 template <class Attribute, class T>
 long VLXKDMInstance::SetConverted(const char* methodName, const Attribute& attribute, const T& value)
 {
   const Slot setValue = std::is_same_v<Attribute, int> ? Instance_setValueAt : Instance_setValueNamed;
-  return Call(*this, methodName, setValue).with(AsJava(value)).forwardTo([&](jobject object) {
-    return SetValue(attribute, object);
+  return Call(*this, methodName, setValue).with(AsJava(value)).forwardTo([&](JNIEnv* env, jobject object) {
+    return SetObject(env, attribute, object);
   });
 }
 

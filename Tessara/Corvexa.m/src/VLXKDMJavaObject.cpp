@@ -83,6 +83,8 @@ long VLXKDMJavaObject::InitJava(JNIEnv*& env, const char* methodName)
     status = StartJavaSide(env);
   }
   _javaInitDone.store(1, std::memory_order_release);
+  // The success path checks for a pending Java exception once, without the error translation.
+  if (status >= 0 && env && !VLXJBXJNIHelper::ExceptionCheck(env)) return VLX_S_OK;
   return HandleReplicaError(env, status, methodName);
 }
 
@@ -108,7 +110,9 @@ long VLXKDMJavaObject::StartJavaSide(JNIEnv* env)
 long VLXKDMJavaObject::InitJavaAndTestIsBuilt(JNIEnv*& env, const char* methodName)
 {
   long status = InitJava(env, methodName);
-  if (status >= 0 && !GetHandle()) status = VLX_E_FAIL;
+  // A successful start has just found no Java exception pending: a built proxy needs no more.
+  if (status >= 0 && GetHandle()) return VLX_S_OK;
+  if (status >= 0) status = VLX_E_FAIL;
   return HandleReplicaError(env, status, methodName);
 }
 

@@ -99,8 +99,9 @@ long BuildScalar(JNIEnv* env, jobject input, Native& output, const char* name, R
   if (!st) return status;
   if (!input) return Translate(env, RejectValue(name, "the Java object is null"), name);
   const Native value = read(*st);
-  if (!H::ExceptionCheck(env)) output = value;
-  return Translate(env, status, name);
+  if (H::ExceptionCheck(env)) return Translate(env, status, name);
+  output = value;
+  return VLX_S_OK;
 }
 
 // A native scalar to a new Java object of class cls made by constructor ctor.
@@ -111,8 +112,9 @@ long ConvertScalar(JNIEnv* env, Slot cls, Slot ctor, Java value, jobject& output
   const ReplicaStubs* st = TableFor(name, status);
   if (!st) return status;
   const jobject object = H::NewObject(env, st->Class(cls), st->Method(ctor), value);
-  if (!H::ExceptionCheck(env)) output = object;
-  return Translate(env, status, name);
+  if (H::ExceptionCheck(env)) return Translate(env, status, name);
+  output = object;
+  return VLX_S_OK;
 }
 
 }  // namespace

@@ -8,11 +8,14 @@
 
 namespace corvexa {
 
+constexpr int kMaxReserved = 1 << 16;
+
 // Reads count arguments of type VaArg (none when count <= 0) and appends convert(argument) for each.
 template <class List, class VaArg, class Convert>
 List Gather(int count, va_list args, Convert convert)
 {
-  List list;
+  // Room for the arguments reserved once (up to a bound: a count is the caller's word, not a size).
+  List list(count > 0 ? (count < kMaxReserved ? count : kMaxReserved) : 0);
   for (int i = 0; i < count; ++i) list.Append(convert(va_arg(args, VaArg)));
   return list;
 }
