@@ -115,6 +115,33 @@ TEST_F(FrameTest, AJavaExceptionIsReportedClearedAndLeavesOutParametersAlone)
   EXPECT_EQ("other", Text(otherName));
 }
 
+// A caller's own JNI code may leave an exception pending: the operation must not call Java over
+// it, and reports it through the Java error handling instead.
+TEST_F(FrameTest, AnExceptionPendingBeforeTheCallFailsItWithoutAJavaCall)
+{
+  VLXKDMReplica replica;
+  ASSERT_EQ(VLX_S_OK, replica.Build(VLXUnicodeString("before")));
+  JNIEnv* env = Env();
+  for (const bool built : {true, false}) {
+    jclass cls = env->FindClass("java/lang/IllegalArgumentException");
+    ASSERT_NE(nullptr, cls);
+    ASSERT_EQ(0, env->ThrowNew(cls, "left by the caller"));
+    env->DeleteLocalRef(cls);
+
+    VLXUnicodeString name("kept");
+    VLXKDMReplica unbuilt;
+    EXPECT_EQ(VLX_E_FAIL, (built ? replica : unbuilt).GetName(name));
+    EXPECT_EQ("kept", Text(name));
+    EXPECT_FALSE(env->ExceptionCheck());
+    const LastError error = PeekLastError();
+    EXPECT_NE(std::string::npos, error.text.find("java.lang.IllegalArgumentException")) << error.text;
+    EXPECT_NE(std::string::npos, error.text.find("left by the caller")) << error.text;
+  }
+  VLXUnicodeString name;
+  EXPECT_EQ(VLX_S_OK, replica.GetName(name));
+  EXPECT_EQ("before", Text(name));
+}
+
 TEST_F(FrameTest, NullJavaResultsGiveEmptyValuesAndUnbuiltProxies)
 {
   VLXKDMReplica nulls;
