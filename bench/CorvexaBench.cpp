@@ -121,6 +121,7 @@ struct World {
   jmethodID instanceSetValueAt = nullptr;
   jmethodID instanceGetValueNamed = nullptr;
   int handInteger = 0;
+  jobject keptValue = nullptr;  // the hand-written GetValue's Java value, held as the value holder holds it
 
   // The fill's Java baseline and the collector, called between measured fills.
   jclass fillClass = nullptr;
@@ -242,7 +243,7 @@ void TearDown(World& w)
 {
   JNIEnv* env = w.env;
   if (!env) return;
-  for (jobject ref : {w.replicaRef, w.instanceRef, w.modelsRef, static_cast<jobject>(w.integerClass),
+  for (jobject ref : {w.replicaRef, w.instanceRef, w.modelsRef, w.keptValue, static_cast<jobject>(w.integerClass),
                       static_cast<jobject>(w.fillClass), static_cast<jobject>(w.systemClass),
                       static_cast<jobject>(w.doubleClass), static_cast<jobject>(w.booleanClass),
                       static_cast<jobject>(w.dateClass)})
@@ -336,6 +337,29 @@ bool HandGetNamedInteger(World& w, int)
   return !Threw(env);
 }
 
+// The same, also holding the Java value by a global reference in place of the previous one, as the
+// value holder does (its synchronized state keeps the Java object): the share of the gap that the
+// holder's contract costs.
+bool HandGetNamedIntegerKept(World& w, int)
+{
+  JNIEnv* env = w.env;
+  Local name(env, NewJavaString(env, w.integerName));
+  if (!name.get()) {
+    Threw(env);  // malformed text (nothing pending) or a failed NewString
+    return false;
+  }
+  Local value(env, env->CallObjectMethod(w.instanceRef, w.instanceGetValueNamed, name.get()));
+  if (Threw(env) || !value.get()) return false;
+  if (!env->IsInstanceOf(value.get(), w.integerClass)) return false;
+  const jobject held = env->NewGlobalRef(value.get());
+  if (!held) return false;
+  if (w.keptValue) env->DeleteGlobalRef(w.keptValue);
+  w.keptValue = held;
+  w.handInteger = env->CallIntMethod(held, w.integerIntValue);
+  benchmark::DoNotOptimize(w.handInteger);
+  return !Threw(env);
+}
+
 template <std::size_t... I>
 long SetThousand(VLXKDMInstance& instance, const VLXUnicodeString& name, const int* v, std::index_sequence<I...>)
 {
@@ -385,6 +409,8 @@ const std::vector<Pair>& Pairs()
       {"SetValueNamedInt", "VLXKDMInstance::SetValue(name, int)", 1.3, LibSetNamedInteger, HandSetNamedInteger},
       {"SetValueAtText", "VLXKDMInstance::SetValue(position, text)", 1.3, LibSetTextAt, HandSetTextAt},
       {"GetValueNamedInt", "VLXKDMInstance::GetValue(name) of an int", 1.3, LibGetNamedInteger, HandGetNamedInteger},
+      {"GetValueNamedIntKept", "  the same, hand JNI keeping the Java value (global ref)", 0, LibGetNamedInteger,
+       HandGetNamedIntegerKept},
       {"SetValueIntegers1000", "VLXKDMInstance::SetValueIntegers, 1000 values", 1.3, LibSetIntegers, HandSetIntegers},
       {"SetValueIntList1000", "VLXKDMInstance::SetValue(name, list of 1000 ints)", 0, LibSetIntegerList,
        HandSetIntegers},
