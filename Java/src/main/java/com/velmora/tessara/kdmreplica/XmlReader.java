@@ -370,13 +370,21 @@ final class XmlReader {
         javax.xml.stream.Location at = in.r.getLocation();
         int line = at.getLineNumber();
         int column = at.getColumnNumber();
-        String text = in.valueText(def);
+        // numbers, booleans and dates are read from the characters, without a String
+        boolean chars = def.type == AttributeType.Integer || def.type == AttributeType.Double
+                || def.type == AttributeType.Boolean || def.type == AttributeType.Date;
+        String text = null;
+        if (chars) {
+            in.valueChars(def);
+        } else {
+            text = in.valueText(def);
+        }
         try {
             switch (def.type) {
-                case Integer: return XmlSupport.parseInt(text);
-                case Double: return XmlSupport.parseDouble(text, bits);
-                case Boolean: return XmlSupport.parseBoolean(text);
-                case Date: return XmlSupport.parseDate(text);
+                case Integer: return XmlSupport.parseInt(in.chars, in.charCount);
+                case Double: return XmlSupport.parseDouble(in.chars, in.charCount, bits);
+                case Boolean: return XmlSupport.parseBoolean(in.chars, in.charCount);
+                case Date: return XmlSupport.parseDate(in.chars, in.charCount);
                 case Binary: return XmlSupport.parseBinary(text);
                 case String:
                     if (esc == null) {

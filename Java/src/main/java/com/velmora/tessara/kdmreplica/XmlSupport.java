@@ -19,6 +19,7 @@ import java.time.DateTimeException;
 import java.time.LocalDateTime;
 import java.time.ZoneOffset;
 import java.util.ArrayList;
+import java.util.Arrays;
 import java.util.Base64;
 import java.util.List;
 import java.util.regex.Matcher;
@@ -349,11 +350,57 @@ final class XmlSupport {
                     case XMLStreamConstants.CHARACTERS:
                     case XMLStreamConstants.CDATA:
                     case XMLStreamConstants.SPACE:
-                        if (!r.isWhiteSpace()) {
+                        if (!isWhiteSpace()) {
                             throw fail("unexpected text '" + clip(r.getText().trim()) + "' in "
                                     + (name == null ? where : where + " '" + name + "'"));
                         }
                         break;
+                    default:
+                        break;
+                }
+            }
+        }
+
+        /** Whether the current text event holds only XML whitespace (space, tab, line feed, carriage return). */
+        private boolean isWhiteSpace() {
+            char[] c = r.getTextCharacters();
+            for (int i = r.getTextStart(), end = i + r.getTextLength(); i < end; i++) {
+                if (!isSpace(c[i])) {
+                    return false;
+                }
+            }
+            return true;
+        }
+
+        /** The characters of the last {@link #valueChars} (the first {@link #charCount}); reused from value to value. */
+        char[] chars = new char[64];
+        int charCount;
+
+        /**
+         * Reads the text of the value of an attribute up to its end tag into {@link #chars}, as
+         * {@link #valueText} does, without making a String of it.
+         */
+        void valueChars(AttributeDef def) {
+            int n = 0;
+            for (;;) {
+                int e = next();
+                switch (e) {
+                    case XMLStreamConstants.CHARACTERS:
+                    case XMLStreamConstants.CDATA:
+                    case XMLStreamConstants.SPACE:
+                        int len = r.getTextLength();
+                        if (len > chars.length - n) {
+                            chars = Arrays.copyOf(chars, Math.max(n + len, 2 * chars.length));
+                        }
+                        System.arraycopy(r.getTextCharacters(), r.getTextStart(), chars, n, len);
+                        n += len;
+                        break;
+                    case XMLStreamConstants.END_ELEMENT:
+                        charCount = n;
+                        return;
+                    case XMLStreamConstants.START_ELEMENT:
+                        throw fail("element " + qname() + " is not expected inside the value of '"
+                                + def.qualifiedName() + "', which holds text");
                     default:
                         break;
                 }
@@ -868,6 +915,116 @@ final class XmlSupport {
         return d;
     }
 
+    /**
+     * {@link #parseDouble(String, String)} of the first {@code n} characters of {@code c}: a
+     * decimal number without surrounding whitespace or bits is read here, anything else the
+     * general way.
+     */
+    static double parseDouble(char[] c, int n, String bits) {
+        if (bits == null) {
+            double d = decimal(c, n);
+            if (d == d) {
+                return d;
+            }
+        }
+        return parseDouble(new String(c, 0, n), bits);
+    }
+
+    /**
+     * The value of the first {@code n} characters of {@code c} when they are a decimal xs:double
+     * (see {@link #isDecimal}) with at most 19 significant digits whose value {@link Decimals}
+     * decides; otherwise NaN.
+     */
+    private static double decimal(char[] c, int n) {
+        int i = 0;
+        boolean negative = false;
+        if (n > 0 && (c[0] == '+' || c[0] == '-')) {
+            negative = c[0] == '-';
+            i++;
+        }
+        long w = 0; // the significant digits, unsigned
+        int significant = 0;
+        int q = 0; // w * 10^q is the value
+        boolean anyDigit = false;
+        for (boolean fraction = false; i < n; i++) {
+            char d = c[i];
+            if (isDigit(d)) {
+                anyDigit = true;
+                if (w != 0 || d != '0') {
+                    if (++significant > 19) {
+                        return Double.NaN;
+                    }
+                    w = w * 10 + (d - '0');
+                }
+                if (fraction) {
+                    q--;
+                }
+            } else if (d == '.' && !fraction) {
+                fraction = true;
+            } else {
+                break;
+            }
+        }
+        if (!anyDigit) {
+            return Double.NaN;
+        }
+        if (i < n && (c[i] == 'e' || c[i] == 'E')) {
+            i++;
+            boolean negativeExponent = false;
+            if (i < n && (c[i] == '+' || c[i] == '-')) {
+                negativeExponent = c[i] == '-';
+                i++;
+            }
+            int start = i;
+            int e = 0;
+            for (; i < n && isDigit(c[i]); i++) {
+                if (e < 100_000) { // far beyond any double; the general way reads such exponents
+                    e = e * 10 + (c[i] - '0');
+                }
+            }
+            if (i == start) {
+                return Double.NaN;
+            }
+            q += negativeExponent ? -e : e;
+        }
+        return i == n ? Decimals.toDouble(negative, w, q) : Double.NaN;
+    }
+
+    /**
+     * {@link #parseInt(String)} of the first {@code n} characters of {@code c}: a sign and up to
+     * ten digits are read here, anything else the general way.
+     */
+    static int parseInt(char[] c, int n) {
+        int i = n > 0 && (c[0] == '+' || c[0] == '-') ? 1 : 0;
+        if (n - i >= 1 && n - i <= 10) {
+            long v = 0;
+            for (int k = i; k < n && isDigit(c[k]); k++) {
+                v = v * 10 + (c[k] - '0');
+                if (k == n - 1) {
+                    v = c[0] == '-' ? -v : v;
+                    if (v >= Integer.MIN_VALUE && v <= Integer.MAX_VALUE) {
+                        return (int) v;
+                    }
+                }
+            }
+        }
+        return parseInt(new String(c, 0, n));
+    }
+
+    /** {@link #parseBoolean(String)} of the first {@code n} characters of {@code c}. */
+    static boolean parseBoolean(char[] c, int n) {
+        if (n == 1 && (c[0] == '1' || c[0] == '0')) {
+            return c[0] == '1';
+        }
+        if (n == 4 && c[0] == 't' && c[1] == 'r' && c[2] == 'u' && c[3] == 'e') {
+            return true;
+        }
+        if (n == 5 && c[0] == 'f' && c[1] == 'a' && c[2] == 'l' && c[3] == 's' && c[4] == 'e') {
+            return false;
+        }
+        return parseBoolean(new String(c, 0, n));
+    }
+
     /** @throws IllegalArgumentException for a text that is not a 32-bit integer */
     static int parseInt(String text) {
         String t = text.strip();
@@ -970,12 +1127,13 @@ final class XmlSupport {
 
     /**
      * The milliseconds of a date in the form {@link #formatDate} writes for years 1 to 9999
-     * ({@code 2024-03-01T12:00:00.250Z}), or Long.MIN_VALUE for any other text, which
-     * {@link #parseDate} then reads (and refuses) the general way.
+     * ({@code 2024-03-01T12:00:00.250Z}) in the first {@code n} characters of {@code t}, or
+     * Long.MIN_VALUE for any other text, which {@link #parseDate} then reads (and refuses) the
+     * general way.
      */
-    private static long canonicalDate(String t) {
-        if (t.length() != 24 || t.charAt(4) != '-' || t.charAt(7) != '-' || t.charAt(10) != 'T' || t.charAt(13) != ':'
-                || t.charAt(16) != ':' || t.charAt(19) != '.' || t.charAt(23) != 'Z') {
+    private static long canonicalDate(char[] t, int n) {
+        if (n != 24 || t[4] != '-' || t[7] != '-' || t[10] != 'T' || t[13] != ':' || t[16] != ':' || t[19] != '.'
+                || t[23] != 'Z') {
             return Long.MIN_VALUE;
         }
         int year = digits(t, 0, 4);
@@ -985,21 +1143,39 @@ final class XmlSupport {
         int minute = digits(t, 14, 2);
         int second = digits(t, 17, 2);
         int ms = digits(t, 20, 3);
-        if (year <= 0 || month < 0 || day < 0 || hour < 0 || hour > 23 || minute < 0 || second < 0 || ms < 0) {
+        if (year <= 0 || month < 1 || month > 12 || day < 1 || day > daysInMonth(year, month) || hour < 0
+                || hour > 23 || minute < 0 || minute > 59 || second < 0 || second > 59 || ms < 0) {
             return Long.MIN_VALUE;
         }
-        try {
-            return LocalDateTime.of(year, month, day, hour, minute, second).toEpochSecond(ZoneOffset.UTC) * 1000L + ms;
-        } catch (DateTimeException e) {
-            return Long.MIN_VALUE;
+        return ((epochDay(year, month, day) * 24 + hour) * 60 + minute) * 60_000L + second * 1000L + ms;
+    }
+
+    private static int daysInMonth(int year, int month) {
+        if (month == 2) {
+            return year % 4 == 0 && (year % 100 != 0 || year % 400 == 0) ? 29 : 28;
         }
+        return month == 4 || month == 6 || month == 9 || month == 11 ? 30 : 31;
+    }
+
+    /**
+     * Days from 1970-01-01 to a date of the proleptic Gregorian calendar with a year from 1: whole
+     * 400-year cycles from 0000-03-01, then the years of the cycle and the day of a year that
+     * starts in March (so that February's leap day is its last).
+     */
+    private static long epochDay(int year, int month, int day) {
+        int y = month <= 2 ? year - 1 : year;
+        int cycle = y / 400;
+        int yearOfCycle = y - cycle * 400;
+        int dayOfYear = (153 * (month > 2 ? month - 3 : month + 9) + 2) / 5 + day - 1;
+        int dayOfCycle = yearOfCycle * 365 + yearOfCycle / 4 - yearOfCycle / 100 + dayOfYear;
+        return cycle * 146_097L + dayOfCycle - 719_468;
     }
 
     /** The number written by {@code n} ASCII digits at {@code from}, or -1. */
-    private static int digits(String t, int from, int n) {
+    private static int digits(char[] t, int from, int n) {
         int v = 0;
         for (int i = from; i < from + n; i++) {
-            char c = t.charAt(i);
+            char c = t[i];
             if (!isDigit(c)) {
                 return -1;
             }
@@ -1012,6 +1188,15 @@ final class XmlSupport {
             "(-?)(\\d{4,})-(\\d\\d)-(\\d\\d)T(\\d\\d):(\\d\\d):(\\d\\d)(?:\\.(\\d+))?(Z|[+-]\\d\\d:\\d\\d)?");
 
     /**
+     * {@link #parseDate(String)} of the first {@code n} characters of {@code c}: the form written
+     * by {@link #formatDate} is read here, anything else the general way.
+     */
+    static long parseDate(char[] c, int n) {
+        long fast = canonicalDate(c, n);
+        return fast != Long.MIN_VALUE ? fast : parseDate(new String(c, 0, n));
+    }
+
+    /**
      * Milliseconds since 1970 UTC of an xs:dateTime. A time without zone is taken as UTC; digits
      * finer than a millisecond must be zeros.
      *
@@ -1019,7 +1204,7 @@ final class XmlSupport {
      */
     static long parseDate(String text) {
         String t = text.strip();
-        long fast = canonicalDate(t);
+        long fast = t.length() == 24 ? canonicalDate(t.toCharArray(), 24) : Long.MIN_VALUE;
         if (fast != Long.MIN_VALUE) {
             return fast;
         }
