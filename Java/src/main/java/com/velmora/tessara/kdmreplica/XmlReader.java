@@ -6,6 +6,7 @@ import static com.velmora.tessara.kdmreplica.XmlSupport.XSI;
 
 import java.nio.file.Path;
 import java.util.ArrayList;
+import java.util.Arrays;
 import java.util.HashMap;
 import java.util.List;
 import javax.xml.stream.XMLStreamConstants;
@@ -29,8 +30,61 @@ final class XmlReader {
     private final Staging st;
     private final Replica target;
     private final XmlSupport.In in;
-    private final HashMap<String, Instance> keys = new HashMap<>();
+    private final Keys keys = new Keys();
     private final List<PendingRef> refs = new ArrayList<>();
+
+    /**
+     * The instances of the document by key. Keys of the form the writer makes ("i" and a number
+     * from 1 without leading zeros) are found by their number in an array, as long as the numbers
+     * stay below twice the count of keys (plus a margin); every other key is found in a map.
+     */
+    private static final class Keys {
+        private Instance[] byNumber = new Instance[1024];
+        private int count;
+        private final HashMap<String, Instance> others = new HashMap<>();
+
+        /** The number of a key of the writer's form, or -1. */
+        private static int number(String key) {
+            int n = key.length();
+            if (n < 2 || n > 10 || key.charAt(0) != 'i' || key.charAt(1) == '0') {
+                return -1;
+            }
+            int v = 0;
+            for (int i = 1; i < n; i++) {
+                char c = key.charAt(i);
+                if (c < '0' || c > '9') {
+                    return -1;
+                }
+                v = v * 10 + (c - '0');
+            }
+            return v;
+        }
+
+        /** Adds a key; false when it is taken already. */
+        boolean add(String key, Instance x) {
+            int k = number(key);
+            if (k >= byNumber.length && k < 2L * count + 1024) {
+                byNumber = Arrays.copyOf(byNumber, Math.max(k + 1, byNumber.length + (byNumber.length >> 1)));
+            }
+            if (k >= 0 && k < byNumber.length) {
+                // a key may have gone to the map before the array reached its number
+                if (byNumber[k] != null || !others.isEmpty() && others.containsKey(key)) {
+                    return false;
+                }
+                byNumber[k] = x;
+            } else if (others.putIfAbsent(key, x) != null) {
+                return false;
+            }
+            count++;
+            return true;
+        }
+
+        Instance get(String key) {
+            int k = number(key);
+            Instance x = k >= 0 && k < byNumber.length ? byNumber[k] : null;
+            return x != null ? x : others.get(key);
+        }
+    }
 
     /** One reference as read: the key and where it stands. */
     private static final class RefKey {
@@ -263,7 +317,7 @@ final class XmlReader {
         } catch (IllegalArgumentException ex) {
             throw new XmlDocumentException(in.source, line, column, ex.getMessage(), ex);
         }
-        if (key != null && keys.putIfAbsent(key, x) != null) {
+        if (key != null && !keys.add(key, x)) {
             throw new XmlDocumentException(in.source, line, column, "instance of '" + cls + "': key '"
                     + XmlSupport.clip(key) + "' is used twice in the document", null);
         }
@@ -272,15 +326,21 @@ final class XmlReader {
 
     private void values(Instance x, Model m, String cls) {
         AttributeDef[] layout = m.alignedTo;
+        AttributeDef[] named = m.classDef.layout;
         Collect[] multi = null;
+        int expected = 0; // values come in layout order when written by this package: try that first
         while (in.nextTag("instance of", cls) == XMLStreamConstants.START_ELEMENT) {
             String n = in.r.getLocalName();
-            int p = NS.equals(in.nsOf()) ? m.classDef.positionOf(n) : -1;
+            int p = -1;
+            if (NS.equals(in.nsOf())) {
+                p = expected < named.length && named[expected].name.equals(n) ? expected : m.classDef.positionOf(n);
+            }
             if (p < 0) {
                 throw in.fail("class '" + cls + "' has no attribute '" + n + "'"
                         + (NS.equals(in.nsOf()) ? "" : " in namespace '" + in.nsOf() + "'"));
             }
             AttributeDef def = layout[p];
+            expected = def.multi ? p : p + 1;
             if (!def.multi) {
                 if (x.values[p] != null) {
                     throw in.fail("attribute '" + def.qualifiedName() + "' is single-valued but is given more than"
@@ -483,7 +543,7 @@ final class XmlReader {
                     throw new XmlDocumentException(in.source, k.line, k.column, "instance "
                             + r.from.describe() + ": attribute '" + def.qualifiedName() + "' refers to key '"
                             + XmlSupport.clip(k.key) + "', an instance of class '" + t.model.classDef.name
-                            + "', not of a target class " + java.util.Arrays.toString(def.targetNames), null);
+                            + "', not of a target class " + Arrays.toString(def.targetNames), null);
                 }
                 targets[i] = t;
             }

@@ -1,0 +1,192 @@
+package com.velmora.tessara.kdmreplica;
+
+import static com.velmora.tessara.kdmreplica.Fx.addAttr;
+import static com.velmora.tessara.kdmreplica.Fx.addClass;
+import static com.velmora.tessara.kdmreplica.XmlFx.dump;
+import static com.velmora.tessara.kdmreplica.XmlFx.failsAt;
+import static org.junit.jupiter.api.Assertions.assertArrayEquals;
+import static org.junit.jupiter.api.Assertions.assertEquals;
+import static org.junit.jupiter.api.Assertions.assertSame;
+
+import java.util.Date;
+import java.util.Random;
+import org.junit.jupiter.api.BeforeEach;
+import org.junit.jupiter.api.Test;
+
+/**
+ * Documents shaped otherwise than the package writes them: values in pieces and in any order,
+ * keys of any form in any order; and large written documents, whose keys and values come back
+ * exactly.
+ */
+class XmlDocumentsTest {
+    private static final String HEAD = "<replica xmlns=\"urn:corvexa:replica:1\""
+            + " xmlns:xsi=\"http://www.w3.org/2001/XMLSchema-instance\">\n";
+
+    private Replica target;
+
+    @BeforeEach
+    void setUp() {
+        target = new Replica("target");
+        Model part = addClass(target, "Part", null);
+        addAttr(part, "qty", AttributeType.Integer, false);
+        addAttr(part, "price", AttributeType.Double, false);
+        addAttr(part, "ok", AttributeType.Boolean, false);
+        addAttr(part, "when", AttributeType.Date, false);
+        addAttr(part, "name", AttributeType.String, false);
+        addAttr(part, "nums", AttributeType.Integer, true);
+        addAttr(part, "peer", AttributeType.Relationship, false).setTargetNames(new String[] {"Part"});
+        addAttr(part, "peers", AttributeType.Relationship, true);
+    }
+
+    private Instance part(int i) {
+        return target.getModels().getItem("Part").getInstances().getItem(i);
+    }
+
+    @Test
+    void valuesInPiecesAndInAnyOrderAreReadWhole() {
+        target.populatesFromXmlString(HEAD
+                + "<Part id=\"a\">\n"
+                + "  <nums>1</nums>\n"
+                + "  <when>2024-03-01T12:00:<!-- a comment -->00.250Z</when>\n"
+                + "  <ok>t<![CDATA[ru]]>e</ok>\n"
+                + "  <nums>&#50;</nums>\n"
+                + "  <price>1<?note x?>.5e&#50;</price>\n"
+                + "  <name>x<!-- -->y</name>\n"
+                + "  <qty> 4<![CDATA[2]]> </qty>\n"
+                + "  <nums>3</nums>\n"
+                + "</Part>\n"
+                + "<Part id=\"b\"><ok>0</ok><qty>-7</qty><price>-0</price><when>1969-12-31T23:59:59.999Z</when></Part>\n"
+                + "</replica>");
+        Instance a = part(0);
+        assertEquals(42, a.getValue("qty"));
+        assertEquals(150.0, a.getValue("price"));
+        assertEquals(true, a.getValue("ok"));
+        assertEquals(new Date(1709294400250L), a.getValue("when"));
+        assertEquals("xy", a.getValue("name"));
+        assertArrayEquals(new int[] {1, 2, 3}, (int[]) a.getValue("nums"));
+        Instance b = part(1);
+        assertEquals(-7, b.getValue("qty"));
+        assertEquals(Double.doubleToRawLongBits(-0.0), Double.doubleToRawLongBits((Double) b.getValue("price")));
+        assertEquals(false, b.getValue("ok"));
+        assertEquals(new Date(-1), b.getValue("when"));
+    }
+
+    @Test
+    void badValuesInPiecesAreRefusedWithTheWholeText() {
+        String before = dump(target);
+        failsAt(3, () -> target.populatesFromXmlString(HEAD + "<Part id=\"a\">\n<qty>4<!-- -->x</qty></Part>\n</replica>"),
+                "'4x'", "'Part.qty'", "not an Integer");
+        failsAt(3, () -> target.populatesFromXmlString(HEAD + "<Part>\n<price>1.<![CDATA[5.]]></price></Part>\n</replica>"),
+                "'1.5.'", "'Part.price'", "not a Double");
+        failsAt(3, () -> target.populatesFromXmlString(HEAD + "<Part>\n<when>2023-02-29T00:00:00.000Z</when>"
+                + "</Part>\n</replica>"), "'2023-02-29T00:00:00.000Z'", "'Part.when'");
+        failsAt(3, () -> target.populatesFromXmlString(HEAD + "<Part>\n<ok>yes</ok></Part>\n</replica>"),
+                "'yes'", "'Part.ok'", "not a Boolean");
+        failsAt(3, () -> target.populatesFromXmlString(HEAD + "<Part>\n<qty>1<b/></qty></Part>\n</replica>"),
+                "'b'", "'Part.qty'");
+        failsAt(3, () -> target.populatesFromXmlString(HEAD + "<Part><qty>1</qty>\n<name>n</name><qty>1</qty>"
+                + "</Part>\n</replica>"), "'Part.qty' is single-valued");
+        assertEquals(before, dump(target));
+    }
+
+    /** An instance element with a key, an identifier and references. */
+    private static String part(String key, String id, String peer, String... peers) {
+        StringBuilder b = new StringBuilder("<Part key=\"").append(key).append("\" id=\"").append(id).append("\">");
+        if (peer != null) {
+            b.append("<peer ref=\"").append(peer).append("\"/>");
+        }
+        for (String p : peers) {
+            b.append("<peers ref=\"").append(p).append("\"/>");
+        }
+        return b.append("</Part>\n").toString();
+    }
+
+    private Object idOf(Object instance) {
+        return ((Instance) instance).getID();
+    }
+
+    @Test
+    void keysOfAnyFormAndOrderFindTheirInstances() {
+        StringBuilder doc = new StringBuilder(HEAD);
+        // far above the count of keys so far, then many written ones, then others near and far
+        doc.append(part("i1500", "far", "i1", "i01", "i0", "k", "i1500", "i999999999", "i2"));
+        for (int i = 1; i <= 1400; i++) {
+            doc.append(part("i" + i, "n" + i, "i" + (1401 - i)));
+        }
+        doc.append(part("i01", "leading zero", "i1500"));
+        doc.append(part("i0", "zero", null));
+        doc.append(part("k", "other", "k"));
+        doc.append(part("i999999999", "largest", "i1400"));
+        doc.append(part("i4000", "beyond", "i999999999"));
+        target.populatesFromXmlString(doc.append("</replica>").toString());
+
+        Instance far = part(0);
+        assertEquals("far", far.getID());
+        assertEquals("n1", idOf(far.getValue("peer")));
+        Object[] peers = (Object[]) far.getValue("peers");
+        String[] expected = {"leading zero", "zero", "other", "far", "largest", "n2"};
+        for (int i = 0; i < expected.length; i++) {
+            assertEquals(expected[i], idOf(peers[i]));
+        }
+        for (int i = 1; i <= 1400; i++) {
+            assertEquals("n" + (1401 - i), idOf(part(i).getValue("peer")));
+        }
+        assertSame(far, part(1401).getValue("peer"));
+        assertEquals("other", idOf(part(1403).getValue("peer")));
+        assertEquals("n1400", idOf(part(1404).getValue("peer")));
+        assertEquals("largest", idOf(part(1405).getValue("peer")));
+    }
+
+    @Test
+    void aKeyUsedTwiceIsRefusedWhereverEachUseIsKept() {
+        String before = dump(target);
+        StringBuilder doc = new StringBuilder(HEAD);
+        doc.append(part("i1500", "first", null)); // line 2, kept apart: 1500 is far above the count of keys
+        for (int i = 1; i <= 400; i++) {
+            doc.append(part("i" + i, "n" + i, null));
+        }
+        doc.append(part("i1500", "second", null)); // line 403: now among the numbered keys
+        failsAt(403, () -> target.populatesFromXmlString(doc + "</replica>"), "key 'i1500' is used twice");
+        failsAt(4, () -> target.populatesFromXmlString(HEAD + part("i7", "a", null) + part("k", "b", null)
+                + part("i7", "c", null) + "</replica>"), "key 'i7' is used twice");
+        failsAt(4, () -> target.populatesFromXmlString(HEAD + part("x", "a", null) + part("i07", "b", null)
+                + part("x", "c", null) + "</replica>"), "key 'x' is used twice");
+        failsAt(2, () -> target.populatesFromXmlString(HEAD + part("i1", "a", "i10") + "</replica>"),
+                "refers to key 'i10'", "no instance of the document");
+        failsAt(2, () -> target.populatesFromXmlString(HEAD + part("i1", "a", "i01") + "</replica>"),
+                "refers to key 'i01'");
+        assertEquals(before, dump(target));
+    }
+
+    @Test
+    void largeWrittenDocumentsComeBackExactly() {
+        Random rnd = new Random(5);
+        Model m = target.getModels().getItem("Part");
+        int n = 5000;
+        Instance[] xs = new Instance[n];
+        for (int i = 0; i < n; i++) {
+            xs[i] = m.createInstance();
+            if (i % 3 == 0) {
+                xs[i].setID("p" + i);
+            }
+            xs[i].setValue("qty", rnd.nextInt());
+            xs[i].setValue("price", Double.longBitsToDouble(rnd.nextLong()));
+            xs[i].setValue("ok", rnd.nextBoolean());
+            xs[i].setValue("when", new Date(rnd.nextLong() >> (i % 2 == 0 ? 20 : 8))); // also years beyond 9999
+            xs[i].setValue("name", "name " + rnd.nextInt(1000));
+            if (i % 7 == 0) {
+                xs[i].setValue("nums", new int[] {rnd.nextInt(), i});
+            }
+        }
+        for (int i = 0; i < n; i++) {
+            xs[i].setValue("peer", xs[rnd.nextInt(n)]);
+            if (i % 5 == 0) {
+                xs[i].setValue("peers", new Instance[] {xs[n - 1 - i], xs[i], xs[rnd.nextInt(n)]});
+            }
+        }
+        target.commit();
+        String expected = dump(target);
+        Replica back = Replica.readFromXmlString(target.getXml(true));
+        assertEquals(expected.replace("target", back.getName()), dump(back));
+    }
+}
