@@ -15,10 +15,22 @@ final class Decimals {
     private static final int MIN_EXP10 = -348;
     private static final int MAX_EXP10 = 347;
     /**
-     * For each power of ten 10^e from {@link #MIN_EXP10}: the 128 most significant bits of its
-     * exact binary value (rounded down), high half at 2(e - MIN_EXP10), low half after it.
+     * For each power of ten 10^e from {@link #MIN_EXP10}, once first needed: the 128 most
+     * significant bits of its exact binary value (rounded down). Threads that race on an entry
+     * make equal ones; the final fields publish each whole.
      */
-    private static final long[] POW10_128 = table();
+    private static final Power[] POWERS = new Power[MAX_EXP10 - MIN_EXP10 + 1];
+
+    private static final class Power {
+        final long hi;
+        final long lo;
+
+        Power(BigInteger m) {
+            this.hi = m.shiftRight(64).longValue();
+            this.lo = m.longValue();
+        }
+    }
+
     /** The powers of ten that are exact doubles. */
     private static final double[] SMALL = new double[23];
 
@@ -36,25 +48,23 @@ final class Decimals {
     private Decimals() {
     }
 
-    private static long[] table() {
-        long[] t = new long[2 * (MAX_EXP10 - MIN_EXP10 + 1)];
-        BigInteger ten = BigInteger.TEN;
-        for (int e = MIN_EXP10; e <= MAX_EXP10; e++) {
+    private static Power power(int e) {
+        Power p = POWERS[e - MIN_EXP10];
+        if (p == null) {
             BigInteger m;
             if (e >= 0) {
-                BigInteger p = ten.pow(e);
-                int shift = p.bitLength() - 128;
-                m = shift >= 0 ? p.shiftRight(shift) : p.shiftLeft(-shift);
+                BigInteger t = BigInteger.TEN.pow(e);
+                int shift = t.bitLength() - 128;
+                m = shift >= 0 ? t.shiftRight(shift) : t.shiftLeft(-shift);
             } else {
-                BigInteger p = ten.pow(-e);
+                BigInteger t = BigInteger.TEN.pow(-e);
                 // 2^s / 10^-e lies in [2^127, 2^128) for s = 127 + bitLength(10^-e), as 10^-e is no power of two
-                m = BigInteger.ONE.shiftLeft(127 + p.bitLength()).divide(p);
+                m = BigInteger.ONE.shiftLeft(127 + t.bitLength()).divide(t);
             }
-            int i = 2 * (e - MIN_EXP10);
-            t[i] = m.shiftRight(64).longValue();
-            t[i + 1] = m.longValue();
+            p = new Power(m);
+            POWERS[e - MIN_EXP10] = p;
         }
-        return t;
+        return p;
     }
 
     /** The high 64 bits of the unsigned 128-bit product of a and b. */
@@ -81,9 +91,9 @@ final class Decimals {
         int clz = Long.numberOfLeadingZeros(w);
         long man = w << clz;
         long exp2 = ((217706L * q) >> 16) + 64 + 1023 - clz;
-        int i = 2 * (q - MIN_EXP10);
-        long pHi = POW10_128[i];
-        long pLo = POW10_128[i + 1];
+        Power p = power(q);
+        long pHi = p.hi;
+        long pLo = p.lo;
         long xHi = unsignedMultiplyHigh(man, pHi);
         long xLo = man * pHi;
         // The table's value is below the true one by less than one unit of its last bit, so the
