@@ -27,25 +27,25 @@ class XmlDocumentsTest {
     @BeforeEach
     void setUp() {
         target = new Replica("target");
-        Model part = addClass(target, "Part", null);
-        addAttr(part, "qty", AttributeType.Integer, false);
-        addAttr(part, "price", AttributeType.Double, false);
-        addAttr(part, "ok", AttributeType.Boolean, false);
-        addAttr(part, "when", AttributeType.Date, false);
-        addAttr(part, "name", AttributeType.String, false);
-        addAttr(part, "nums", AttributeType.Integer, true);
-        addAttr(part, "peer", AttributeType.Relationship, false).setTargetNames(new String[] {"Part"});
-        addAttr(part, "peers", AttributeType.Relationship, true);
+        Model piece = addClass(target, "Piece", null);
+        addAttr(piece, "qty", AttributeType.Integer, false);
+        addAttr(piece, "price", AttributeType.Double, false);
+        addAttr(piece, "ok", AttributeType.Boolean, false);
+        addAttr(piece, "when", AttributeType.Date, false);
+        addAttr(piece, "name", AttributeType.String, false);
+        addAttr(piece, "nums", AttributeType.Integer, true);
+        addAttr(piece, "peer", AttributeType.Relationship, false).setTargetNames(new String[] {"Piece"});
+        addAttr(piece, "peers", AttributeType.Relationship, true);
     }
 
-    private Instance part(int i) {
-        return target.getModels().getItem("Part").getInstances().getItem(i);
+    private Instance piece(int i) {
+        return target.getModels().getItem("Piece").getInstances().getItem(i);
     }
 
     @Test
     void valuesInPiecesAndInAnyOrderAreReadWhole() {
         target.populatesFromXmlString(HEAD
-                + "<Part id=\"a\">\n"
+                + "<Piece id=\"a\">\n"
                 + "  <nums>1</nums>\n"
                 + "  <when>2024-03-01T12:00:<!-- a comment -->00.250Z</when>\n"
                 + "  <ok>t<![CDATA[ru]]>e</ok>\n"
@@ -54,17 +54,17 @@ class XmlDocumentsTest {
                 + "  <name>x<!-- -->y</name>\n"
                 + "  <qty> 4<![CDATA[2]]> </qty>\n"
                 + "  <nums>3</nums>\n"
-                + "</Part>\n"
-                + "<Part id=\"b\"><ok>0</ok><qty>-7</qty><price>-0</price><when>1969-12-31T23:59:59.999Z</when></Part>\n"
+                + "</Piece>\n"
+                + "<Piece id=\"b\"><ok>0</ok><qty>-7</qty><price>-0</price><when>1969-12-31T23:59:59.999Z</when></Piece>\n"
                 + "</replica>");
-        Instance a = part(0);
+        Instance a = piece(0);
         assertEquals(42, a.getValue("qty"));
         assertEquals(150.0, a.getValue("price"));
         assertEquals(true, a.getValue("ok"));
         assertEquals(new Date(1709294400250L), a.getValue("when"));
         assertEquals("xy", a.getValue("name"));
         assertArrayEquals(new int[] {1, 2, 3}, (int[]) a.getValue("nums"));
-        Instance b = part(1);
+        Instance b = piece(1);
         assertEquals(-7, b.getValue("qty"));
         assertEquals(Double.doubleToRawLongBits(-0.0), Double.doubleToRawLongBits((Double) b.getValue("price")));
         assertEquals(false, b.getValue("ok"));
@@ -74,31 +74,31 @@ class XmlDocumentsTest {
     @Test
     void badValuesInPiecesAreRefusedWithTheWholeText() {
         String before = dump(target);
-        failsAt(3, () -> target.populatesFromXmlString(HEAD + "<Part id=\"a\">\n<qty>4<!-- -->x</qty></Part>\n</replica>"),
-                "'4x'", "'Part.qty'", "not an Integer");
-        failsAt(3, () -> target.populatesFromXmlString(HEAD + "<Part>\n<price>1.<![CDATA[5.]]></price></Part>\n</replica>"),
-                "'1.5.'", "'Part.price'", "not a Double");
-        failsAt(3, () -> target.populatesFromXmlString(HEAD + "<Part>\n<when>2023-02-29T00:00:00.000Z</when>"
-                + "</Part>\n</replica>"), "'2023-02-29T00:00:00.000Z'", "'Part.when'");
-        failsAt(3, () -> target.populatesFromXmlString(HEAD + "<Part>\n<ok>yes</ok></Part>\n</replica>"),
-                "'yes'", "'Part.ok'", "not a Boolean");
-        failsAt(3, () -> target.populatesFromXmlString(HEAD + "<Part>\n<qty>1<b/></qty></Part>\n</replica>"),
-                "'b'", "'Part.qty'");
-        failsAt(3, () -> target.populatesFromXmlString(HEAD + "<Part><qty>1</qty>\n<name>n</name><qty>1</qty>"
-                + "</Part>\n</replica>"), "'Part.qty' is single-valued");
+        failsAt(3, () -> target.populatesFromXmlString(HEAD + "<Piece id=\"a\">\n<qty>4<!-- -->x</qty></Piece>\n</replica>"),
+                "'4x'", "'Piece.qty'", "not an Integer");
+        failsAt(3, () -> target.populatesFromXmlString(HEAD + "<Piece>\n<price>1.<![CDATA[5.]]></price></Piece>\n</replica>"),
+                "'1.5.'", "'Piece.price'", "not a Double");
+        failsAt(3, () -> target.populatesFromXmlString(HEAD + "<Piece>\n<when>2023-02-29T00:00:00.000Z</when>"
+                + "</Piece>\n</replica>"), "'2023-02-29T00:00:00.000Z'", "'Piece.when'");
+        failsAt(3, () -> target.populatesFromXmlString(HEAD + "<Piece>\n<ok>yes</ok></Piece>\n</replica>"),
+                "'yes'", "'Piece.ok'", "not a Boolean");
+        failsAt(3, () -> target.populatesFromXmlString(HEAD + "<Piece>\n<qty>1<b/></qty></Piece>\n</replica>"),
+                "'b'", "'Piece.qty'");
+        failsAt(3, () -> target.populatesFromXmlString(HEAD + "<Piece><qty>1</qty>\n<name>n</name><qty>1</qty>"
+                + "</Piece>\n</replica>"), "'Piece.qty' is single-valued");
         assertEquals(before, dump(target));
     }
 
     /** An instance element with a key, an identifier and references. */
-    private static String part(String key, String id, String peer, String... peers) {
-        StringBuilder b = new StringBuilder("<Part key=\"").append(key).append("\" id=\"").append(id).append("\">");
+    private static String piece(String key, String id, String peer, String... peers) {
+        StringBuilder b = new StringBuilder("<Piece key=\"").append(key).append("\" id=\"").append(id).append("\">");
         if (peer != null) {
             b.append("<peer ref=\"").append(peer).append("\"/>");
         }
         for (String p : peers) {
             b.append("<peers ref=\"").append(p).append("\"/>");
         }
-        return b.append("</Part>\n").toString();
+        return b.append("</Piece>\n").toString();
     }
 
     private Object idOf(Object instance) {
@@ -109,18 +109,18 @@ class XmlDocumentsTest {
     void keysOfAnyFormAndOrderFindTheirInstances() {
         StringBuilder doc = new StringBuilder(HEAD);
         // far above the count of keys so far, then many written ones, then others near and far
-        doc.append(part("i1500", "far", "i1", "i01", "i0", "k", "i1500", "i999999999", "i2"));
+        doc.append(piece("i1500", "far", "i1", "i01", "i0", "k", "i1500", "i999999999", "i2"));
         for (int i = 1; i <= 1400; i++) {
-            doc.append(part("i" + i, "n" + i, "i" + (1401 - i)));
+            doc.append(piece("i" + i, "n" + i, "i" + (1401 - i)));
         }
-        doc.append(part("i01", "leading zero", "i1500"));
-        doc.append(part("i0", "zero", null));
-        doc.append(part("k", "other", "k"));
-        doc.append(part("i999999999", "largest", "i1400"));
-        doc.append(part("i4000", "beyond", "i999999999"));
+        doc.append(piece("i01", "leading zero", "i1500"));
+        doc.append(piece("i0", "zero", null));
+        doc.append(piece("k", "other", "k"));
+        doc.append(piece("i999999999", "largest", "i1400"));
+        doc.append(piece("i4000", "beyond", "i999999999"));
         target.populatesFromXmlString(doc.append("</replica>").toString());
 
-        Instance far = part(0);
+        Instance far = piece(0);
         assertEquals("far", far.getID());
         assertEquals("n1", idOf(far.getValue("peer")));
         Object[] peers = (Object[]) far.getValue("peers");
@@ -129,31 +129,31 @@ class XmlDocumentsTest {
             assertEquals(expected[i], idOf(peers[i]));
         }
         for (int i = 1; i <= 1400; i++) {
-            assertEquals("n" + (1401 - i), idOf(part(i).getValue("peer")));
+            assertEquals("n" + (1401 - i), idOf(piece(i).getValue("peer")));
         }
-        assertSame(far, part(1401).getValue("peer"));
-        assertEquals("other", idOf(part(1403).getValue("peer")));
-        assertEquals("n1400", idOf(part(1404).getValue("peer")));
-        assertEquals("largest", idOf(part(1405).getValue("peer")));
+        assertSame(far, piece(1401).getValue("peer"));
+        assertEquals("other", idOf(piece(1403).getValue("peer")));
+        assertEquals("n1400", idOf(piece(1404).getValue("peer")));
+        assertEquals("largest", idOf(piece(1405).getValue("peer")));
     }
 
     @Test
     void aKeyUsedTwiceIsRefusedWhereverEachUseIsKept() {
         String before = dump(target);
         StringBuilder doc = new StringBuilder(HEAD);
-        doc.append(part("i1500", "first", null)); // line 2, kept apart: 1500 is far above the count of keys
+        doc.append(piece("i1500", "first", null)); // line 2, in the map: 1500 is far above the count of keys
         for (int i = 1; i <= 400; i++) {
-            doc.append(part("i" + i, "n" + i, null));
+            doc.append(piece("i" + i, "n" + i, null));
         }
-        doc.append(part("i1500", "second", null)); // line 403: now among the numbered keys
+        doc.append(piece("i1500", "second", null)); // line 403: now among the numbered keys
         failsAt(403, () -> target.populatesFromXmlString(doc + "</replica>"), "key 'i1500' is used twice");
-        failsAt(4, () -> target.populatesFromXmlString(HEAD + part("i7", "a", null) + part("k", "b", null)
-                + part("i7", "c", null) + "</replica>"), "key 'i7' is used twice");
-        failsAt(4, () -> target.populatesFromXmlString(HEAD + part("x", "a", null) + part("i07", "b", null)
-                + part("x", "c", null) + "</replica>"), "key 'x' is used twice");
-        failsAt(2, () -> target.populatesFromXmlString(HEAD + part("i1", "a", "i10") + "</replica>"),
+        failsAt(4, () -> target.populatesFromXmlString(HEAD + piece("i7", "a", null) + piece("k", "b", null)
+                + piece("i7", "c", null) + "</replica>"), "key 'i7' is used twice");
+        failsAt(4, () -> target.populatesFromXmlString(HEAD + piece("x", "a", null) + piece("i07", "b", null)
+                + piece("x", "c", null) + "</replica>"), "key 'x' is used twice");
+        failsAt(2, () -> target.populatesFromXmlString(HEAD + piece("i1", "a", "i10") + "</replica>"),
                 "refers to key 'i10'", "no instance of the document");
-        failsAt(2, () -> target.populatesFromXmlString(HEAD + part("i1", "a", "i01") + "</replica>"),
+        failsAt(2, () -> target.populatesFromXmlString(HEAD + piece("i1", "a", "i01") + "</replica>"),
                 "refers to key 'i01'");
         assertEquals(before, dump(target));
     }
@@ -161,7 +161,7 @@ class XmlDocumentsTest {
     @Test
     void largeWrittenDocumentsComeBackExactly() {
         Random rnd = new Random(5);
-        Model m = target.getModels().getItem("Part");
+        Model m = target.getModels().getItem("Piece");
         int n = 5000;
         Instance[] xs = new Instance[n];
         for (int i = 0; i < n; i++) {
