@@ -82,6 +82,34 @@ JavaExceptionText TakeException(JNIEnv* env);
 // Java text <-> UTF-8. JavaToUtf8 needs no pending exception; a null string gives "".
 std::string JavaToUtf8(JNIEnv* env, jstring text);
 
+// Encodes UTF-16 units as UTF-8 into out, which holds 3 bytes per unit (an unpaired surrogate
+// becomes U+FFFD); returns the byte count.
+int Utf16ToUtf8(const jchar* units, jsize count, char* out);
+
+// Returns use(bytes, length) of the UTF-8 form of text (null gives no bytes), read with no
+// exception pending; short texts are converted on the stack.
+template <class Use>
+auto WithUtf8(JNIEnv* env, jstring text, Use use)
+{
+  const jsize count = text == nullptr ? 0 : env->GetStringLength(text);
+  if (count <= 0)
+    return use("", 0);
+  jchar smallUnits[256];
+  char smallBytes[3 * 256];
+  std::vector<jchar> largeUnits;
+  std::vector<char> largeBytes;
+  jchar* units = smallUnits;
+  char* bytes = smallBytes;
+  if (count > 256) {
+    largeUnits.resize(static_cast<size_t>(count));
+    largeBytes.resize(3 * static_cast<size_t>(count));
+    units = largeUnits.data();
+    bytes = largeBytes.data();
+  }
+  env->GetStringRegion(text, 0, count, units);
+  return use(bytes, Utf16ToUtf8(units, count, bytes));
+}
+
 // The start-up configuration, exposed for tests.
 // The directory of the bridge library ("" if it cannot be found).
 std::string LibraryDirectory();

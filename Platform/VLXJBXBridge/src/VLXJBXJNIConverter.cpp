@@ -46,13 +46,6 @@ long CheckClass(JNIEnv* env, jobject input, jclass cls, const char* operation, c
 long NewJavaString(JNIEnv* env, const char* bytes, int length, const char* operation, const std::string& what,
                    jstring& output)
 {
-  const char* reason = nullptr;
-  const int bad = VLXUnicodeString::FirstMalformedOffset(bytes, length, &reason);
-  if (bad >= 0)
-    return Raise(VLX_E_INVALIDARG, VLXJBXMessages::ConversionFailed,
-                 {operation, "the byte at offset " + std::to_string(bad) + " of " + what + " is not valid UTF-8 (" +
-                                 reason + ")"},
-                 __FILE__, __LINE__);
   // UTF-16 never needs more units than UTF-8 has bytes.
   jchar small[256];
   std::vector<jchar> large;
@@ -62,8 +55,21 @@ long NewJavaString(JNIEnv* env, const char* bytes, int length, const char* opera
     units = large.data();
   }
   const unsigned char* s = reinterpret_cast<const unsigned char*>(bytes);
-  jsize n = 0;
-  for (int i = 0; i < length;) {
+  // An ASCII start is copied as it is; the rest, from the first other byte, is checked, then decoded.
+  int i = 0;
+  for (; i < length && s[i] < 0x80; ++i)
+    units[i] = s[i];
+  jsize n = i;
+  if (i < length) {
+    const char* reason = nullptr;
+    const int bad = VLXUnicodeString::FirstMalformedOffset(bytes + i, length - i, &reason);
+    if (bad >= 0)
+      return Raise(VLX_E_INVALIDARG, VLXJBXMessages::ConversionFailed,
+                   {operation, "the byte at offset " + std::to_string(i + bad) + " of " + what +
+                                   " is not valid UTF-8 (" + reason + ")"},
+                   __FILE__, __LINE__);
+  }
+  while (i < length) {
     unsigned long c;
     const unsigned char b = s[i];
     if (b < 0x80) {
@@ -97,8 +103,8 @@ long NewJavaString(JNIEnv* env, const char* bytes, int length, const char* opera
 
 long StringFromJava(JNIEnv* env, jobject input, VLXUnicodeString& output)
 {
-  const std::string text = VLXJBXDetail::JavaToUtf8(env, static_cast<jstring>(input));
-  output = VLXUnicodeString(text.data(), static_cast<int>(text.size()));
+  VLXJBXDetail::WithUtf8(env, static_cast<jstring>(input),
+                         [&output](const char* bytes, int length) { output = VLXUnicodeString(bytes, length); });
   return VLX_S_OK;
 }
 

@@ -29,26 +29,6 @@ jmethodID Method(JNIEnv* env, jclass cls, const char* name, const char* signatur
   return id;
 }
 
-// Appends code point `c` as UTF-8.
-void AppendUtf8(std::string& out, unsigned long c)
-{
-  if (c < 0x80) {
-    out += static_cast<char>(c);
-  } else if (c < 0x800) {
-    out += static_cast<char>(0xC0 | (c >> 6));
-    out += static_cast<char>(0x80 | (c & 0x3F));
-  } else if (c < 0x10000) {
-    out += static_cast<char>(0xE0 | (c >> 12));
-    out += static_cast<char>(0x80 | ((c >> 6) & 0x3F));
-    out += static_cast<char>(0x80 | (c & 0x3F));
-  } else {
-    out += static_cast<char>(0xF0 | (c >> 18));
-    out += static_cast<char>(0x80 | ((c >> 12) & 0x3F));
-    out += static_cast<char>(0x80 | ((c >> 6) & 0x3F));
-    out += static_cast<char>(0x80 | (c & 0x3F));
-  }
-}
-
 std::string DescribeClass(JNIEnv* env, jobject object)
 {
   const jmethodID getName = VLXJBXDetail::Lang(env).classGetName;
@@ -132,33 +112,37 @@ VLXJBXDetail::JavaExceptionText VLXJBXDetail::TakeException(JNIEnv* env)
   return text;
 }
 
-std::string VLXJBXDetail::JavaToUtf8(JNIEnv* env, jstring text)
+int VLXJBXDetail::Utf16ToUtf8(const jchar* units, jsize count, char* out)
 {
-  std::string out;
-  if (text == nullptr)
-    return out;
-  const jsize length = env->GetStringLength(text);
-  if (length <= 0)
-    return out;
-  jchar small[256];
-  std::vector<jchar> large;
-  jchar* units = small;
-  if (length > static_cast<jsize>(sizeof small / sizeof small[0])) {
-    large.resize(static_cast<size_t>(length));
-    units = large.data();
-  }
-  env->GetStringRegion(text, 0, length, units);
-  out.reserve(static_cast<size_t>(length) + static_cast<size_t>(length) / 2);
-  for (jsize i = 0; i < length; ++i) {
-    const unsigned long u = units[i];
-    if (u >= 0xD800 && u <= 0xDBFF && i + 1 < length && units[i + 1] >= 0xDC00 && units[i + 1] <= 0xDFFF) {
-      AppendUtf8(out, 0x10000 + ((u - 0xD800) << 10) + (units[i + 1] - 0xDC00));
+  int n = 0;
+  for (jsize i = 0; i < count; ++i) {
+    unsigned long c = units[i];
+    if (c >= 0xD800 && c <= 0xDBFF && i + 1 < count && units[i + 1] >= 0xDC00 && units[i + 1] <= 0xDFFF) {
+      c = 0x10000 + ((c - 0xD800) << 10) + (units[i + 1] - 0xDC00);
       ++i;
-    } else if (u >= 0xD800 && u <= 0xDFFF) {
-      AppendUtf8(out, 0xFFFD); // unpaired surrogate
+    } else if (c >= 0xD800 && c <= 0xDFFF) {
+      c = 0xFFFD; // unpaired surrogate
+    }
+    if (c < 0x80) {
+      out[n++] = static_cast<char>(c);
+    } else if (c < 0x800) {
+      out[n++] = static_cast<char>(0xC0 | (c >> 6));
+      out[n++] = static_cast<char>(0x80 | (c & 0x3F));
+    } else if (c < 0x10000) {
+      out[n++] = static_cast<char>(0xE0 | (c >> 12));
+      out[n++] = static_cast<char>(0x80 | ((c >> 6) & 0x3F));
+      out[n++] = static_cast<char>(0x80 | (c & 0x3F));
     } else {
-      AppendUtf8(out, u);
+      out[n++] = static_cast<char>(0xF0 | (c >> 18));
+      out[n++] = static_cast<char>(0x80 | ((c >> 12) & 0x3F));
+      out[n++] = static_cast<char>(0x80 | ((c >> 6) & 0x3F));
+      out[n++] = static_cast<char>(0x80 | (c & 0x3F));
     }
   }
-  return out;
+  return n;
+}
+
+std::string VLXJBXDetail::JavaToUtf8(JNIEnv* env, jstring text)
+{
+  return WithUtf8(env, text, [](const char* bytes, int length) { return std::string(bytes, static_cast<size_t>(length)); });
 }
