@@ -115,12 +115,12 @@ bool SampleData(const std::string& dir)
 // ---- Step 3 ----------------------------------------------------------------------------------
 
 // The attributes of the class "Sensor": every type, single and multi-valued.
-struct AttributeSpec {
+struct SensorAttribute {
   const char* name;
   VLXKDMAttributeType::Type type;
   bool multi;
 };
-const AttributeSpec kSensorAttributes[] = {
+const SensorAttribute kSensorAttributes[] = {
     {"serial", VLXKDMAttributeType::Integer, false},   {"counts", VLXKDMAttributeType::Integer, true},
     {"reading", VLXKDMAttributeType::Double, false},   {"history", VLXKDMAttributeType::Double, true},
     {"label", VLXKDMAttributeType::String, false},     {"tags", VLXKDMAttributeType::String, true},
@@ -138,14 +138,14 @@ bool BuildSchema(VLXKDMReplica& replica)
       VLX_FAILED(sensor.SetQKAComment(VLXUnicodeString("a measuring point"))) ||
       VLX_FAILED(sensor.GetAttributes(attributes)))
     return Must("Build the class \"Sensor\"", VLX_E_FAIL);
-  for (const AttributeSpec& spec : kSensorAttributes) {
+  for (const SensorAttribute& wanted : kSensorAttributes) {
     VLXKDMAttributeDef attribute;
-    long rc = attribute.Build(VLXUnicodeString(spec.name), spec.type);
-    if (VLX_SUCCEEDED(rc) && spec.multi) rc = attribute.SetMultiValuation(1);
-    if (VLX_SUCCEEDED(rc) && spec.type == VLXKDMAttributeType::Relationship)
+    long rc = attribute.Build(VLXUnicodeString(wanted.name), wanted.type);
+    if (VLX_SUCCEEDED(rc) && wanted.multi) rc = attribute.SetMultiValuation(1);
+    if (VLX_SUCCEEDED(rc) && wanted.type == VLXKDMAttributeType::Relationship)
       rc = attribute.SetTargetNames(1, "Sensor");
     if (VLX_SUCCEEDED(rc)) rc = attributes.Add(attribute);
-    if (VLX_FAILED(rc)) return Must(spec.name, rc);
+    if (VLX_FAILED(rc)) return Must(wanted.name, rc);
   }
   VLXKDMAttributeDef serial;
   attributes.GetItem(VLXUnicodeString("serial"), serial);
@@ -283,14 +283,14 @@ void Compare(const char* how, VLXKDMReplica& original, VLXKDMReplica& copy)
   std::vector<VLXKDMInstance> a = Sensors(original), b = Sensors(copy);
   int compared = 0, different = a.size() == b.size() ? 0 : 1;
   for (size_t i = 0; i < a.size() && i < b.size(); ++i) {
-    for (const AttributeSpec& spec : kSensorAttributes) {
+    for (const SensorAttribute& wanted : kSensorAttributes) {
       VLXKDMInstanceValue x, y;
-      const bool readA = VLX_SUCCEEDED(a[i].GetValue(VLXUnicodeString(spec.name), x));
-      const bool readB = VLX_SUCCEEDED(b[i].GetValue(VLXUnicodeString(spec.name), y));
+      const bool readA = VLX_SUCCEEDED(a[i].GetValue(VLXUnicodeString(wanted.name), x));
+      const bool readB = VLX_SUCCEEDED(b[i].GetValue(VLXUnicodeString(wanted.name), y));
       ++compared;
       if (!readA || !readB || !SameValue(x, y)) {
         ++different;
-        std::printf("      %s of %s differs\n", spec.name, Id(a[i]).c_str());
+        std::printf("      %s of %s differs\n", wanted.name, Id(a[i]).c_str());
       }
     }
   }

@@ -18,7 +18,7 @@
 
 namespace corvexa_test {
 
-struct AttributeSpec {
+struct AttributeShape {
   const char* name;
   VLXKDMAttributeType::Type type;
   bool multi;
@@ -26,9 +26,9 @@ struct AttributeSpec {
 
 // The attributes of the class "Sample": one of each type, then one list of each type, so that the
 // attribute at position p (from 0) is single for p < 7 and a list of the same type at p + 7.
-inline const std::vector<AttributeSpec>& SampleAttributes()
+inline const std::vector<AttributeShape>& SampleAttributes()
 {
-  static const std::vector<AttributeSpec> attributes = {
+  static const std::vector<AttributeShape> attributes = {
       {"integer", VLXKDMAttributeType::Integer, false},   {"double", VLXKDMAttributeType::Double, false},
       {"string", VLXKDMAttributeType::String, false},     {"date", VLXKDMAttributeType::Date, false},
       {"boolean", VLXKDMAttributeType::Boolean, false},   {"binary", VLXKDMAttributeType::Binary, false},
@@ -42,17 +42,17 @@ inline const std::vector<AttributeSpec>& SampleAttributes()
 }
 
 // Adds a class with the given attributes to the replica, with its model; model is attached to it.
-inline void AddClass(VLXKDMReplica& replica, const char* className, const std::vector<AttributeSpec>& attributes,
+inline void AddClass(VLXKDMReplica& replica, const char* className, const std::vector<AttributeShape>& attributes,
                      VLXKDMModel& model)
 {
   VLXKDMClassDef classDef;
   ASSERT_EQ(VLX_S_OK, classDef.Build(VLXUnicodeString(className)));
   VLXKDMAttributeDefList list;
   ASSERT_EQ(VLX_S_OK, classDef.GetAttributes(list));
-  for (const AttributeSpec& spec : attributes) {
+  for (const AttributeShape& shape : attributes) {
     VLXKDMAttributeDef attribute;
-    ASSERT_EQ(VLX_S_OK, attribute.Build(VLXUnicodeString(spec.name), spec.type));
-    ASSERT_EQ(VLX_S_OK, attribute.SetMultiValuation(spec.multi ? 1 : 0));
+    ASSERT_EQ(VLX_S_OK, attribute.Build(VLXUnicodeString(shape.name), shape.type));
+    ASSERT_EQ(VLX_S_OK, attribute.SetMultiValuation(shape.multi ? 1 : 0));
     ASSERT_EQ(VLX_S_OK, list.Add(attribute));
   }
   ASSERT_EQ(VLX_S_OK, model.Build(classDef));

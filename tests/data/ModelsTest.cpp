@@ -20,7 +20,7 @@ struct ThreeClasses {
   ThreeClasses()
   {
     EXPECT_EQ(VLX_S_OK, replica.Build(VLXUnicodeString("three")));
-    const std::vector<AttributeSpec> one = {{"n", VLXKDMAttributeType::Integer, false}};
+    const std::vector<AttributeShape> one = {{"n", VLXKDMAttributeType::Integer, false}};
     AddClass(replica, "A", one, a);
     AddClass(replica, "B", one, b);
     AddClass(replica, "C", one, c);

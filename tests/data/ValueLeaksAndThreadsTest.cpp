@@ -90,7 +90,7 @@ TEST(ValueLeaks, AMillionTypedSetAndGetCallsLeaveNoReferences)
   SampleReplica s;
   VLXKDMInstance instance = s.Create(), target = s.Create();
   std::vector<VLXUnicodeString> names;
-  for (const AttributeSpec& a : SampleAttributes()) names.emplace_back(a.name);
+  for (const AttributeShape& a : SampleAttributes()) names.emplace_back(a.name);
   VLXKDMInstanceValue read;
   // A first pass over every kind makes what stays: the holder keeps its last Java object, and the
   // instance and the instance list it last read (reading another type leaves those members alone).
