@@ -320,7 +320,10 @@ bool LibGetNamedInteger(World& w, int)
          (benchmark::DoNotOptimize(w.value.GetInteger()), true);
 }
 
-bool HandGetNamedInteger(World& w, int)
+// By hand; with keep, the Java value is also held by a global reference in place of the previous
+// one, as the value holder holds it (its synchronized state keeps the Java object): the share of the
+// gap that the holder's contract costs.
+bool HandGetNamedIntegerWith(World& w, bool keep)
 {
   JNIEnv* env = w.env;
   Local name(env, NewJavaString(env, w.integerName));
@@ -332,33 +335,19 @@ bool HandGetNamedInteger(World& w, int)
   if (Threw(env) || !value.get()) return false;
   // Unboxing anything but an Integer would be a JNI error: check the class first.
   if (!env->IsInstanceOf(value.get(), w.integerClass)) return false;
+  if (keep) {
+    const jobject held = env->NewGlobalRef(value.get());
+    if (!held) return false;
+    if (w.keptValue) env->DeleteGlobalRef(w.keptValue);
+    w.keptValue = held;
+  }
   w.handInteger = env->CallIntMethod(value.get(), w.integerIntValue);
   benchmark::DoNotOptimize(w.handInteger);
   return !Threw(env);
 }
 
-// The same, also holding the Java value by a global reference in place of the previous one, as the
-// value holder does (its synchronized state keeps the Java object): the share of the gap that the
-// holder's contract costs.
-bool HandGetNamedIntegerKept(World& w, int)
-{
-  JNIEnv* env = w.env;
-  Local name(env, NewJavaString(env, w.integerName));
-  if (!name.get()) {
-    Threw(env);  // malformed text (nothing pending) or a failed NewString
-    return false;
-  }
-  Local value(env, env->CallObjectMethod(w.instanceRef, w.instanceGetValueNamed, name.get()));
-  if (Threw(env) || !value.get()) return false;
-  if (!env->IsInstanceOf(value.get(), w.integerClass)) return false;
-  const jobject held = env->NewGlobalRef(value.get());
-  if (!held) return false;
-  if (w.keptValue) env->DeleteGlobalRef(w.keptValue);
-  w.keptValue = held;
-  w.handInteger = env->CallIntMethod(held, w.integerIntValue);
-  benchmark::DoNotOptimize(w.handInteger);
-  return !Threw(env);
-}
+bool HandGetNamedInteger(World& w, int) { return HandGetNamedIntegerWith(w, false); }
+bool HandGetNamedIntegerKept(World& w, int) { return HandGetNamedIntegerWith(w, true); }
 
 template <std::size_t... I>
 long SetThousand(VLXKDMInstance& instance, const VLXUnicodeString& name, const int* v, std::index_sequence<I...>)

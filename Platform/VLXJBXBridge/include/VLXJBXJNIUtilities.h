@@ -7,6 +7,7 @@
 #define VLXJBXJNIUtilities_h
 
 #include "VLXListValVLXUnicodeString.h"
+#include "VLXUnicodeString.h"
 #include "VLXResult.h"
 
 #include <jni.h>
@@ -51,6 +52,11 @@ public:
   static long GetMethodID(JNIEnv* env, jclass cls, const char* name, const char* signature, jmethodID& id);
   static long GetStaticMethodID(JNIEnv* env, jclass cls, const char* name, const char* signature, jmethodID& id);
   static long GetStaticFieldID(JNIEnv* env, jclass cls, const char* name, const char* signature, jfieldID& id);
+
+  // The Java name of the class of `object` (not null) in `name`, as Class.getName spells it
+  // ("java.lang.Long"). No exception may be pending; one raised on the way is cleared. On failure
+  // `name` is left alone and the result is negative.
+  static long GetClassName(JNIEnv* env, jobject object, VLXUnicodeString& name);
 
   // Turns the state after a Java call into a result code.
   // - A Java exception is pending: it is cleared (printed to standard error first when `flag` is

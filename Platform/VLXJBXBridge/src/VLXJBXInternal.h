@@ -82,6 +82,10 @@ JavaExceptionText TakeException(JNIEnv* env);
 // Java text <-> UTF-8. JavaToUtf8 needs no pending exception; a null string gives "".
 std::string JavaToUtf8(JNIEnv* env, jstring text);
 
+// The Java name of the class of object (not null), as Class.getName spells it; false when it cannot
+// be read (an exception on the way is cleared). No exception may be pending.
+bool ClassName(JNIEnv* env, jobject object, std::string& name);
+
 // Encodes UTF-16 units as UTF-8 into out, which holds 3 bytes per unit (an unpaired surrogate
 // becomes U+FFFD); returns the byte count.
 int Utf16ToUtf8(const jchar* units, jsize count, char* out);

@@ -172,7 +172,7 @@ long VLXJBXJNIConverter::ConvertToJavaType(JNIEnv* env, const VLXUnicodeString& 
   const long rc = Enter(env, kStringOperation);
   if (VLX_FAILED(rc))
     return rc;
-  return NewJavaString(env, input.c_str(), input.GetLengthInByte(), kStringOperation, "the text", output);
+  return ConvertToJavaString(env, input, output);
 }
 
 long VLXJBXJNIConverter::ConvertToJavaString(JNIEnv* env, const VLXUnicodeString& input, jstring& output)

@@ -328,6 +328,20 @@ long VLXJBXJNIUtilities::HandleJavaError(JNIEnv* env, long code, const char* con
   return Raise(VLX_E_FAIL, VLXJBXMessages::OperationFailed, {operation}, __FILE__, __LINE__);
 }
 
+long VLXJBXJNIUtilities::GetClassName(JNIEnv* env, jobject object, VLXUnicodeString& name)
+{
+  static const char kOperation[] = "VLXJBXJNIUtilities::GetClassName";
+  if (env == nullptr || object == nullptr)
+    return Raise(VLX_E_INVALIDARG, VLXJBXMessages::InvalidArgument,
+                 {kOperation, env == nullptr ? "null environment" : "null object"}, __FILE__, __LINE__);
+  std::string text;
+  if (!VLXJBXDetail::ClassName(env, object, text))
+    return Raise(VLX_E_FAIL, VLXJBXMessages::OperationFailed, {std::string(kOperation) + " (Class.getName failed)"},
+                 __FILE__, __LINE__);
+  name = VLXUnicodeString(text.data(), static_cast<int>(text.size()));
+  return VLX_S_OK;
+}
+
 long VLXJBXJNIUtilities::GetGlobalRefCount()
 {
   return g_globalRefs.load(std::memory_order_relaxed);

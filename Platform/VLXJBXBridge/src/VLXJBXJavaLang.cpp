@@ -31,16 +31,8 @@ jmethodID Method(JNIEnv* env, jclass cls, const char* name, const char* signatur
 
 std::string DescribeClass(JNIEnv* env, jobject object)
 {
-  const jmethodID getName = VLXJBXDetail::Lang(env).classGetName;
-  if (getName == nullptr)
-    return "(unknown class)";
-  VLXJBXDetail::LocalRef cls(env, env->GetObjectClass(object));
-  VLXJBXDetail::LocalRef name(env, env->CallObjectMethod(cls.get(), getName));
-  if (env->ExceptionCheck()) {
-    env->ExceptionClear();
-    return "(unknown class)";
-  }
-  return VLXJBXDetail::JavaToUtf8(env, static_cast<jstring>(name.get()));
+  std::string name;
+  return VLXJBXDetail::ClassName(env, object, name) ? name : "(unknown class)";
 }
 
 std::string DescribeMessage(JNIEnv* env, jobject throwable)
@@ -110,6 +102,21 @@ VLXJBXDetail::JavaExceptionText VLXJBXDetail::TakeException(JNIEnv* env)
       text.cause = "; caused by " + DescribeClass(env, cause.get()) + ": " + DescribeMessage(env, cause.get());
   }
   return text;
+}
+
+bool VLXJBXDetail::ClassName(JNIEnv* env, jobject object, std::string& name)
+{
+  const jmethodID getName = Lang(env).classGetName;
+  if (getName == nullptr)
+    return false;
+  LocalRef cls(env, env->GetObjectClass(object));
+  LocalRef text(env, env->CallObjectMethod(cls.get(), getName));
+  if (env->ExceptionCheck()) {
+    env->ExceptionClear();
+    return false;
+  }
+  name = JavaToUtf8(env, static_cast<jstring>(text.get()));
+  return true;
 }
 
 int VLXJBXDetail::Utf16ToUtf8(const jchar* units, jsize count, char* out)

@@ -333,10 +333,18 @@ struct ResultOf<EnumOut<E>> {
 // ---- Attribute values -------------------------------------------------------------------------
 // The value converters, the value holder and how attribute values cross in the frame.
 
-// The value converters of the proxy base and the platform's, as one public overload set.
+// The value converters of the proxy base and the platform's, as one public overload set, for the
+// frame and the value holder, which convert only once the Java side is started with no exception
+// pending: a text then goes without that check.
 struct Values : VLXKDMJavaObject {
   using VLXKDMJavaObject::BuildFromJavaType;
   using VLXKDMJavaObject::ConvertToJavaType;
+  static long ConvertToJavaType(JNIEnv* env, const VLXUnicodeString& input, jobject& output) {
+    jstring text = nullptr;
+    const long status = VLXJBXJNIConverter::ConvertToJavaString(env, input, text);
+    if (status >= 0) output = text;
+    return status;
+  }
   template <class Native>
   static auto ConvertToJavaType(JNIEnv* env, const Native& input, jobject& output)
       -> decltype(VLXJBXJNIConverter::ConvertToJavaType(env, input, output)) {
@@ -374,16 +382,7 @@ struct ArgOf<JavaForm<T>> {
   using J = jobject;
   static constexpr bool kOwnsRef = !std::is_same_v<T, VLXKDMInstance>;
   static constexpr bool kEarly = false;
-  static long To(JNIEnv* env, const JavaForm<T>& arg, J& out) {
-    if constexpr (std::is_same_v<T, VLXUnicodeString>) {  // a text, as a text argument goes
-      jstring text = nullptr;
-      const long status = ArgOf<VLXUnicodeString>::To(env, arg.value, text);
-      out = text;
-      return status;
-    } else {
-      return Values::ConvertToJavaType(env, arg.value, out);
-    }
-  }
+  static long To(JNIEnv* env, const JavaForm<T>& arg, J& out) { return Values::ConvertToJavaType(env, arg.value, out); }
 };
 
 // A value holder sent as its Java object: BuildRemote runs first, before any other argument is

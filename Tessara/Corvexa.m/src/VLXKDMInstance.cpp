@@ -22,35 +22,15 @@ struct IdentifierOut {
   VLXBinary& bytes;
 };
 
-// The Java name of a class ("java.lang.Long"), or "" when it cannot be read. A rare error path: the
-// name is looked up here rather than kept in the binding table.
-inline std::string JavaClassName(JNIEnv* env, jclass cls)
-{
-  const LocalRef classClass(env, VLXJBXJNIHelper::GetObjectClass(env, cls));
-  jmethodID getName = nullptr;
-  if (!classClass.get() ||
-      VLXJBXJNIUtilities::GetMethodID(env, static_cast<jclass>(classClass.get()), "getName", "()Ljava/lang/String;",
-                                      getName) < 0 ||
-      !getName)
-    return std::string();
-  const LocalRef name(env, VLXJBXJNIHelper::CallObjectMethod(env, cls, getName));
-  if (VLXJBXJNIHelper::ExceptionCheck(env)) {
-    VLXJBXJNIUtilities::HandleJavaError(env, VLX_E_FAIL, "Class.getName", nullptr, 0);  // clears it
-    return std::string();
-  }
-  VLXUnicodeString text;
-  if (VLXJBXJNIConverter::BuildFromJavaType(env, name.get(), text) < 0) return std::string();
-  return std::string(text.c_str(), static_cast<size_t>(text.GetLengthInByte()));
-}
-
 // An identifier that is neither a text nor bytes: records a last error naming its Java class and
 // returns VLX_E_FAIL.
-inline long RejectIdentifier(JNIEnv* env, jclass cls, const char* name)
+inline long RejectIdentifier(JNIEnv* env, jobject identifier, const char* name)
 {
-  const std::string javaName = JavaClassName(env, cls);
+  VLXUnicodeString javaName;
   const std::string what = "the identifier is " +
-                           (javaName.empty() ? std::string("of a Java class whose name cannot be read")
-                                             : "a " + javaName) +
+                           (VLXJBXJNIUtilities::GetClassName(env, identifier, javaName) < 0
+                                ? std::string("of a Java class whose name cannot be read")
+                                : std::string("a ") + javaName.c_str()) +
                            ", neither a java.lang.String nor a byte array";
   VLXJBXException* error = new VLXJBXException(VLXJBXMessages::ConversionFailed);
   const VLXUnicodeString parameters[2] = {VLXUnicodeString(name), VLXUnicodeString(what.c_str())};
@@ -80,7 +60,7 @@ struct ResultOf<IdentifierOut> {
       status = VLXJBXJNIConverter::BuildFromJavaType(env, result, out.bytes);
       out.isText = 0;
     } else {
-      status = RejectIdentifier(env, static_cast<jclass>(cls.get()),
+      status = RejectIdentifier(env, result,
                                 "VLXKDMInstance::GetID(VLXBoolean&, VLXBoolean&, VLXUnicodeString&, VLXBinary&)");
     }
     return status;
