@@ -55,23 +55,77 @@ TEST_F(FrameTest, EveryOperationOfAnUnbuiltReplicaFailsNamingItself)
     EXPECT_EQ(VLX_E_FAIL, operation.run(unbuilt));
     const LastError error = PeekLastError();
     EXPECT_EQ("VLXJBXInfraERR_1003", error.id);
-    ASSERT_EQ(1u, error.parameters.size());
+    ASSERT_EQ(2u, error.parameters.size());
     EXPECT_EQ(operation.name, error.parameters[0]);
     EXPECT_NE(std::string::npos, error.text.find(operation.name)) << error.text;
+    EXPECT_NE(std::string::npos, error.text.find("not attached to a Java object")) << error.text;
   }
   EXPECT_EQ("untouched", Text(text));
   EXPECT_EQ(nullptr, models.GetHandle());
   EXPECT_EQ(nullptr, classDef.GetHandle());
 }
 
-TEST_F(FrameTest, APendingLastErrorIsReRaisedInsteadOfANewOne)
+// An error left by an earlier call, or by a failure of a later one that recorded no cause, never
+// stands for the next failure.
+TEST_F(FrameTest, AnEarlierErrorIsNeverRaisedAgain)
 {
   VLXError* earlier = new VLXError("TESTERR_0001", "CorvexaTestMessages");
   ASSERT_EQ(VLX_E_FAIL, VLXError::GetReturn(2, earlier, nullptr, __FILE__, __LINE__));
-
   VLXKDMReplica unbuilt;
   EXPECT_EQ(VLX_E_FAIL, unbuilt.Commit());
-  EXPECT_EQ("TESTERR_0001", PeekLastError().id);
+  EXPECT_EQ("VLXJBXInfraERR_1003", PeekLastError().id);
+  EXPECT_EQ("VLXKDMReplica::Commit()", PeekLastError().parameters[0]);
+
+  // A failure that records nothing after an operation has started names itself and its code.
+  VLXKDMReplica built;
+  ASSERT_EQ(VLX_S_OK, built.Build(VLXUnicodeString("fresh")));
+  VLXUnicodeString name;
+  ASSERT_EQ(VLX_S_OK, built.GetName(name));
+  EXPECT_EQ(VLX_E_FAIL, VLXKDMReplica::HandleReplicaError(Env(), VLX_E_INVALIDARG, "Caller::Step()"));
+  EXPECT_EQ("Caller::Step() failed: it failed with the code -2147024809 and recorded no cause", PeekLastError().text);
+}
+
+// A proxy holds only a Java object of its own class, however the object comes to it; a wrong one is
+// refused, naming both classes, and the proxy keeps what it held.
+TEST_F(FrameTest, AnObjectOfAnotherClassNeverEntersAProxy)
+{
+  VLXKDMReplica replica;
+  ASSERT_EQ(VLX_S_OK, replica.Build(VLXUnicodeString("wrong")));
+  VLXKDMClassDef classDef;
+  ASSERT_EQ(VLX_S_OK, classDef.Build(VLXUnicodeString("Part")));
+  const jobject string = Env()->NewStringUTF("not a replica");
+  const std::string kReplica = "com.velmora.tessara.kdmreplica.Replica";
+  const std::string kClassDef = "com.velmora.tessara.kdmreplica.ClassDef";
+  const std::string kHolder = "com.velmora.tessara.ReplicaHolder";
+  struct Case {
+    const char* what;
+    std::function<long()> attach;
+    std::string actual, expected;
+  };
+  VLXKDMReplica target;
+  ASSERT_EQ(VLX_S_OK, target.Build(VLXUnicodeString("kept")));
+  const std::vector<Case> cases = {
+      {"SetHandle", [&] { return target.SetHandle(Env(), classDef.GetHandle()); }, kClassDef, kReplica},
+      {"exchange", [&] { return target.BuildFromJavaType(Env(), string); }, "java.lang.String", kReplica},
+      {"holder in", [&] { return target.BuildFromJavaHolder(Env(), replica.GetHandle()); }, kReplica, kHolder},
+      {"holder out", [&] { jobject h = string; return target.ConvertToJavaHolder(Env(), h); }, "java.lang.String", kHolder},
+      {"assignment through the base", [&] {
+         VLXKDMJavaObject& base = target;
+         base = classDef;
+         return VLX_E_INVALIDARG;
+       }, kClassDef, kReplica},
+  };
+  for (const Case& c : cases) {
+    SCOPED_TRACE(c.what);
+    ClearLastError();
+    EXPECT_EQ(VLX_E_INVALIDARG, c.attach());
+    const std::string text = PeekLastError().text;
+    EXPECT_NE(std::string::npos, text.find("is a " + c.actual + ", not a " + c.expected)) << text;
+    VLXUnicodeString name;
+    ASSERT_EQ(VLX_S_OK, target.GetName(name));
+    EXPECT_EQ("kept", Text(name));
+  }
+  Env()->DeleteLocalRef(string);
 }
 
 TEST_F(FrameTest, GetHandleOfAnUnbuiltProxyIsNullAndReportsNothing)
@@ -100,10 +154,11 @@ TEST_F(FrameTest, AJavaExceptionIsReportedClearedAndLeavesOutParametersAlone)
   // An out-proxy keeps the object it referred to.
   VLXKDMReplica other;
   ASSERT_EQ(VLX_S_OK, other.Build(VLXUnicodeString("other")));
-  VLXKDMClassDef classDef;
-  ASSERT_EQ(VLX_S_OK, classDef.SetHandle(Env(), other.GetHandle()));
+  VLXKDMClassDef classDef, before;
+  ASSERT_EQ(VLX_S_OK, classDef.Build(VLXUnicodeString("Before")));
+  before = classDef;
   EXPECT_EQ(VLX_E_FAIL, throwing.GetClassDef(VLXUnicodeString("Part"), classDef));
-  EXPECT_TRUE(Env()->IsSameObject(other.GetHandle(), classDef.GetHandle()));
+  EXPECT_TRUE(classDef == before);
   EXPECT_NE(std::string::npos, PeekLastError().text.find("no class lookups here: Part"));
 
   EXPECT_EQ(VLX_E_FAIL, throwing.Commit());
@@ -212,7 +267,7 @@ TEST_F(FrameTest, LookupsOfAbsentNamesDetachTheOutProxy)
   VLXKDMReplica replica;
   ASSERT_EQ(VLX_S_OK, replica.Build(VLXUnicodeString("lookups")));
   VLXKDMClassDef classDef;
-  ASSERT_EQ(VLX_S_OK, classDef.SetHandle(Env(), replica.GetHandle()));
+  ASSERT_EQ(VLX_S_OK, classDef.Build(VLXUnicodeString("Elsewhere")));
   EXPECT_EQ(VLX_S_OK, replica.GetClassDef(VLXUnicodeString("NoSuchClass"), classDef));
   EXPECT_EQ(nullptr, classDef.GetHandle());
   VLXKDMAttributeDef attributeDef;

@@ -71,3 +71,29 @@ TEST(Threads, EachThreadHasItsOwnLastErrorAndSharedProxiesStayUsable)
 }
 
 }  // namespace
+
+// An application may detach a thread that the library attached, or detach it and attach it again
+// itself: the next call on that thread works, and the library never detaches an attachment that is
+// not its own.
+TEST(Threads, AThreadTheApplicationDetachedWorksOnItsNextCall)
+{
+  VLXKDMReplica replica;
+  ASSERT_EQ(VLX_S_OK, replica.Build(VLXUnicodeString("detached")));
+  JavaVM* vm = VLXJBXJNIUtilities::GetJavaVM();
+  ASSERT_NE(nullptr, vm);
+  std::thread([&] {
+    VLXUnicodeString name;
+    ASSERT_EQ(VLX_S_OK, replica.GetName(name));
+    ASSERT_EQ(JNI_OK, vm->DetachCurrentThread());
+    ASSERT_EQ(VLX_S_OK, replica.GetName(name));  // attached again by the library
+    ASSERT_EQ(JNI_OK, vm->DetachCurrentThread());
+    void* own = nullptr;
+    ASSERT_EQ(JNI_OK, vm->AttachCurrentThread(&own, nullptr));
+    ASSERT_EQ(VLX_S_OK, replica.GetName(name));  // the application's attachment, used as it is
+    EXPECT_EQ("detached", Text(name));
+    void* still = nullptr;
+    EXPECT_EQ(JNI_OK, vm->GetEnv(&still, JNI_VERSION_1_8));
+    EXPECT_EQ(own, still);
+    ASSERT_EQ(JNI_OK, vm->DetachCurrentThread());
+  }).join();
+}

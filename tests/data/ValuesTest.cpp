@@ -260,11 +260,11 @@ TEST(VariadicSetters, SendWhatTheListSettersSendAndReportUnderTheirNames)
        }},
       {"SetValueBooleans", 11, "VLXKDMInstance::SetValue(const VLXUnicodeString&, const VLXListOfVLXBoolean&)",
        "VLXKDMInstance::SetValue(int, const VLXListOfVLXBoolean&)",
-       // 256 keeps its low 8 bits: 0.
+       // Any non-zero argument is true.
        [](VLXKDMInstance& in, const VLXUnicodeString& n, int k) { return in.SetValueBooleans(n, k, 1, 256, 1); },
        [](VLXKDMInstance& in, int p, int k) { return in.SetValueBooleans(p, k, 1, 256, 1); },
        [&](VLXKDMInstance& in, const VLXUnicodeString& n, int k) {
-         return in.SetValue(n, first(ListOf<VLXListValVLXBoolean>({VLXBoolean(1), VLXBoolean(0), VLXBoolean(1)}), k));
+         return in.SetValue(n, first(ListOf<VLXListValVLXBoolean>({VLXBoolean(1), VLXBoolean(1), VLXBoolean(1)}), k));
        }},
       {"SetValueDates", 10, "VLXKDMInstance::SetValue(const VLXUnicodeString&, const VLXListOfVLXTime&)",
        "VLXKDMInstance::SetValue(int, const VLXListOfVLXTime&)",
@@ -340,9 +340,9 @@ TEST(VariadicSetters, SendWhatTheListSettersSendAndReportUnderTheirNames)
 
   for (const VariadicCase& c : cases) {
     const VLXUnicodeString name(SampleAttributes()[c.position].name);
-    for (int count : {3, 0, -1}) {
+    for (int count : {3, 0}) {
       SCOPED_TRACE(std::string(c.operation) + " with count " + std::to_string(count));
-      ASSERT_EQ(VLX_S_OK, c.listTwin(instance, name, count < 0 ? 0 : count));
+      ASSERT_EQ(VLX_S_OK, c.listTwin(instance, name, count));
       VLXKDMInstanceValue fromList = read(c.position);
       ASSERT_EQ(VLX_S_OK, instance.ClearValue(c.position));
       ASSERT_EQ(VLX_S_OK, c.byName(instance, name, count));
@@ -350,9 +350,14 @@ TEST(VariadicSetters, SendWhatTheListSettersSendAndReportUnderTheirNames)
       ASSERT_EQ(VLX_S_OK, instance.ClearValue(c.position));
       ASSERT_EQ(VLX_S_OK, c.byPosition(instance, c.position, count));
       VLXKDMInstanceValue variadicByPosition = read(c.position);
-      EXPECT_EQ(count < 0 ? 0 : count, size(fromList));
+      EXPECT_EQ(count, size(fromList));
       EXPECT_TRUE(same(fromList, variadicByName));
       EXPECT_TRUE(same(fromList, variadicByPosition));
+      // A negative count is refused and leaves the value as it was.
+      EXPECT_EQ(VLX_E_INVALIDARG, c.byName(instance, name, -1));
+      EXPECT_EQ(VLX_E_INVALIDARG, c.byPosition(instance, c.position, -1));
+      VLXKDMInstanceValue after = read(c.position);
+      EXPECT_TRUE(same(fromList, after));
     }
     // Failures carry the list setter's name, by name and by position.
     VLXKDMInstance unbuilt;
@@ -426,6 +431,67 @@ TEST(ValueFailures, AHolderThatCannotBeBuiltReachesNoJavaMethod)
   EXPECT_EQ(2, IntField(counting.GetHandle(), "setValueCalls"));
 }
 
+// What C++ writes it reads back: whole seconds before 1970, and booleans (any non-zero byte is
+// true, so a unique attribute cannot hold two different "true"s).
+TEST(Values, DatesBefore1970AndBooleansReadBackAsWritten)
+{
+  SampleReplica s;
+  VLXKDMInstance instance = s.Create();
+  const time_t seconds[] = {-86400, -305942400, -1, -62135596800};
+  VLXListValVLXTime dates;
+  for (time_t t : seconds) {
+    dates.Append(Time(t));
+    VLXKDMInstanceValue value;
+    ASSERT_EQ(VLX_S_OK, instance.SetValue(VLXUnicodeString("date"), Time(t)));
+    ASSERT_EQ(VLX_S_OK, instance.GetValue(VLXUnicodeString("date"), value));
+    ASSERT_EQ(VLX_S_OK, instance.SetValue(VLXUnicodeString("date"), value));  // read-modify-write
+    ASSERT_EQ(VLX_S_OK, instance.GetValue(VLXUnicodeString("date"), value));
+    EXPECT_EQ(t, value.GetDate().Gettime_t());
+  }
+  VLXKDMInstanceValue value;
+  ASSERT_EQ(VLX_S_OK, instance.SetValue(VLXUnicodeString("dates"), dates));
+  ASSERT_EQ(VLX_S_OK, instance.GetValue(VLXUnicodeString("dates"), value));
+  EXPECT_TRUE(value.GetListOfDate() == dates);
+
+  ASSERT_EQ(VLX_S_OK, instance.SetValueBooleans(VLXUnicodeString("booleans"), 4, 1, 0, 256, 2));
+  ASSERT_EQ(VLX_S_OK, instance.GetValue(VLXUnicodeString("booleans"), value));
+  EXPECT_TRUE(value.GetListOfBoolean() == (ListOf<VLXListValVLXBoolean, VLXBoolean>({1, 0, 1, 1})));
+  ASSERT_EQ(VLX_S_OK, instance.SetValue(VLXUnicodeString("booleans"), ListOf<VLXListValVLXBoolean, VLXBoolean>({7})));
+  ASSERT_EQ(VLX_S_OK, instance.GetValue(VLXUnicodeString("booleans"), value));
+  EXPECT_EQ(1, value.GetListOfBoolean()[1]);
+  ASSERT_EQ(VLX_S_OK, instance.SetValue(VLXUnicodeString("boolean"), static_cast<VLXBoolean>(2)));
+  ASSERT_EQ(VLX_S_OK, instance.GetValue(VLXUnicodeString("boolean"), value));
+  EXPECT_EQ(1, value.GetBoolean());
+}
+
+// Reading an attribute that has no value fails naming the attribute and the instance (never an
+// earlier error), and leaves a reused holder exactly as it was: sent elsewhere, it still carries
+// its value, never a null that would clear the attribute.
+TEST(ValueFailures, AnAttributeWithoutValueLeavesTheHolderAsItWas)
+{
+  SampleReplica s;
+  VLXKDMInstance read = s.Create(), written = s.Create();
+  ASSERT_EQ(VLX_S_OK, read.SetValue(VLXUnicodeString("integer"), 42));
+  ASSERT_EQ(VLX_S_OK, written.SetValue(VLXUnicodeString("integer"), 7));
+  VLXKDMInstanceValue value;
+  ASSERT_EQ(VLX_S_OK, read.GetValue(VLXUnicodeString("integer"), value));
+  for (const bool byName : {true, false}) {
+    SCOPED_TRACE(byName);
+    VLXError* earlier = new VLXError("TESTERR_0002", "CorvexaTestMessages");
+    VLXError::GetReturn(2, earlier, nullptr, __FILE__, __LINE__);
+    EXPECT_EQ(VLX_E_FAIL, byName ? read.GetValue(VLXUnicodeString("double"), value) : read.GetValue(1, value));
+    const std::string text = PeekLastError().text;
+    EXPECT_NE(std::string::npos, text.find(byName ? "the attribute 'double' of Instance Sample" : "the attribute at position 1 of Instance Sample")) << text;
+    EXPECT_NE(std::string::npos, text.find("has no value")) << text;
+    EXPECT_EQ(42, value.GetInteger());
+    EXPECT_NE(nullptr, value.GetHandle());
+  }
+  ASSERT_EQ(VLX_S_OK, written.SetValue(VLXUnicodeString("integer"), value));
+  VLXKDMInstanceValue back;
+  ASSERT_EQ(VLX_S_OK, written.GetValue(VLXUnicodeString("integer"), back));
+  EXPECT_EQ(42, back.GetInteger());
+}
+
 TEST(ValueFailures, UnattachedInstancesFailWithoutClearingTheAttribute)
 {
   SampleReplica s;
@@ -436,8 +502,14 @@ TEST(ValueFailures, UnattachedInstancesFailWithoutClearingTheAttribute)
   const VLXKDMInstance unattached;
   EXPECT_LT(instance.SetValue(VLXUnicodeString("instance"), unattached), 0);
   EXPECT_LT(instance.SetValueInstances(VLXUnicodeString("instances"), 2, &target, &unattached), 0);
-  EXPECT_LT(instance.SetValueInstances(13, 1, static_cast<const VLXKDMInstance*>(nullptr)), 0);
-  EXPECT_EQ(3u, FatalRecorder::Reports().size());
+  // A null pointer is refused before any conversion, as a null time is.
+  EXPECT_EQ(VLX_E_INVALIDARG, instance.SetValueInstances(13, 1, static_cast<const VLXKDMInstance*>(nullptr)));
+  VLXTime second;
+  second.Settime_t(1);
+  EXPECT_EQ(VLX_E_INVALIDARG, instance.SetValueDates(10, 2, &second, static_cast<const VLXTime*>(nullptr)));
+  EXPECT_EQ("invalid argument to VLXKDMInstance::SetValueDates(int, int, ...): value 2 of 2 is a null pointer",
+            PeekLastError().text);
+  EXPECT_EQ(2u, FatalRecorder::Reports().size());
   VLXKDMInstanceValue single, list;
   ASSERT_EQ(VLX_S_OK, instance.GetValue(6, single));
   EXPECT_TRUE(single.GetInstance() == target);

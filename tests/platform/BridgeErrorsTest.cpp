@@ -166,33 +166,37 @@ TEST_F(JavaErrorTest, WithoutAnExceptionTheCodeDecides)
             VLX_E_FAIL);
   ErrorView e = TakeLastError();
   EXPECT_EQ(e.id, VLXJBXMessages::OperationFailed);
-  EXPECT_EQ(e.text, "VLXKDMModel::GetName() failed");
+  EXPECT_EQ(e.text, "VLXKDMModel::GetName() failed: it returned the failure code -2147024809 and recorded no cause");
 
-  // A pending last error is kept, not replaced.
-  VLXJBXException* earlier = new VLXJBXException(VLXJBXMessages::ConversionFailed);
-  VLXError::GetReturn(2, earlier, nullptr, __FILE__, __LINE__);
+  // The operation's own error is kept, not replaced; one recorded before the operation started is
+  // never taken for its cause.
+  VLXJBXException* own = new VLXJBXException(VLXJBXMessages::ConversionFailed);
+  VLXError::MarkOperationStart();
+  VLXError::GetReturn(2, own, nullptr, __FILE__, __LINE__);
   EXPECT_EQ(VLXJBXJNIUtilities::HandleJavaError(env, VLX_E_FAIL, "op", nullptr, 0), VLX_E_FAIL);
   VLXError* last = VLXError::VLXGetLastError(0, nullptr);
-  EXPECT_EQ(last, earlier);
+  EXPECT_EQ(last, own);
   if (last != nullptr)
     last->Release();
-  VLXError::VLXCleanLastError();
+  VLXError::MarkOperationStart();
+  EXPECT_EQ(VLXJBXJNIUtilities::HandleJavaError(env, VLX_E_FAIL, "later", nullptr, 0), VLX_E_FAIL);
+  EXPECT_EQ(TakeLastError().parameters[0], "later");
 }
 
 TEST_F(JavaErrorTest, AGivenErrorObjectIsTakenOverInEveryCase)
 {
   VLXJBXException* given = new VLXJBXException(VLXJBXMessages::OperationFailed);
-  const VLXUnicodeString p[] = {"mine"};
-  given->SetNLSRequestParams(1, p);
+  const VLXUnicodeString p[] = {"mine", "why"};
+  given->SetNLSRequestParams(2, p);
   EXPECT_EQ(VLXJBXJNIUtilities::HandleJavaError(env, -1, "op", given, 0), VLX_E_FAIL);
-  EXPECT_EQ(TakeLastError().text, "mine failed");
+  EXPECT_EQ(TakeLastError().text, "mine failed: why");
 
   env->ThrowNew(Find("java/lang/IllegalStateException"), "described to stderr");
   given = new VLXJBXException(VLXJBXMessages::OperationFailed);
-  given->SetNLSRequestParams(1, p);
+  given->SetNLSRequestParams(2, p);
   EXPECT_EQ(VLXJBXJNIUtilities::HandleJavaError(env, 0, "op", given, 1), VLX_E_FAIL);
   EXPECT_FALSE(env->ExceptionCheck());
-  EXPECT_EQ(TakeLastError().text, "mine failed");
+  EXPECT_EQ(TakeLastError().text, "mine failed: why");
 
   // Success: the given error is released (the sanitizer run would report a leak otherwise).
   EXPECT_EQ(VLXJBXJNIUtilities::HandleJavaError(env, 0, "op", new VLXJBXException("x"), 0), VLX_S_OK);

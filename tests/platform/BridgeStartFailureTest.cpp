@@ -64,7 +64,7 @@ TEST(StartFailure, ErrorTranslationWorksWithoutAnEnvironment)
 {
   EXPECT_EQ(VLXJBXJNIUtilities::HandleJavaError(nullptr, 0, "op", nullptr, 0), 0);
   EXPECT_LT(VLXJBXJNIUtilities::HandleJavaError(nullptr, -1, "VLXKDMReplica::Commit()", nullptr, 0), 0);
-  EXPECT_EQ(TakeText(), "VLXKDMReplica::Commit() failed");
+  EXPECT_EQ(TakeText(), "VLXKDMReplica::Commit() failed: it returned the failure code -1 and recorded no cause");
 }
 
 } // namespace

@@ -86,8 +86,10 @@ TEST(Enumerations, NullAnswersGiveTheDefaultsButLeaveTheAggregationAlone)
   EXPECT_EQ(VLXKDMVisibility::Public, visibility);
 
   // Object getters attach the null answer: the out-proxy is detached.
+  VLXKDMClassDef real;
+  ASSERT_EQ(VLX_S_OK, real.Build(VLXUnicodeString("Real")));
   VLXKDMAttributeDefList attributes;
-  ASSERT_EQ(VLX_S_OK, attributes.SetHandle(Env(), classDef.GetHandle()));
+  ASSERT_EQ(VLX_S_OK, real.GetAttributes(attributes));
   EXPECT_EQ(VLX_S_OK, classDef.GetAttributes(attributes));
   EXPECT_EQ(nullptr, attributes.GetHandle());
   VLXKDMClassDef owner(classDef);

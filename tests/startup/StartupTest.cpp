@@ -26,21 +26,22 @@ struct TableReader : VLXKDMJavaObject {
   static ReplicaStubs* Table() { return _st.load(); }
 };
 
-// Captures what the process writes to standard output while it lives.
-class StdoutCapture {
+// Captures what the process writes to one of its standard streams while it lives.
+class Capture {
  public:
-  StdoutCapture() : _path("/tmp/corvexa-startup-" + std::to_string(getpid()) + ".out")
+  explicit Capture(int fd)
+      : _fd(fd), _path("/tmp/corvexa-startup-" + std::to_string(getpid()) + "-" + std::to_string(fd) + ".out")
   {
-    fflush(stdout);
-    _saved = dup(STDOUT_FILENO);
+    fflush(nullptr);
+    _saved = dup(_fd);
     FILE* file = fopen(_path.c_str(), "w");
-    dup2(fileno(file), STDOUT_FILENO);
+    dup2(fileno(file), _fd);
     fclose(file);
   }
   std::string Finish()
   {
-    fflush(stdout);
-    dup2(_saved, STDOUT_FILENO);
+    fflush(nullptr);
+    dup2(_saved, _fd);
     close(_saved);
     std::ifstream in(_path);
     std::stringstream text;
@@ -50,18 +51,43 @@ class StdoutCapture {
   }
 
  private:
+  int _fd;
   std::string _path;
   int _saved;
 };
 
+// The live Java threads, as their set's text ("[Thread[main,5,main], ...]").
+std::string JavaThreads()
+{
+  JNIEnv* env = Env();
+  auto checked = [env](auto result) {
+    EXPECT_FALSE(env->ExceptionCheck());
+    return result;
+  };
+  jclass thread = checked(env->FindClass("java/lang/Thread"));
+  jclass map = checked(env->FindClass("java/util/Map"));
+  jclass object = checked(env->FindClass("java/lang/Object"));
+  jobject all = checked(env->CallStaticObjectMethod(
+      thread, env->GetStaticMethodID(thread, "getAllStackTraces", "()Ljava/util/Map;")));
+  jobject keys = checked(env->CallObjectMethod(all, env->GetMethodID(map, "keySet", "()Ljava/util/Set;")));
+  jstring text = static_cast<jstring>(
+      checked(env->CallObjectMethod(keys, env->GetMethodID(object, "toString", "()Ljava/lang/String;"))));
+  const char* chars = env->GetStringUTFChars(text, nullptr);
+  const std::string result = chars;
+  env->ReleaseStringUTFChars(text, chars);
+  for (jobject local : {static_cast<jobject>(thread), static_cast<jobject>(map), static_cast<jobject>(object), all, keys,
+                        static_cast<jobject>(text)})
+    env->DeleteLocalRef(local);
+  return result;
+}
+
 TEST(StartupMissingClass, InitStopsAtTheMissingClassAndEveryOperationFailsCleanly)
 {
-  StdoutCapture capture;
+  Capture out(STDOUT_FILENO), err(STDERR_FILENO);
   VLXKDMReplica replica;
   const long first = replica.Build(VLXUnicodeString("never"));
-  const std::string output = capture.Finish();
-
-  EXPECT_EQ("Error ReplicaStubs::Init\n", output);
+  EXPECT_EQ("", out.Finish());  // the application's output stays its own
+  EXPECT_EQ("Error ReplicaStubs::Init\n", err.Finish());
   EXPECT_EQ(VLX_E_FAIL, first);
   EXPECT_EQ(nullptr, replica.GetHandle());
   LastError error = PeekLastError();
@@ -80,7 +106,7 @@ TEST(StartupMissingClass, InitStopsAtTheMissingClassAndEveryOperationFailsCleanl
   EXPECT_EQ(nullptr, table->Constant(Visibility_Private));
 
   // Later operations fail the same way, without calling Java and without printing again.
-  StdoutCapture again;
+  Capture again(STDERR_FILENO);
   VLXUnicodeString name("kept");
   EXPECT_EQ(VLX_E_FAIL, replica.GetName(name));  // not built
   EXPECT_EQ(VLX_E_FAIL, replica.Build());
@@ -92,21 +118,25 @@ TEST(StartupMissingClass, InitStopsAtTheMissingClassAndEveryOperationFailsCleanl
 
 TEST(StartupNoJvm, AJvmThatCannotBeCreatedRaisesTheNoEnvironmentError)
 {
-  StdoutCapture capture;
+  Capture out(STDOUT_FILENO), err(STDERR_FILENO);
   VLXKDMReplica replica;
   const long first = replica.Build();
   VLXUnicodeString name("kept");
   const long second = replica.GetName(name);
-  const std::string output = capture.Finish();
-
-  EXPECT_EQ("Error VLXJBXJNIUtilities::GetJNIEnv\nError VLXJBXJNIUtilities::GetJNIEnv\n", output);
+  EXPECT_EQ("", out.Finish());
+  const std::string diagnostics = err.Finish();
+  EXPECT_NE(std::string::npos, diagnostics.find("Error VLXJBXJNIUtilities::GetJNIEnv\nError VLXJBXJNIUtilities::GetJNIEnv\n"))
+      << diagnostics;
   EXPECT_LT(first, 0);
   EXPECT_LT(second, 0);
   EXPECT_EQ("kept", Text(name));
+  // The bridge's account of why the JVM could not be created stays in the last error.
   const LastError error = PeekLastError();
   EXPECT_EQ("VLXJBXInfraERR_1002", error.id);
-  ASSERT_EQ(1u, error.parameters.size());
+  ASSERT_EQ(2u, error.parameters.size());
   EXPECT_EQ("VLXKDMReplica::GetName(VLXUnicodeString&)", error.parameters[0]);
+  EXPECT_NE(std::string::npos, error.parameters[1].find("-XX:+CorvexaNoSuchOption")) << error.parameters[1];
+  EXPECT_NE(std::string::npos, error.parameters[1].find("JNI_CreateJavaVM returned")) << error.parameters[1];
   EXPECT_EQ(nullptr, TableReader::Table());
 }
 
@@ -137,6 +167,32 @@ TEST(StartupConcurrent, SixteenFirstCallsAtOnceCreateAndFillTheTableOnce)
   // With every proxy gone, the only global references left are the table's own: 27 classes and
   // 17 constants. A second filling would have doubled them.
   EXPECT_EQ(27 + 17, VLXJBXJNIUtilities::GetGlobalRefCount());
+  // Every thread has left the JVM, the one that created it ("main") too.
+  const std::string live = JavaThreads();
+  EXPECT_EQ(std::string::npos, live.find("Thread[main,")) << live;
+}
+
+// An exception that the application left pending at the process's first call fails that call,
+// naming it, and the next call starts the library normally.
+TEST(StartupPendingException, TheFirstCallFailsAndTheNextStartsNormally)
+{
+  JNIEnv* env = Env();  // the JVM, through the bridge alone: the library has not started
+  ASSERT_EQ(nullptr, TableReader::Table());
+  jclass cls = env->FindClass("java/lang/IllegalStateException");
+  ASSERT_EQ(0, env->ThrowNew(cls, "left by the application"));
+  VLXKDMReplica replica;
+  EXPECT_EQ(VLX_E_FAIL, replica.Build(VLXUnicodeString("first")));
+  EXPECT_FALSE(env->ExceptionCheck());
+  env->DeleteLocalRef(cls);
+  const std::string text = PeekLastError().text;
+  EXPECT_NE(std::string::npos, text.find("left by the application")) << text;
+  EXPECT_EQ(std::string::npos, text.find("missing")) << text;
+
+  ASSERT_EQ(VLX_S_OK, replica.Build(VLXUnicodeString("second")));
+  VLXUnicodeString name;
+  ASSERT_EQ(VLX_S_OK, replica.GetName(name));
+  EXPECT_EQ("second", Text(name));
+  EXPECT_TRUE(TableReader::Table()->IsBound());
 }
 
 }  // namespace

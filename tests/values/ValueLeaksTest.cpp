@@ -59,11 +59,9 @@ TEST(ValueLeaks, EarlyStopsAndFailuresLeaveNoReferences)
   Local mixed(NewArray("java/lang/Object", {bytes.get(), bytes.get(), text.get()}));
   Local boxedLong(NewLong(1));
 
-  VLXKDMInstance notAnInstance;
-  AttachNew(notAnInstance, "java/lang/Object");
   VLXListValVLXKDMInstance badInstances;
   badInstances.Append(NewInstance());
-  badInstances.Append(notAnInstance);
+  badInstances.Append(VLXKDMInstance());  // not attached
   VLXListValVLXTime badTimes;
   badTimes.Append(Seconds(1));
   badTimes.Append(Seconds(static_cast<time_t>(LLONG_MAX)));
@@ -80,7 +78,7 @@ TEST(ValueLeaks, EarlyStopsAndFailuresLeaveNoReferences)
     ASSERT_LT(Values::ConvertToJavaType(env, badInstances, out), 0);
     ASSERT_LT(Values::ConvertToJavaType(env, badTimes, out), 0);
     ASSERT_EQ(nullptr, out);
-    ASSERT_EQ(VLX_S_OK, value.SetHandle(env, boxedLong.get()));
+    ASSERT_EQ(VLX_E_INVALIDARG, value.SetHandle(env, boxedLong.get()));
     ASSERT_LT(value.BuildLocal(), 0);
     FatalRecorder::Reports().clear();
   }

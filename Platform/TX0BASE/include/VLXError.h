@@ -76,6 +76,13 @@ public:
   // `owner` is not used.
   static long GetReturn(int kind, VLXError* error, void* owner, const char* file, int line);
 
+  // The start of an operation on the calling thread: errors recorded before it are earlier ones.
+  // It leaves the last error as it is. Costs one thread-local write.
+  static void MarkOperationStart();
+  // The calling thread's last error, with a reference added for the caller, when it was recorded
+  // since the thread's last MarkOperationStart (or ever, if there was none); otherwise null.
+  static VLXError* VLXGetOperationError();
+
 private:
   std::string _id;
   std::string _catalog;

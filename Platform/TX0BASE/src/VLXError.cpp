@@ -24,9 +24,11 @@ CatalogRegistry& Catalogs()
 }
 
 // The calling thread's last error; the slot owns one reference, released when the thread exits.
+// `fresh` says whether it was recorded since the operation mark.
 struct LastErrorSlot
 {
   VLXError* error = nullptr;
+  bool fresh = false;
   ~LastErrorSlot()
   {
     VLXError* e = error;
@@ -165,9 +167,20 @@ long VLXError::GetReturn(int kind, VLXError* error, void*, const char* file, int
     error->SetSource(file, line);
     VLXError* previous = t_lastError.error;
     t_lastError.error = error;
+    t_lastError.fresh = true;
     // Released after the swap: `previous` may be `error` itself (a re-raise without a clean).
     if (previous != nullptr)
       previous->Release();
   }
   return VLX_E_FAIL;
+}
+
+void VLXError::MarkOperationStart()
+{
+  t_lastError.fresh = false;
+}
+
+VLXError* VLXError::VLXGetOperationError()
+{
+  return t_lastError.fresh ? VLXGetLastError(0, nullptr) : nullptr;
 }

@@ -9,9 +9,9 @@ namespace VLXJBXMessages
 {
 // The catalog name.
 inline constexpr const char Catalog[] = "VLXJBXInfraErrorMessages";
-// "no Java environment could be obtained for /p1"
+// "no Java environment could be obtained for /p1: /p2" (/p1 the operation, /p2 the cause)
 inline constexpr const char NoEnvironment[] = "VLXJBXInfraERR_1002";
-// "/p1 failed"
+// "/p1 failed: /p2" (/p1 the operation, /p2 the cause)
 inline constexpr const char OperationFailed[] = "VLXJBXInfraERR_1003";
 // "the Java virtual machine could not be created: /p1"
 inline constexpr const char JvmCreationFailed[] = "VLXJBXInfraERR_1004";

@@ -13,7 +13,7 @@
 //   kept as NUL, and back. Text that is not well-formed UTF-8 is refused with VLX_E_INVALIDARG and a
 //   last error naming the fault and its byte offset. A Java string holding an unpaired surrogate is
 //   converted with U+FFFD (the replacement character) in its place.
-// - Boolean bytes cross unchanged in both directions (a VLXBoolean 2 is the jboolean 2).
+// - Boolean bytes: any non-zero VLXBoolean goes to Java as true (1); Java booleans come back as 0 or 1.
 // - Primitive arrays are copied in bulk.
 #ifndef VLXJBXJNIConverter_h
 #define VLXJBXJNIConverter_h

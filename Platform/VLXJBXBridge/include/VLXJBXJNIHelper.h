@@ -70,6 +70,7 @@ public:
   }
   static jsize GetArrayLength(JNIEnv* env, jarray array) { return env->GetArrayLength(array); }
   static jclass GetObjectClass(JNIEnv* env, jobject obj) { return env->GetObjectClass(obj); }
+  static jboolean IsInstanceOf(JNIEnv* env, jobject obj, jclass cls) { return env->IsInstanceOf(obj, cls); }
   static jobject GetStaticObjectField(JNIEnv* env, jclass cls, jfieldID field)
   {
     return env->GetStaticObjectField(cls, field);
@@ -78,6 +79,7 @@ public:
   static jobject NewLocalRef(JNIEnv* env, jobject obj) { return env->NewLocalRef(obj); }
   static void DeleteLocalRef(JNIEnv* env, jobject obj) { env->DeleteLocalRef(obj); }
   static bool ExceptionCheck(JNIEnv* env) { return env->ExceptionCheck() == JNI_TRUE; }
+  static void ExceptionClear(JNIEnv* env) { env->ExceptionClear(); }
 
   // A new global reference to `obj` (null for a null `obj`), counted by
   // VLXJBXJNIUtilities::GetGlobalRefCount.

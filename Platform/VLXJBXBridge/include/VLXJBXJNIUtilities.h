@@ -28,11 +28,13 @@ public:
   // call fails at once with the same last error.
   //
   // A native thread that is not attached is attached as a daemon thread named
-  // "VLXJBX-attached-<n>" and detached automatically when it exits. Threads attached by someone
-  // else, and the thread that created the JVM, are never detached by the bridge; a thread the
-  // bridge attached must not be detached by anyone else.
+  // "VLXJBX-attached-<n>" and detached automatically when it exits, as is the thread that created
+  // the JVM (unless it is the process's main thread). Threads attached by someone else are never
+  // detached by the bridge. An application that detaches a thread the bridge attached may do so:
+  // the thread's next call attaches it again.
   //
-  // After the first call on a thread the environment comes from a per-thread cache, without a lock.
+  // After the first call on a thread the environment comes from a per-thread cache, confirmed with
+  // the JVM's GetEnv (a few nanoseconds), without a lock.
   // On failure: `env` is null, the result negative, and the last error says why
   // (VLXJBXMessages::JvmCreationFailed or NoEnvironment).
   static long GetJNIEnv(JNIEnv*& env, VLXListValVLXUnicodeString options);
@@ -64,8 +66,9 @@ public:
   //   VLXJBXMessages::JavaException error whose parameters are `context`, the exception's class
   //   name, its message and the class and message of its cause. Returns VLX_E_FAIL.
   // - None is pending, `code` >= 0: returns VLX_S_OK.
-  // - None is pending, `code` < 0: records `error` when not null; otherwise, when the thread has no
-  //   last error, records a VLXJBXMessages::OperationFailed error naming `context`. Returns VLX_E_FAIL.
+  // - None is pending, `code` < 0: records `error` when not null; otherwise keeps the error that the
+  //   failure recorded since the operation started (VLXError::MarkOperationStart), or else records
+  //   a VLXJBXMessages::OperationFailed error naming `context`. Returns VLX_E_FAIL.
   // A non-null `error` is taken over in every case (recorded, or released).
   static long HandleJavaError(JNIEnv* env, long code, const char* context, VLXError* error, int flag);
 

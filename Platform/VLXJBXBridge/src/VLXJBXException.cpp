@@ -7,8 +7,8 @@
 namespace
 {
 const VLXMessageEntry kMessages[] = {
-    {VLXJBXMessages::NoEnvironment, "no Java environment could be obtained for /p1"},
-    {VLXJBXMessages::OperationFailed, "/p1 failed"},
+    {VLXJBXMessages::NoEnvironment, "no Java environment could be obtained for /p1: /p2"},
+    {VLXJBXMessages::OperationFailed, "/p1 failed: /p2"},
     {VLXJBXMessages::JvmCreationFailed, "the Java virtual machine could not be created: /p1"},
     {VLXJBXMessages::JavaException, "/p1 failed with the Java exception /p2: /p3/p4"},
     {VLXJBXMessages::LookupFailed, "/p1 could not be found: /p2"},

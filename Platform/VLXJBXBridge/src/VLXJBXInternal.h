@@ -79,39 +79,55 @@ struct JavaExceptionText
 // describing it is cleared too.
 JavaExceptionText TakeException(JNIEnv* env);
 
-// Java text <-> UTF-8. JavaToUtf8 needs no pending exception; a null string gives "".
+// Java text to UTF-8, for descriptive texts (messages, class names): needs no pending exception;
+// a null string gives "", an unpaired surrogate becomes U+FFFD. Never fails.
 std::string JavaToUtf8(JNIEnv* env, jstring text);
 
 // The Java name of the class of object (not null), as Class.getName spells it; false when it cannot
 // be read (an exception on the way is cleared). No exception may be pending.
 bool ClassName(JNIEnv* env, jobject object, std::string& name);
 
-// Encodes UTF-16 units as UTF-8 into out, which holds 3 bytes per unit (an unpaired surrogate
-// becomes U+FFFD); returns the byte count.
-int Utf16ToUtf8(const jchar* units, jsize count, char* out);
+// Encodes count UTF-16 units as UTF-8 into out, which holds 3 bytes per unit. Returns the byte
+// count; or, when a unit is an unpaired surrogate, -1 - its index (lossy: it becomes U+FFFD).
+// A high surrogate ending the units is unpaired.
+long Utf16ToUtf8(const jchar* units, jsize count, char* out, bool lossy);
 
-// Returns use(bytes, length) of the UTF-8 form of text (null gives no bytes), read with no
-// exception pending; short texts are converted on the stack.
+// The whole UTF-8 form of a text of count (> 256) units into bytes, read in pieces: VLX_S_OK, or a
+// failure with a last error naming operation for an unpaired surrogate or a form longer than
+// INT_MAX bytes (lossy: U+FFFD for the surrogate, and the form cut short).
+long LongTextToUtf8(JNIEnv* env, jstring text, jsize count, const char* operation, bool lossy, std::string& bytes);
+
+// Records that the Java text cannot cross exactly because of the unpaired surrogate at index.
+long RejectUnpairedSurrogate(const char* operation, jsize index, jchar unit);
+
+// Calls use(bytes, length) with the exact UTF-8 form of text (null gives no bytes), read with no
+// exception pending, and returns VLX_S_OK. A text that UTF-8 cannot carry (an unpaired surrogate)
+// or whose form passes INT_MAX bytes fails without calling use, with a last error naming
+// operation and where. Short texts are converted on the stack.
 template <class Use>
-auto WithUtf8(JNIEnv* env, jstring text, Use use)
+long WithUtf8(JNIEnv* env, jstring text, const char* operation, Use use)
 {
   const jsize count = text == nullptr ? 0 : env->GetStringLength(text);
-  if (count <= 0)
-    return use("", 0);
-  jchar smallUnits[256];
-  char smallBytes[3 * 256];
-  std::vector<jchar> largeUnits;
-  std::vector<char> largeBytes;
-  jchar* units = smallUnits;
-  char* bytes = smallBytes;
-  if (count > 256) {
-    largeUnits.resize(static_cast<size_t>(count));
-    largeBytes.resize(3 * static_cast<size_t>(count));
-    units = largeUnits.data();
-    bytes = largeBytes.data();
+  if (count <= 0) {
+    use("", 0);
+    return 0;
   }
-  env->GetStringRegion(text, 0, count, units);
-  return use(bytes, Utf16ToUtf8(units, count, bytes));
+  if (count <= 256) {
+    jchar units[256];
+    char bytes[3 * 256];
+    env->GetStringRegion(text, 0, count, units);
+    const long length = Utf16ToUtf8(units, count, bytes, false);
+    if (length < 0)
+      return RejectUnpairedSurrogate(operation, static_cast<jsize>(-1 - length), units[-1 - length]);
+    use(bytes, static_cast<int>(length));
+    return 0;
+  }
+  std::string bytes;
+  const long rc = LongTextToUtf8(env, text, count, operation, false, bytes);
+  if (rc < 0)
+    return rc;
+  use(bytes.data(), static_cast<int>(bytes.size()));
+  return 0;
 }
 
 // The start-up configuration, exposed for tests.

@@ -101,11 +101,13 @@ long NewJavaString(JNIEnv* env, const char* bytes, int length, const char* opera
   return VLX_S_OK;
 }
 
+const char kFromJavaString[] = "VLXJBXJNIConverter::BuildFromJavaType(jobject, VLXUnicodeString&)";
+
+// The text's exact UTF-8 form; a text that UTF-8 cannot carry exactly fails, output untouched.
 long StringFromJava(JNIEnv* env, jobject input, VLXUnicodeString& output)
 {
-  VLXJBXDetail::WithUtf8(env, static_cast<jstring>(input),
-                         [&output](const char* bytes, int length) { output = VLXUnicodeString(bytes, length); });
-  return VLX_S_OK;
+  return VLXJBXDetail::WithUtf8(env, static_cast<jstring>(input), kFromJavaString,
+                                [&output](const char* bytes, int length) { output = VLXUnicodeString(bytes, length); });
 }
 
 template <class JArray, class JElement, class Element>
@@ -182,10 +184,9 @@ long VLXJBXJNIConverter::ConvertToJavaString(JNIEnv* env, const VLXUnicodeString
 
 long VLXJBXJNIConverter::BuildFromJavaType(JNIEnv* env, jobject input, VLXUnicodeString& output)
 {
-  static const char kOperation[] = "VLXJBXJNIConverter::BuildFromJavaType(jobject, VLXUnicodeString&)";
-  long rc = Enter(env, kOperation);
+  long rc = Enter(env, kFromJavaString);
   if (VLX_SUCCEEDED(rc))
-    rc = CheckClass(env, input, VLXJBXDetail::Lang(env).stringClass, kOperation, "java.lang.String");
+    rc = CheckClass(env, input, VLXJBXDetail::Lang(env).stringClass, kFromJavaString, "java.lang.String");
   if (VLX_FAILED(rc))
     return rc;
   return StringFromJava(env, input, output);
@@ -256,8 +257,11 @@ long VLXJBXJNIConverter::BuildFromJavaType(JNIEnv* env, jobject input, VLXListVa
       return Raise(VLX_E_INVALIDARG, VLXJBXMessages::InvalidArgument,
                    {kOperation, "element " + std::to_string(i) + " of the Java array is not a java.lang.String"},
                    __FILE__, __LINE__);
-    const std::string text = VLXJBXDetail::JavaToUtf8(env, static_cast<jstring>(element.get()));
-    result.Append(VLXUnicodeString(text.data(), static_cast<int>(text.size())));
+    const long converted =
+        VLXJBXDetail::WithUtf8(env, static_cast<jstring>(element.get()), kOperation,
+                               [&result](const char* bytes, int length) { result.Append(VLXUnicodeString(bytes, length)); });
+    if (VLX_FAILED(converted))
+      return converted;
   }
   output = std::move(result);
   return VLX_S_OK;
@@ -267,8 +271,13 @@ long VLXJBXJNIConverter::BuildFromJavaType(JNIEnv* env, jobject input, VLXListVa
 
 long VLXJBXJNIConverter::ConvertToJavaType(JNIEnv* env, const VLXListValVLXBoolean& input, jbooleanArray& output)
 {
+  // Any non-zero byte is true: Java sees only 0 or 1.
+  const int size = input.Size();
+  std::vector<VLXBoolean> normalised(static_cast<size_t>(size));
+  for (int i = 0; i < size; ++i)
+    normalised[static_cast<size_t>(i)] = input.Data()[i] != 0;
   return ToJavaArray<jbooleanArray, jboolean>(
-      env, input.Data(), input.Size(), &JNIEnv::NewBooleanArray, &JNIEnv::SetBooleanArrayRegion,
+      env, normalised.data(), size, &JNIEnv::NewBooleanArray, &JNIEnv::SetBooleanArrayRegion,
       "VLXJBXJNIConverter::ConvertToJavaType(const VLXListValVLXBoolean&, jbooleanArray&)", output);
 }
 

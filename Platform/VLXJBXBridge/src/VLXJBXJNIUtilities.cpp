@@ -138,7 +138,10 @@ long SlowGetJNIEnv(JNIEnv*& env, const VLXListValVLXUnicodeString& options)
         if (CreateJavaVM(options, vm, created) != VLX_S_OK)
           return Raise(VLX_E_FAIL, VLXJBXMessages::JvmCreationFailed, {g_startFailure}, __FILE__, __LINE__);
         g_vm.store(vm, std::memory_order_release);
-        // The creating thread stays attached for the life of the process.
+        // The creating thread is detached at its exit like every thread the bridge attached (the
+        // process's main thread runs no key destructor at exit, so it stays with the JVM).
+        if (g_detachKeyReady)
+          pthread_setspecific(g_detachKey, vm);
         t_env = created;
         env = created;
         return VLX_S_OK;
@@ -150,17 +153,21 @@ long SlowGetJNIEnv(JNIEnv*& env, const VLXListValVLXUnicodeString& options)
   void* found = nullptr;
   const jint rc = vm->GetEnv(&found, JNI_VERSION_1_8);
   if (rc == JNI_OK) {
-    env = static_cast<JNIEnv*>(found); // attached by someone else: not cached
+    // Attached by someone else (perhaps after detaching a thread the bridge had attached): not
+    // cached, and never detached by the bridge.
+    if (g_detachKeyReady)
+      pthread_setspecific(g_detachKey, nullptr);
+    env = static_cast<JNIEnv*>(found);
     return VLX_S_OK;
   }
   if (rc != JNI_EDETACHED)
     return Raise(VLX_E_FAIL, VLXJBXMessages::NoEnvironment,
-                 {std::string("VLXJBXJNIUtilities::GetJNIEnv (GetEnv returned ") + std::to_string(rc) + ", " +
-                  JniCodeText(rc) + ")"},
+                 {"VLXJBXJNIUtilities::GetJNIEnv",
+                  "GetEnv returned " + std::to_string(rc) + " (" + JniCodeText(rc) + ")"},
                  __FILE__, __LINE__);
   if (!g_detachKeyReady)
     return Raise(VLX_E_FAIL, VLXJBXMessages::NoEnvironment,
-                 {"VLXJBXJNIUtilities::GetJNIEnv (no thread-exit hook could be installed to detach the thread)"},
+                 {"VLXJBXJNIUtilities::GetJNIEnv", "no thread-exit hook could be installed to detach the thread"},
                  __FILE__, __LINE__);
 
   std::string name = kAttachedThreadPrefix + std::to_string(g_attachSerial.fetch_add(1) + 1);
@@ -171,13 +178,13 @@ long SlowGetJNIEnv(JNIEnv*& env, const VLXListValVLXUnicodeString& options)
   const jint attached = vm->AttachCurrentThreadAsDaemon(&found, &attach);
   if (attached != JNI_OK || found == nullptr)
     return Raise(VLX_E_FAIL, VLXJBXMessages::NoEnvironment,
-                 {std::string("VLXJBXJNIUtilities::GetJNIEnv (AttachCurrentThreadAsDaemon returned ") +
-                  std::to_string(attached) + ", " + JniCodeText(attached) + ")"},
+                 {"VLXJBXJNIUtilities::GetJNIEnv", "AttachCurrentThreadAsDaemon returned " + std::to_string(attached) +
+                                                       " (" + JniCodeText(attached) + ")"},
                  __FILE__, __LINE__);
   if (pthread_setspecific(g_detachKey, vm) != 0) {
     vm->DetachCurrentThread();
     return Raise(VLX_E_FAIL, VLXJBXMessages::NoEnvironment,
-                 {"VLXJBXJNIUtilities::GetJNIEnv (the thread-exit hook could not be set)"}, __FILE__, __LINE__);
+                 {"VLXJBXJNIUtilities::GetJNIEnv", "the thread-exit hook could not be set"}, __FILE__, __LINE__);
   }
   t_env = static_cast<JNIEnv*>(found);
   env = t_env;
@@ -227,9 +234,23 @@ long LookupMember(JNIEnv* env, jclass cls, const char* kind, const char* name, c
 }
 }
 
+// The cached environment of the calling thread while the thread is still attached with it: the
+// application may have detached the thread (and attached it again) since the cache was filled.
+static JNIEnv* CachedEnv()
+{
+  JNIEnv* cached = t_env;
+  if (cached == nullptr)
+    return nullptr;
+  void* current = nullptr;
+  if (g_vm.load(std::memory_order_relaxed)->GetEnv(&current, JNI_VERSION_1_8) == JNI_OK && current == cached)
+    return cached;
+  t_env = nullptr;
+  return nullptr;
+}
+
 long VLXJBXJNIUtilities::GetJNIEnv(JNIEnv*& env, VLXListValVLXUnicodeString options)
 {
-  if (JNIEnv* cached = t_env) {
+  if (JNIEnv* cached = CachedEnv()) {
     env = cached;
     return VLX_S_OK;
   }
@@ -243,7 +264,7 @@ JavaVM* VLXJBXJNIUtilities::GetJavaVM()
 
 JNIEnv* VLXJBXDetail::CurrentEnv()
 {
-  if (JNIEnv* cached = t_env)
+  if (JNIEnv* cached = CachedEnv())
     return cached;
   JNIEnv* env = nullptr;
   SlowGetJNIEnv(env, VLXListValVLXUnicodeString());
@@ -267,7 +288,7 @@ long VLXJBXJNIUtilities::NewGlobalRefForClass(JNIEnv* env, const char* classPath
   jobject global = env->NewGlobalRef(local.get());
   if (global == nullptr)
     return Raise(VLX_E_OUTOFMEMORY, VLXJBXMessages::OperationFailed,
-                 {std::string(kOperation) + " (no global reference could be made for class '" + classPath + "')"},
+                 {kOperation, std::string("no global reference could be made for class '") + classPath + "'"},
                  __FILE__, __LINE__);
   VLXJBXDetail::CountGlobalRefs(1);
   cls = static_cast<jclass>(global);
@@ -321,11 +342,14 @@ long VLXJBXJNIUtilities::HandleJavaError(JNIEnv* env, long code, const char* con
   }
   if (error != nullptr)
     return VLXError::GetReturn(VLXError::ReturnError, error, nullptr, __FILE__, __LINE__);
-  if (VLXError* pending = VLXError::VLXGetLastError(code, nullptr)) {
-    pending->Release();
+  // The failure's own error, if it recorded one since the operation started; never an older one.
+  if (VLXError* own = VLXError::VLXGetOperationError()) {
+    own->Release();
     return VLX_E_FAIL;
   }
-  return Raise(VLX_E_FAIL, VLXJBXMessages::OperationFailed, {operation}, __FILE__, __LINE__);
+  return Raise(VLX_E_FAIL, VLXJBXMessages::OperationFailed,
+               {operation, "it returned the failure code " + std::to_string(code) + " and recorded no cause"},
+               __FILE__, __LINE__);
 }
 
 long VLXJBXJNIUtilities::GetClassName(JNIEnv* env, jobject object, VLXUnicodeString& name)
@@ -336,7 +360,7 @@ long VLXJBXJNIUtilities::GetClassName(JNIEnv* env, jobject object, VLXUnicodeStr
                  {kOperation, env == nullptr ? "null environment" : "null object"}, __FILE__, __LINE__);
   std::string text;
   if (!VLXJBXDetail::ClassName(env, object, text))
-    return Raise(VLX_E_FAIL, VLXJBXMessages::OperationFailed, {std::string(kOperation) + " (Class.getName failed)"},
+    return Raise(VLX_E_FAIL, VLXJBXMessages::OperationFailed, {kOperation, "Class.getName failed"},
                  __FILE__, __LINE__);
   name = VLXUnicodeString(text.data(), static_cast<int>(text.size()));
   return VLX_S_OK;

@@ -1,6 +1,12 @@
 // The java.lang classes the bridge itself uses, and Java exceptions and texts in native words.
 #include "VLXJBXInternal.h"
 
+#include "VLXJBXException.h"
+#include "VLXResult.h"
+
+#include <climits>
+#include <cstdio>
+
 #include <mutex>
 
 namespace
@@ -119,16 +125,18 @@ bool VLXJBXDetail::ClassName(JNIEnv* env, jobject object, std::string& name)
   return true;
 }
 
-int VLXJBXDetail::Utf16ToUtf8(const jchar* units, jsize count, char* out)
+long VLXJBXDetail::Utf16ToUtf8(const jchar* units, jsize count, char* out, bool lossy)
 {
-  int n = 0;
+  long n = 0;
   for (jsize i = 0; i < count; ++i) {
     unsigned long c = units[i];
     if (c >= 0xD800 && c <= 0xDBFF && i + 1 < count && units[i + 1] >= 0xDC00 && units[i + 1] <= 0xDFFF) {
       c = 0x10000 + ((c - 0xD800) << 10) + (units[i + 1] - 0xDC00);
       ++i;
     } else if (c >= 0xD800 && c <= 0xDFFF) {
-      c = 0xFFFD; // unpaired surrogate
+      if (!lossy)
+        return -1 - static_cast<long>(i);
+      c = 0xFFFD;
     }
     if (c < 0x80) {
       out[n++] = static_cast<char>(c);
@@ -149,7 +157,54 @@ int VLXJBXDetail::Utf16ToUtf8(const jchar* units, jsize count, char* out)
   return n;
 }
 
+long VLXJBXDetail::RejectUnpairedSurrogate(const char* operation, jsize index, jchar unit)
+{
+  char code[8];
+  std::snprintf(code, sizeof code, "%04X", static_cast<unsigned>(unit));
+  return Raise(VLX_E_FAIL, VLXJBXMessages::ConversionFailed,
+               {operation, std::string("the Java text holds an unpaired surrogate (U+") + code + ") at index " +
+                               std::to_string(index) + ", which UTF-8 cannot carry"},
+               __FILE__, __LINE__);
+}
+
+long VLXJBXDetail::LongTextToUtf8(JNIEnv* env, jstring text, jsize count, const char* operation, bool lossy,
+                                  std::string& bytes)
+{
+  const size_t kMax = static_cast<size_t>(INT_MAX);
+  const jsize kPiece = 8192;
+  jchar units[kPiece];
+  char encoded[3 * kPiece];
+  bytes.clear();
+  bytes.reserve(static_cast<size_t>(count) < kMax ? static_cast<size_t>(count) : kMax);
+  for (jsize start = 0; start < count;) {
+    jsize n = count - start < kPiece ? count - start : kPiece;
+    env->GetStringRegion(text, start, n, units);
+    // A high surrogate ending a piece is encoded with the unit after it, in the next piece.
+    if (start + n < count && units[n - 1] >= 0xD800 && units[n - 1] <= 0xDBFF)
+      --n;
+    const long length = Utf16ToUtf8(units, n, encoded, lossy);
+    if (length < 0)
+      return RejectUnpairedSurrogate(operation, start + static_cast<jsize>(-1 - length), units[-1 - length]);
+    if (bytes.size() + static_cast<size_t>(length) > kMax) {
+      if (lossy)
+        return VLX_S_OK;
+      return Raise(VLX_E_FAIL, VLXJBXMessages::ConversionFailed,
+                   {operation, "the Java text of " + std::to_string(count) +
+                                   " characters is longer than 2147483647 bytes in UTF-8"},
+                   __FILE__, __LINE__);
+    }
+    bytes.append(encoded, static_cast<size_t>(length));
+    start += n;
+  }
+  return VLX_S_OK;
+}
+
 std::string VLXJBXDetail::JavaToUtf8(JNIEnv* env, jstring text)
 {
-  return WithUtf8(env, text, [](const char* bytes, int length) { return std::string(bytes, static_cast<size_t>(length)); });
+  const jsize count = text == nullptr ? 0 : env->GetStringLength(text);
+  std::string bytes;
+  if (count <= 0)
+    return bytes;
+  LongTextToUtf8(env, text, count, "VLXJBXDetail::JavaToUtf8", true, bytes);
+  return bytes;
 }

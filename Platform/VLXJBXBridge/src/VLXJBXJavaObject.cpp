@@ -5,6 +5,8 @@
 #include "VLXJBXJNIHelper.h"
 #include "VLXResult.h"
 
+#include <typeinfo>
+
 VLXJBXJavaObject::VLXJBXJavaObject() : exchangedWithJava(0), _handle(nullptr) {}
 
 VLXJBXJavaObject::VLXJBXJavaObject(const VLXJBXJavaObject& other)
@@ -26,11 +28,19 @@ VLXJBXJavaObject& VLXJBXJavaObject::operator=(const VLXJBXJavaObject& other)
   JNIEnv* env = VLXJBXDetail::CurrentEnv();
   if (env == nullptr)
     return *this; // a handle exists, so a JVM does: only an attach failure leads here
+  // An object of the same dynamic type holds only what this one may hold.
+  if (other._handle != nullptr && typeid(*this) != typeid(other) && AcceptObject(env, other._handle) < 0)
+    return *this;
   // The new reference first: `other` may share the Java object with this.
   jobject replacement = other._handle != nullptr ? VLXJBXJNIHelper::NewGlobalRef(env, other._handle) : nullptr;
   VLXJBXJNIHelper::DeleteGlobalRef(env, _handle);
   _handle = replacement;
   return *this;
+}
+
+long VLXJBXJavaObject::AcceptObject(JNIEnv*, jobject)
+{
+  return VLX_S_OK;
 }
 
 VLXJBXJavaObject::~VLXJBXJavaObject()
@@ -43,7 +53,6 @@ VLXJBXJavaObject::~VLXJBXJavaObject()
 
 long VLXJBXJavaObject::SetGlobalRef(JNIEnv* env, jobject object)
 {
-  static const char kOperation[] = "VLXJBXJavaObject::SetGlobalRef";
   if (env == nullptr) {
     if (object == nullptr && _handle == nullptr)
       return VLX_S_OK;
@@ -51,13 +60,24 @@ long VLXJBXJavaObject::SetGlobalRef(JNIEnv* env, jobject object)
     if (env == nullptr)
       return VLX_E_FAIL; // the last error says why
   }
+  if (object != nullptr) {
+    const long accepted = AcceptObject(env, object);
+    if (VLX_FAILED(accepted))
+      return accepted;
+  }
+  return ReplaceGlobalRef(env, object);
+}
+
+long VLXJBXJavaObject::ReplaceGlobalRef(JNIEnv* env, jobject object)
+{
+  static const char kOperation[] = "VLXJBXJavaObject::SetGlobalRef";
   jobject replacement = nullptr;
   if (object != nullptr) {
     replacement = VLXJBXJNIHelper::NewGlobalRef(env, object);
     if (replacement == nullptr)
       return VLXJBXDetail::Raise(VLX_E_FAIL, VLXJBXMessages::OperationFailed,
-                                 {std::string(kOperation) + " (no global reference could be made; the object may "
-                                                            "be a cleared weak reference or memory is exhausted)"},
+                                 {kOperation, "no global reference could be made; the object may be a cleared weak "
+                                              "reference or memory is exhausted"},
                                  __FILE__, __LINE__);
   }
   VLXJBXJNIHelper::DeleteGlobalRef(env, _handle);

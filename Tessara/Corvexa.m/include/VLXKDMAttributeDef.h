@@ -33,11 +33,13 @@ class CORVEXA_API VLXKDMAttributeDef : public VLXKDMJavaObject {
   long GetTargetNames(VLXListOfVLXUnicodeString& names);
   // Names that are not well-formed UTF-8 return the converter's own code.
   long SetTargetNames(const VLXListOfVLXUnicodeString& names);
-  // As the list form: count NUL-terminated texts (const char*) follow; count <= 0 sets none.
+  // As the list form: exactly count NUL-terminated texts (const char*) must follow (a null one is
+  // the empty text); 0 sets none; a negative count fails with VLX_E_INVALIDARG, changing nothing.
   long SetTargetNames(int count, ...);
   long GetTargetRefs(VLXListOfVLXUnicodeString& refs);
   long SetTargetRefs(const VLXListOfVLXUnicodeString& refs);
-  // As the list form: count NUL-terminated texts (const char*) follow; count <= 0 sets none.
+  // As the list form: exactly count NUL-terminated texts (const char*) must follow (a null one is
+  // the empty text); 0 sets none; a negative count fails with VLX_E_INVALIDARG, changing nothing.
   long SetTargetRefs(int count, ...);
 
   // Leaves type as the caller set it when the Java side answers null or an unknown object.
@@ -54,7 +56,7 @@ class CORVEXA_API VLXKDMAttributeDef : public VLXKDMJavaObject {
   // The maximal length of a String (characters) or Binary (bytes) value; 0 or less: unlimited.
   long GetLength(int& length);
   long SetLength(int length);
-  // The flags cross as their byte values, unchanged.
+  // A flag is sent to Java as true for any non-zero byte; it is read back as 0 or 1.
   long IsMandatory(VLXBoolean& isMandatory);
   long SetMandatory(VLXBoolean isMandatory);
   long IsMultiValuated(VLXBoolean& isMultiValuated);

@@ -31,11 +31,12 @@ class CORVEXA_API VLXKDMClassDef : public VLXKDMJavaObject {
   long SetQKADerivability(const VLXUnicodeString& derivability);
   long GetScopeNames(VLXListOfVLXUnicodeString& names);
   long SetScopeNames(const VLXListOfVLXUnicodeString& names);
-  // As SetScopeNames with a list: count NUL-terminated texts (const char*) follow; count <= 0 sets
-  // an empty list. Failures are reported under the list form's name.
+  // As SetScopeNames with a list: exactly count NUL-terminated texts (const char*) must follow (a
+  // null one is the empty text); 0 sets an empty list; a negative count fails with
+  // VLX_E_INVALIDARG, changing nothing. Other failures are reported under the list form's name.
   long SetScopeNames(int count, ...);
 
-  // The flags cross as their byte values, unchanged.
+  // A flag is sent to Java as true for any non-zero byte; it is read back as 0 or 1.
   long IsAbstract(VLXBoolean& isAbstract);
   long SetAbstract(VLXBoolean isAbstract);
   long IsExtensible(VLXBoolean& isExtensible);

@@ -67,8 +67,8 @@ class CORVEXA_API VLXKDMInstance : public VLXKDMJavaObject {
   long SetValue(int position, VLXKDMInstanceValue& value);
 
   // The typed setters: one Java object made from the argument, checked by the Java side against
-  // the attribute's type and kind (single or list). A time crosses as seconds * 1000 ms; a boolean
-  // byte crosses unchanged. An instance (or element of a list of instances) that is not attached
+  // the attribute's type and kind (single or list). A time crosses as seconds * 1000 ms; any non-zero
+  // boolean byte is sent as true. An instance (or element of a list of instances) that is not attached
   // to a Java object is a broken precondition, reported through VLXFatalError; if the report
   // returns, the setter fails without calling Java. An empty list sets an empty value, which is not
   // the same as no value.
@@ -101,12 +101,13 @@ class CORVEXA_API VLXKDMInstance : public VLXKDMJavaObject {
   long SetValue(const VLXUnicodeString& name, const VLXListOfVLXKDMInstance& value);
   long SetValue(int position, const VLXListOfVLXKDMInstance& value);
 
-  // The variadic setters: count values follow (none when count <= 0, which sets an empty list),
-  // gathered into a list that is then set as by the list setter, whose name failures carry. The
-  // values are: const VLXBinary*, VLXBoolean (as int; its low 8 bits count), const VLXTime*,
-  // double, const VLXKDMInstance*, int, and NUL-terminated UTF-8 texts (const char*). A null
-  // pointer stands for the empty value: an empty buffer, the time 0, an unattached instance (which
-  // fails the conversion), an empty text.
+  // The variadic setters: exactly count values of the setter's type must follow (0 sets an empty
+  // list), gathered into a list that is then set as by the list setter, whose name failures carry.
+  // The values are: const VLXBinary*, VLXBoolean (passed as int; any non-zero value is true),
+  // const VLXTime*, double, const VLXKDMInstance*, int, and NUL-terminated UTF-8 texts
+  // (const char*). A null binary or text pointer stands for the empty value. A negative count, or
+  // a null time or instance pointer, fails with VLX_E_INVALIDARG and changes nothing. Values that
+  // do not match the count and type cannot be detected: the behaviour is then undefined.
   long SetValueBinaries(const VLXUnicodeString& name, int count, ...);
   long SetValueBinaries(int position, int count, ...);
   long SetValueBooleans(const VLXUnicodeString& name, int count, ...);

@@ -52,11 +52,10 @@ class CORVEXA_API VLXKDMInstanceValue : public VLXKDMJavaObject {
   // boolean[], String[], Date[], byte[][], Instance[]) and converts it; the value is then
   // Synchronized. Fails, changing nothing, when the value has no Java object. A Java object of any
   // other class is a broken precondition, reported through VLXFatalError; if the report returns,
-  // BuildLocal fails and the value has no type. When the conversion fails the value is not
-  // Synchronized and its member may be partly filled.
+  // BuildLocal fails. Whenever it fails, the value is left exactly as it was.
   long BuildLocal();
   // Makes the Java object of the local form and attaches the value to it (Synchronized). In the
-  // Synchronized state it does nothing and succeeds. A value without type is a broken precondition,
+  // Synchronized state, with its Java object still held, it does nothing and succeeds. A value without type is a broken precondition,
   // reported through VLXFatalError; if the report returns, BuildRemote fails. A failure leaves the
   // value as it was: not Synchronized, its former Java object (if any) kept.
   long BuildRemote();
@@ -102,14 +101,25 @@ class CORVEXA_API VLXKDMInstanceValue : public VLXKDMJavaObject {
   void SetListOfBinary(const VLXListValVLXBinary& value);
   void SetListOfInstance(const VLXListValVLXKDMInstance& value);
 
+ protected:
+  // Accepts only the Java classes of an attribute value (VLX_E_INVALIDARG for another, naming it);
+  // an attached object is no longer the Java form of the local value (the value is not
+  // Synchronized until BuildLocal).
+  long AcceptObject(JNIEnv* env, jobject object) override;
+
  private:
   // The one table of the seven types, single and list: their members, Java classes and getter
   // preconditions, read by BuildLocal, InternalBuild, Clean and the getters.
   struct Dispatch;
   friend struct Dispatch;
 
+  friend class corvexa::FrameAccess;
+
   // Drops the Java object and empties the local value of the current type and kind.
   void Clean();
+  // Reads the local form of object; with attach, the value also holds object. On failure the value
+  // is exactly as it was.
+  long Read(JNIEnv* env, jobject object, bool attach);
   // A new Java object (a local reference, or the single instance's own global reference) holding
   // the local value.
   long InternalBuild(jobject& object);

@@ -39,12 +39,15 @@ class CORVEXA_API VLXKDMJavaObject : public VLXJBXJavaObject {
   // Starts nothing and reports nothing.
   jobject GetHandle() const;
   // Attaches the proxy to object through a new global reference of its own (null detaches it). The
-  // caller keeps and releases its own reference to object.
+  // caller keeps and releases its own reference to object. A proxy class accepts only objects of
+  // its Java class: another fails with VLX_E_INVALIDARG, the handle unchanged.
   long SetHandle(JNIEnv* env, jobject object);
 
   // The error translation: turns the outcome of an operation into its result code and the thread's
   // last error. A pending Java exception is cleared and reported; a success status gives VLX_S_OK;
-  // any other failure re-raises the pending last error or raises one naming methodName.
+  // any other failure keeps the error that the failing operation itself recorded, or else raises
+  // one naming methodName and the failure code. An error recorded by an earlier operation of the
+  // thread is never raised again.
   static long HandleReplicaError(JNIEnv* env, long status, const char* methodName);
 
  protected:
@@ -66,7 +69,8 @@ class CORVEXA_API VLXKDMJavaObject : public VLXJBXJavaObject {
   // Instances); it never releases input. A null input fails for a boxed value or a date, detaches
   // an instance and empties a list. A list is emptied first; a null element of a date array is a
   // failure, a null byte array gives an empty buffer, a null instance an unattached proxy. A date
-  // of m milliseconds gives (m + 500) / 1000 seconds, rounded toward zero.
+  // of m milliseconds gives the nearest whole second, halves rounded up: floor((m + 500) / 1000), so
+  // every whole second crosses both ways unchanged.
   static long BuildFromJavaType(JNIEnv* env, jobject input, VLXBoolean& output);
   static long BuildFromJavaType(JNIEnv* env, jobject input, int& output);
   static long BuildFromJavaType(JNIEnv* env, jobject input, double& output);
@@ -80,7 +84,8 @@ class CORVEXA_API VLXKDMJavaObject : public VLXJBXJavaObject {
   // neither delete nor keep beyond the proxy's life. An instance (or an element of a list of
   // instances) that is not attached to a Java object is a broken precondition, reported through
   // VLXFatalError; if the report returns, the conversion fails and makes no Java object. A time of
-  // s seconds gives a Date of s * 1000 milliseconds; a boolean byte crosses unchanged.
+  // s seconds gives a Date of s * 1000 milliseconds (a time beyond a Date's range fails); any
+  // non-zero boolean byte is true.
   static long ConvertToJavaType(JNIEnv* env, int input, jobject& output);
   static long ConvertToJavaType(JNIEnv* env, double input, jobject& output);
   static long ConvertToJavaType(JNIEnv* env, VLXBoolean input, jobject& output);
@@ -89,6 +94,11 @@ class CORVEXA_API VLXKDMJavaObject : public VLXJBXJavaObject {
   static long ConvertToJavaType(JNIEnv* env, const VLXListValVLXTime& input, jobject& output);
   static long ConvertToJavaType(JNIEnv* env, const VLXListValVLXKDMInstance& input, jobject& output);
   static long ConvertToJavaType(JNIEnv* env, const VLXListValVLXBinary& input, jobject& output);
+
+  // VLX_S_OK when object is of the Java class of binding-table slot javaClass (or a subclass);
+  // otherwise VLX_E_INVALIDARG with a last error naming operation, the expected and the actual
+  // class. Starts the Java side when no operation has yet. No Java exception may be pending.
+  static long CheckJavaClass(JNIEnv* env, jobject object, int javaClass, const char* operation);
 
   // The binding table of the process: null until the Java side is first started.
   static std::atomic<ReplicaStubs*> _st;
@@ -105,11 +115,18 @@ class CORVEXA_API VLXKDMJavaObject : public VLXJBXJavaObject {
 // Returns 1. Marks the library; does nothing else.
 extern "C" CORVEXA_API int VELMORA_QKA2_INTERNAL_Corvexa();
 
-// The special members every proxy class has: those of the base. A proxy class adds no data and no
-// virtual function.
-#define VLXKDM_PROXY_SPECIAL_MEMBERS(Class) \
- public:                                    \
-  Class();                                  \
-  Class(const Class& other);                \
-  Class& operator=(const Class& other);     \
-  virtual ~Class();
+// The special members every proxy class has: those of the base, and the check that the proxy is
+// attached only to a Java object of its own class (SetHandle, assignment through the base, or an
+// exchange with Java fail with VLX_E_INVALIDARG for any other, naming both classes). A proxy class
+// adds no data.
+#define VLXKDM_PROXY_SPECIAL_MEMBERS(Class)                      \
+ public:                                                         \
+  Class();                                                       \
+  Class(const Class& other);                                     \
+  Class& operator=(const Class& other);                          \
+  virtual ~Class();                                              \
+                                                                 \
+ protected:                                                      \
+  long AcceptObject(JNIEnv* env, jobject object) override;       \
+                                                                 \
+ public:

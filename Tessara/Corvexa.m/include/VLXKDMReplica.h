@@ -79,15 +79,17 @@ class CORVEXA_API VLXKDMReplica : public VLXKDMJavaObject {
 
   // ---- Exchange with Java code that calls into native code with its own environment.
 
-  // Attaches this proxy to the given Java replica. Uses env as it is and starts nothing.
+  // Attaches this proxy to the given Java replica (null detaches it). Uses env as it is. An object
+  // that is not a replica fails with VLX_E_INVALIDARG, naming its class; the proxy is unchanged.
   long BuildFromJavaType(JNIEnv* env, jobject replica);
   // Writes a new local reference to this proxy's Java replica (null when the proxy is not built);
   // the reference belongs to the calling Java frame.
   long ConvertToJavaType(JNIEnv* env, jobject& replica);
-  // Attaches this proxy to the replica that the Java ReplicaHolder holder holds.
+  // Attaches this proxy to the replica that the Java ReplicaHolder holder holds. A null holder or
+  // an object that is not a ReplicaHolder fails with VLX_E_INVALIDARG; the proxy is unchanged.
   long BuildFromJavaHolder(JNIEnv* env, jobject holder);
   // Stores this proxy's Java replica into holder; when holder is null, into a new ReplicaHolder
   // written to holder (a local reference of the calling Java frame). holder is written only on
-  // success.
+  // success. A holder that is not a ReplicaHolder fails with VLX_E_INVALIDARG.
   long ConvertToJavaHolder(JNIEnv* env, jobject& holder);
 };

@@ -79,6 +79,12 @@ class FrameAccess {
     return self ? self->InitJavaAndTestIsBuilt(env, name) : VLXKDMJavaObject::InitJava(env, name);
   }
   static ReplicaStubs* Table() { return VLXKDMJavaObject::_st.load(std::memory_order_acquire); }
+  // Attaches proxy to object, whose Java class the binding table's method signature establishes.
+  static long Attach(VLXKDMJavaObject& proxy, JNIEnv* env, jobject object) {
+    return proxy.ReplaceGlobalRef(env, object);
+  }
+  // Attaches value to object (not null) and reads its local form; a failure leaves value as it was.
+  static long Read(VLXKDMInstanceValue& value, JNIEnv* env, jobject object) { return value.Read(env, object, true); }
 
   // The start of an operation that Java code calls with its own environment: env is replaced by
   // the calling thread's. Returns the bound table, or null with the operation's result in result.
@@ -132,7 +138,16 @@ template <> struct ArgOf<VLXUnicodeString> {
 template <> struct ArgOf<VLXListValVLXUnicodeString> : ConvertedArg<VLXListValVLXUnicodeString, jobjectArray> {};
 template <> struct ArgOf<VLXBinary> : ConvertedArg<VLXBinary, jbyteArray> {};
 template <> struct ArgOf<int> : PassedArg<jint> {};
-template <> struct ArgOf<VLXBoolean> : PassedArg<jboolean> {};  // the byte as it is
+// Any non-zero byte is true: Java sees only 0 or 1.
+template <> struct ArgOf<VLXBoolean> {
+  using J = jboolean;
+  static constexpr bool kOwnsRef = false;
+  static constexpr bool kEarly = false;
+  static long To(JNIEnv*, VLXBoolean value, J& out) {
+    out = value != 0 ? JNI_TRUE : JNI_FALSE;
+    return VLX_S_OK;
+  }
+};
 template <> struct ArgOf<jobject> : PassedArg<jobject> {};
 
 // A proxy argument goes as its handle, without a built test.
@@ -192,7 +207,7 @@ struct ResultOf<P, std::enable_if_t<std::is_base_of_v<VLXKDMJavaObject, P>>> {
   using Raw = jobject;
   static long Land(JNIEnv* env, jobject result, P& out, long) {
     LocalRef owned(env, result);
-    return out.SetHandle(env, result);
+    return FrameAccess::Attach(out, env, result);
   }
 };
 
@@ -408,17 +423,16 @@ struct ArgOf<RemoteForm> {
 template <>
 struct ArgOf<VLXKDMInstanceValue>;
 
-// A returned attribute value: attached to the holder, whose local form is then read with
-// BuildLocal; the operation's status is BuildLocal's.
+// A returned attribute value read into the holder; a failure, or a null answer (no value), leaves
+// the holder exactly as it was. (GetValue lands through its own out-parameter, which also names the
+// attribute when it has no value.)
 template <>
 struct ResultOf<VLXKDMInstanceValue> {
   using Raw = jobject;
   static long Land(JNIEnv* env, jobject result, VLXKDMInstanceValue& out, long) {
     LocalRef owned(env, result);
-    const long attached = out.SetHandle(env, result);
-    if (attached < 0) return attached;
-    owned.reset();
-    return out.BuildLocal();
+    if (!result) return RejectValue("VLXKDMInstanceValue::BuildLocal()", "the Java method answered no value");
+    return FrameAccess::Read(out, env, result);
   }
 };
 

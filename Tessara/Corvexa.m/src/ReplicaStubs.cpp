@@ -54,6 +54,11 @@ int SlotAtStep(int i)
 
 JNIEnv* ReplicaStubs::_env = nullptr;
 
+const char* ReplicaStubs::ClassPath(Slot slot)
+{
+  return slot >= 0 && slot < SlotCount && kRows[slot].kind == Kind::Class ? kRows[slot].name : nullptr;
+}
+
 ReplicaStubs::ReplicaStubs() : _state(kFilling) { _missing[0] = '\0'; }
 
 long ReplicaStubs::init(JNIEnv* env)

@@ -55,6 +55,10 @@ class CORVEXA_API ReplicaStubs {
   // naming the first missing class or member and returns VLX_E_FAIL.
   long ReportUnbound(const char* methodName) const;
 
+  // The class path of a class slot ("com/velmora/tessara/kdmreplica/Instance"), or null for a slot
+  // of another kind.
+  static const char* ClassPath(corvexa::Slot slot);
+
   // The environment passed to init(), used by the calls init makes and by nothing else.
   static JNIEnv* _env;
 

@@ -11,7 +11,7 @@ namespace {
 const char* const kSource = "Tessara\\Corvexa.m\\src\\VLXKDMAttributeDef.cpp";
 }
 
-VLXKDM_PROXY_DEFINITIONS(VLXKDMAttributeDef)
+VLXKDM_PROXY_DEFINITIONS(VLXKDMAttributeDef, AttributeDef)
 
 long VLXKDMAttributeDef::Build(const VLXUnicodeString& name, VLXKDMAttributeType::Type type)
 {
@@ -75,11 +75,8 @@ long VLXKDMAttributeDef::SetTargetNames(const VLXListOfVLXUnicodeString& names)
 
 long VLXKDMAttributeDef::SetTargetNames(int count, ...)
 {
-  va_list args;
-  va_start(args, count);
-  const VLXListValVLXUnicodeString names = GatherTexts(count, args);
-  va_end(args);
-  return SetTargetNames(names);
+  VLXKDM_GATHER_THEN(VLXListValVLXUnicodeString, GatherTexts, "VLXKDMAttributeDef::SetTargetNames(int, ...)",
+                     SetTargetNames);
 }
 
 long VLXKDMAttributeDef::GetTargetRefs(VLXListOfVLXUnicodeString& refs)
@@ -97,11 +94,8 @@ long VLXKDMAttributeDef::SetTargetRefs(const VLXListOfVLXUnicodeString& refs)
 
 long VLXKDMAttributeDef::SetTargetRefs(int count, ...)
 {
-  va_list args;
-  va_start(args, count);
-  const VLXListValVLXUnicodeString refs = GatherTexts(count, args);
-  va_end(args);
-  return SetTargetRefs(refs);
+  VLXKDM_GATHER_THEN(VLXListValVLXUnicodeString, GatherTexts, "VLXKDMAttributeDef::SetTargetRefs(int, ...)",
+                     SetTargetRefs);
 }
 
 long VLXKDMAttributeDef::GetAggregationType(VLXKDMAggregationType::Type& type)

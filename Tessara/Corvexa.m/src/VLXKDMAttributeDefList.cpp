@@ -5,7 +5,7 @@
 
 using namespace corvexa;
 
-VLXKDM_PROXY_DEFINITIONS(VLXKDMAttributeDefList)
+VLXKDM_PROXY_DEFINITIONS(VLXKDMAttributeDefList, AttributeDefList)
 
 long VLXKDMAttributeDefList::GetCount(int& count)
 {

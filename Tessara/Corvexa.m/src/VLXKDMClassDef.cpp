@@ -10,7 +10,7 @@ namespace {
 const char* const kSource = "Tessara\\Corvexa.m\\src\\VLXKDMClassDef.cpp";
 }
 
-VLXKDM_PROXY_DEFINITIONS(VLXKDMClassDef)
+VLXKDM_PROXY_DEFINITIONS(VLXKDMClassDef, ClassDef)
 
 long VLXKDMClassDef::Build(const VLXUnicodeString& name)
 {
@@ -94,11 +94,8 @@ long VLXKDMClassDef::SetScopeNames(const VLXListOfVLXUnicodeString& names)
 
 long VLXKDMClassDef::SetScopeNames(int count, ...)
 {
-  va_list args;
-  va_start(args, count);
-  const VLXListValVLXUnicodeString names = GatherTexts(count, args);
-  va_end(args);
-  return SetScopeNames(names);
+  VLXKDM_GATHER_THEN(VLXListValVLXUnicodeString, GatherTexts, "VLXKDMClassDef::SetScopeNames(int, ...)",
+                     SetScopeNames);
 }
 
 long VLXKDMClassDef::IsAbstract(VLXBoolean& isAbstract)

@@ -67,9 +67,42 @@ struct ResultOf<IdentifierOut> {
   }
 };
 
+// GetValue's out-parameter, with what names the attribute when it has no value.
+template <class Attribute>
+struct ValueOut {
+  VLXKDMInstanceValue& value;
+  VLXKDMInstance& instance;
+  const Attribute& attribute;
+  const char* operation;
+};
+
+inline std::string AttributeText(const VLXUnicodeString& name) { return std::string("'") + name.c_str() + "'"; }
+inline std::string AttributeText(int position) { return "at position " + std::to_string(position); }
+
+// "getValue" answers the attribute's Java value, or null when it has none: the holder is then left
+// as it was, and the failure names the attribute and the instance.
+template <class Attribute>
+struct ResultOf<ValueOut<Attribute>> {
+  using Raw = jobject;
+  static long Land(JNIEnv* env, jobject result, ValueOut<Attribute>& out, long) {
+    LocalRef owned(env, result);
+    if (result) return FrameAccess::Read(out.value, env, result);
+    VLXUnicodeString instance;
+    const LocalRef text(env, VLXJBXJNIHelper::CallObjectMethod(env, out.instance.GetHandle(),
+                                                               FrameAccess::Table()->Method(Instance_toString)));
+    if (VLXJBXJNIHelper::ExceptionCheck(env) ||
+        VLXJBXJNIConverter::BuildFromJavaString(env, static_cast<jstring>(text.get()), instance) < 0) {
+      VLXJBXJNIHelper::ExceptionClear(env);
+      instance = VLXUnicodeString("the instance");
+    }
+    return RejectValue(out.operation, "the attribute " + AttributeText(out.attribute) + " of " + instance.c_str() +
+                                          " has no value");
+  }
+};
+
 }  // namespace corvexa
 
-VLXKDM_PROXY_DEFINITIONS(VLXKDMInstance)
+VLXKDM_PROXY_DEFINITIONS(VLXKDMInstance, Instance)
 
 long VLXKDMInstance::GetClassDef(VLXKDMClassDef& classDef)
 {
@@ -148,17 +181,19 @@ long VLXKDMInstance::ToString(VLXBoolean withValues, VLXUnicodeString& text)
 
 long VLXKDMInstance::GetValue(const VLXUnicodeString& name, VLXKDMInstanceValue& value)
 {
-  return Call(*this, "VLXKDMInstance::GetValue(const VLXUnicodeString&, VLXKDMInstanceValue&)", Instance_getValueNamed)
+  const char* const text = "VLXKDMInstance::GetValue(const VLXUnicodeString&, VLXKDMInstanceValue&)";
+  return Call(*this, text, Instance_getValueNamed)
       .rawConversionCode()
       .with(name)
-      .returning(value);
+      .returning(ValueOut<VLXUnicodeString>{value, *this, name, text});
 }
 
 long VLXKDMInstance::GetValue(int position, VLXKDMInstanceValue& value)
 {
-  return Call(*this, "VLXKDMInstance::GetValue(int, VLXKDMInstanceValue&)", Instance_getValueAt)
+  const char* const text = "VLXKDMInstance::GetValue(int, VLXKDMInstanceValue&)";
+  return Call(*this, text, Instance_getValueAt)
       .with(position)
-      .returning(value);
+      .returning(ValueOut<int>{value, *this, position, text});
 }
 
 long VLXKDMInstance::SetValue(const VLXUnicodeString& name, VLXKDMInstanceValue& value)
@@ -346,7 +381,8 @@ long VLXKDMInstance::SetValue(int position, const VLXListOfVLXKDMInstance& value
 }
 
 // ---- Variadic setters ------------------------------------------------------------------------
-// Each gathers its count values, then runs its list twin; a null pointer gives the empty value.
+// Each gathers its count values, then runs its list twin. A null binary or text pointer gives the
+// empty value; a null time or instance pointer is refused, as a negative count is.
 
 namespace {
 
@@ -356,61 +392,59 @@ T ValueAt(const T* pointer)
   return pointer ? *pointer : T();
 }
 
-VLXListValVLXBinary GatherBinaries(int count, va_list args)
+long GatherBinaries(const char* operation, int count, va_list args, VLXListValVLXBinary& list)
 {
-  return Gather<VLXListValVLXBinary, const VLXBinary*>(count, args, ValueAt<VLXBinary>);
+  return Gather<const VLXBinary*>(operation, count, args, list, ValueAt<VLXBinary>);
 }
 
-VLXListValVLXBoolean GatherBooleans(int count, va_list args)
+long GatherBooleans(const char* operation, int count, va_list args, VLXListValVLXBoolean& list)
 {
-  return Gather<VLXListValVLXBoolean, int>(count, args, [](int b) { return static_cast<VLXBoolean>(b & 0xFF); });
+  // Any non-zero argument is true.
+  return Gather<int>(operation, count, args, list, [](int b) { return static_cast<VLXBoolean>(b != 0); });
 }
 
-VLXListValVLXTime GatherDates(int count, va_list args)
+long GatherDates(const char* operation, int count, va_list args, VLXListValVLXTime& list)
 {
-  return Gather<VLXListValVLXTime, const VLXTime*>(count, args, ValueAt<VLXTime>);
+  return Gather<const VLXTime*, true>(operation, count, args, list, ValueAt<VLXTime>);
 }
 
-VLXRawColldouble GatherDoubles(int count, va_list args)
+long GatherDoubles(const char* operation, int count, va_list args, VLXRawColldouble& list)
 {
-  return Gather<VLXRawColldouble, double>(count, args, [](double d) { return d; });
+  return Gather<double>(operation, count, args, list, [](double d) { return d; });
 }
 
-VLXListValVLXKDMInstance GatherInstances(int count, va_list args)
+long GatherInstances(const char* operation, int count, va_list args, VLXListValVLXKDMInstance& list)
 {
-  return Gather<VLXListValVLXKDMInstance, const VLXKDMInstance*>(count, args, ValueAt<VLXKDMInstance>);
+  return Gather<const VLXKDMInstance*, true>(operation, count, args, list, ValueAt<VLXKDMInstance>);
 }
 
-VLXRawCollint GatherIntegers(int count, va_list args)
+long GatherIntegers(const char* operation, int count, va_list args, VLXRawCollint& list)
 {
-  return Gather<VLXRawCollint, int>(count, args, [](int n) { return n; });
+  return Gather<int>(operation, count, args, list, [](int n) { return n; });
 }
 
 }  // namespace
 
-#define VLXKDM_VARIADIC_SETTER(Operation, Attribute, gather) \
-  long VLXKDMInstance::Operation(Attribute attribute, int count, ...) \
-  {                                                                   \
-    va_list args;                                                     \
-    va_start(args, count);                                            \
-    const auto values = gather(count, args);                          \
-    va_end(args);                                                     \
-    return SetValue(attribute, values);                               \
+#define VLXKDM_VARIADIC_SETTER(Operation, Attribute, List, gather)                                   \
+  long VLXKDMInstance::Operation(Attribute attribute, int count, ...)                                \
+  {                                                                                                  \
+    VLXKDM_GATHER_THEN(List, gather, "VLXKDMInstance::" #Operation "(" #Attribute ", int, ...)",     \
+                       [&](const List& list) { return SetValue(attribute, list); });                 \
   }
 
-VLXKDM_VARIADIC_SETTER(SetValueBinaries, const VLXUnicodeString&, GatherBinaries)
-VLXKDM_VARIADIC_SETTER(SetValueBinaries, int, GatherBinaries)
-VLXKDM_VARIADIC_SETTER(SetValueBooleans, const VLXUnicodeString&, GatherBooleans)
-VLXKDM_VARIADIC_SETTER(SetValueBooleans, int, GatherBooleans)
-VLXKDM_VARIADIC_SETTER(SetValueDates, const VLXUnicodeString&, GatherDates)
-VLXKDM_VARIADIC_SETTER(SetValueDates, int, GatherDates)
-VLXKDM_VARIADIC_SETTER(SetValueDoubles, const VLXUnicodeString&, GatherDoubles)
-VLXKDM_VARIADIC_SETTER(SetValueDoubles, int, GatherDoubles)
-VLXKDM_VARIADIC_SETTER(SetValueInstances, const VLXUnicodeString&, GatherInstances)
-VLXKDM_VARIADIC_SETTER(SetValueInstances, int, GatherInstances)
-VLXKDM_VARIADIC_SETTER(SetValueIntegers, const VLXUnicodeString&, GatherIntegers)
-VLXKDM_VARIADIC_SETTER(SetValueIntegers, int, GatherIntegers)
-VLXKDM_VARIADIC_SETTER(SetValueStrings, const VLXUnicodeString&, GatherTexts)
-VLXKDM_VARIADIC_SETTER(SetValueStrings, int, GatherTexts)
+VLXKDM_VARIADIC_SETTER(SetValueBinaries, const VLXUnicodeString&, VLXListValVLXBinary, GatherBinaries)
+VLXKDM_VARIADIC_SETTER(SetValueBinaries, int, VLXListValVLXBinary, GatherBinaries)
+VLXKDM_VARIADIC_SETTER(SetValueBooleans, const VLXUnicodeString&, VLXListValVLXBoolean, GatherBooleans)
+VLXKDM_VARIADIC_SETTER(SetValueBooleans, int, VLXListValVLXBoolean, GatherBooleans)
+VLXKDM_VARIADIC_SETTER(SetValueDates, const VLXUnicodeString&, VLXListValVLXTime, GatherDates)
+VLXKDM_VARIADIC_SETTER(SetValueDates, int, VLXListValVLXTime, GatherDates)
+VLXKDM_VARIADIC_SETTER(SetValueDoubles, const VLXUnicodeString&, VLXRawColldouble, GatherDoubles)
+VLXKDM_VARIADIC_SETTER(SetValueDoubles, int, VLXRawColldouble, GatherDoubles)
+VLXKDM_VARIADIC_SETTER(SetValueInstances, const VLXUnicodeString&, VLXListValVLXKDMInstance, GatherInstances)
+VLXKDM_VARIADIC_SETTER(SetValueInstances, int, VLXListValVLXKDMInstance, GatherInstances)
+VLXKDM_VARIADIC_SETTER(SetValueIntegers, const VLXUnicodeString&, VLXRawCollint, GatherIntegers)
+VLXKDM_VARIADIC_SETTER(SetValueIntegers, int, VLXRawCollint, GatherIntegers)
+VLXKDM_VARIADIC_SETTER(SetValueStrings, const VLXUnicodeString&, VLXListValVLXUnicodeString, GatherTexts)
+VLXKDM_VARIADIC_SETTER(SetValueStrings, int, VLXListValVLXUnicodeString, GatherTexts)
 
 #undef VLXKDM_VARIADIC_SETTER

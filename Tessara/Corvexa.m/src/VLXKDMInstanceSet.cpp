@@ -5,7 +5,7 @@
 
 using namespace corvexa;
 
-VLXKDM_PROXY_DEFINITIONS(VLXKDMInstanceSet)
+VLXKDM_PROXY_DEFINITIONS(VLXKDMInstanceSet, InstanceSet)
 
 long VLXKDMInstanceSet::GetCount(int& count)
 {

@@ -6,6 +6,7 @@
 
 #include "CallFrame.h"
 #include "VLXFatalError.h"
+#include "VLXJBXJNIUtilities.h"
 
 using namespace corvexa;
 
@@ -23,6 +24,7 @@ const char* const kBuildLocal = "VLXKDMInstanceValue::BuildLocal()";
 const char* const kBuildRemote = "VLXKDMInstanceValue::BuildRemote()";
 const char* const kClean = "VLXKDMInstanceValue::Clean()";
 const char* const kInternalBuild = "VLXKDMInstanceValue::InternalBuild(jobject&)";
+const char* const kSetHandle = "VLXKDMInstanceValue::SetHandle(JNIEnv*, jobject)";
 
 // Emptying a member when the value leaves its type: lists are emptied, a text becomes empty, an
 // instance drops its Java object; the other single values stay as they are.
@@ -46,15 +48,24 @@ struct VLXKDMInstanceValue::Dispatch {
     Type type;
     bool isArray;
     Slot javaClass;                                   // the exact class of the remote form
-    long (*build)(JNIEnv*, jobject, V&);              // Java object to the member
+    long (*build)(JNIEnv*, jobject, V&, bool);        // Java object to the member (and the handle)
     long (*convert)(JNIEnv*, V&, jobject&);           // the member to a new Java object
     void (*empty)(JNIEnv*, V&);                       // the member emptied
     const char* getterText;                           // the getter's precondition, as reported
     int getterLine;
   };
 
+  // Converts object aside; only when that succeeds (and, with attach, the value holds object) does
+  // the member change: a failure leaves the value as it was.
   template <class T, T V::*M>
-  static long Build(JNIEnv* env, jobject object, V& value) { return Values::BuildFromJavaType(env, object, value.*M); }
+  static long Build(JNIEnv* env, jobject object, V& value, bool attach)
+  {
+    T built{};
+    long status = Values::BuildFromJavaType(env, object, built);
+    if (status >= 0 && attach) status = value.ReplaceGlobalRef(env, object);
+    if (status >= 0) value.*M = std::move(built);
+    return status;
+  }
   template <class T, T V::*M>
   static long Convert(JNIEnv* env, V& value, jobject& object) { return Values::ConvertToJavaType(env, value.*M, object); }
   template <class T, T V::*M>
@@ -67,6 +78,15 @@ struct VLXKDMInstanceValue::Dispatch {
   {
     for (const Row& row : kRows)
       if (row.type == type && row.isArray == isArray) return &row;
+    return nullptr;
+  }
+
+  // The row of object's exact Java class, or null.
+  static const Row* Recognise(JNIEnv* env, const ReplicaStubs& st, jobject object)
+  {
+    LocalRef cls(env, H::GetObjectClass(env, object));
+    for (const Row& row : kRows)
+      if (H::IsSameObject(env, cls.get(), st.Class(row.javaClass))) return &row;
     return nullptr;
   }
 
@@ -149,29 +169,45 @@ long VLXKDMInstanceValue::BuildLocal()
   const ReplicaStubs* st = FrameAccess::Table();
   if (!st) return VLX_E_FAIL;
   if (!st->IsBound()) return st->ReportUnbound(kBuildLocal);
+  return Read(env, GetHandle(), false);
+}
 
-  _isSynchronized = false;
-  _type = static_cast<Type>(-1);
-  const Dispatch::Row* found = nullptr;
-  {
-    LocalRef cls(env, H::GetObjectClass(env, GetHandle()));
-    for (const Dispatch::Row& row : Dispatch::kRows) {
-      if (H::IsSameObject(env, cls.get(), st->Class(row.javaClass))) {
-        found = &row;
-        break;
-      }
-    }
-  }
-  if (!found) {
+long VLXKDMInstanceValue::Read(JNIEnv* env, jobject object, bool attach)
+{
+  const Dispatch::Row* row = Dispatch::Recognise(env, *FrameAccess::Table(), object);
+  if (!row) {
     VLXFatalError("AssertionFailed:_type != (Type) -1", nullptr, nullptr, nullptr, kSource, kLineUnknownClass);
     return HandleReplicaError(
         env, RejectValue(kBuildLocal, "the Java object is of none of the classes of an attribute value"), kBuildLocal);
   }
-  _type = found->type;
-  _isArray = found->isArray;
-  const long status = found->build(env, GetHandle(), *this);
-  _isSynchronized = status >= 0;
-  return status;
+  const long status = row->build(env, object, *this, attach);
+  if (status < 0) return status;
+  _type = row->type;
+  _isArray = row->isArray;
+  _isSynchronized = true;
+  return VLX_S_OK;
+}
+
+long VLXKDMInstanceValue::AcceptObject(JNIEnv* env, jobject object)
+{
+  // Whatever happens, the Java object no longer stands for the local value.
+  _isSynchronized = false;
+  const ReplicaStubs* st = FrameAccess::Table();
+  if (!st || !st->IsBound()) {
+    long status = VLX_S_OK;
+    JNIEnv* started = nullptr;
+    if ((status = InitJava(started, kSetHandle)) < 0) return status;
+    if (!(st = FrameAccess::Table())) return VLX_E_FAIL;
+    if (!st->IsBound()) return st->ReportUnbound(kSetHandle);
+  }
+  if (Dispatch::Recognise(env, *st, object)) return VLX_S_OK;
+  VLXUnicodeString actual;
+  const std::string why = "the Java object is " +
+                          (VLXJBXJNIUtilities::GetClassName(env, object, actual) < 0
+                               ? std::string("of a class whose name cannot be read")
+                               : std::string("a ") + actual.c_str()) +
+                          ", none of the classes of an attribute value";
+  return RejectValue(kSetHandle, why);
 }
 
 long VLXKDMInstanceValue::BuildRemote()
@@ -179,7 +215,8 @@ long VLXKDMInstanceValue::BuildRemote()
   JNIEnv* env = nullptr;
   long status = InitJava(env, kBuildRemote);
   if (status < 0) return HandleReplicaError(env, status, kBuildRemote);
-  if (_isSynchronized) return VLX_S_OK;
+  // A value whose Java object was released is made again: a value never goes to Java as null.
+  if (_isSynchronized && GetHandle()) return VLX_S_OK;
 
   jobject object = nullptr;
   status = InternalBuild(object);

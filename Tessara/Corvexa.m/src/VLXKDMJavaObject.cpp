@@ -2,7 +2,9 @@
 #include "VLXKDMJavaObject.h"
 
 #include <cstdio>
+#include <string>
 
+#include "CallFrame.h"
 #include "ReplicaStubs.h"
 #include "VLXError.h"
 #include "VLXJBXException.h"
@@ -41,13 +43,22 @@ class MaybeLocked {
   VLXMutex* _mutex;
 };
 
-// Raises a new error of our catalog naming methodName as the thread's last error.
-long RaiseNew(const char* messageId, const char* methodName, int line) {
+// Raises a new error of our catalog naming methodName and the cause as the thread's last error.
+long RaiseNew(const char* messageId, const char* methodName, const VLXUnicodeString& cause, int line) {
   VLXJBXException* error = new VLXJBXException(messageId, kCatalog);
-  const VLXUnicodeString parameter(methodName);
-  error->SetNLSRequestParams(1, &parameter);
+  const VLXUnicodeString parameters[2] = {VLXUnicodeString(methodName), cause};
+  error->SetNLSRequestParams(2, parameters);
   VLXError::VLXCleanLastError();
   return VLXError::GetReturn(2, error, nullptr, kSourcePath, line);
+}
+
+// The text of the error that the current operation recorded, or the given text when it recorded none.
+VLXUnicodeString OwnCause(const char* otherwise) {
+  VLXError* own = VLXError::VLXGetOperationError();
+  if (!own) return VLXUnicodeString(otherwise);
+  VLXUnicodeString text = own->GetMessageText();
+  own->Release();
+  return text;
 }
 
 }  // namespace
@@ -75,11 +86,15 @@ long VLXKDMJavaObject::InitJava(JNIEnv*& env, const char* methodName)
   const bool starting =
       _javaInitDone.load(std::memory_order_acquire) == 0 || !table || !table->IsSettled();
   MaybeLocked lock(_mutex, starting);
+  // Errors recorded before this operation are not its own.
+  VLXError::MarkOperationStart();
 
   long status = VLXJBXJNIUtilities::GetJNIEnv(env, VLXListValVLXUnicodeString());
   if (status < 0 || !env) {
-    printf("Error VLXJBXJNIUtilities::GetJNIEnv\n");
-  } else if (!_st.load(std::memory_order_acquire)) {
+    fprintf(stderr, "Error VLXJBXJNIUtilities::GetJNIEnv\n");
+  } else if (!_st.load(std::memory_order_acquire) && !VLXJBXJNIHelper::ExceptionCheck(env)) {
+    // An exception the caller left pending fails this call (below) and does not start the Java
+    // side: binding with it pending would fail and mark the table unusable for good.
     status = StartJavaSide(env);
   }
   _javaInitDone.store(1, std::memory_order_release);
@@ -92,15 +107,15 @@ long VLXKDMJavaObject::StartJavaSide(JNIEnv* env)
 {
   ReplicaStubs* table = new ReplicaStubs;
   _st.store(table, std::memory_order_release);
-  if (table->init(env) < 0) printf("Error ReplicaStubs::Init\n");
+  if (table->init(env) < 0) fprintf(stderr, "Error ReplicaStubs::Init\n");
 
   // Check the environment with one string conversion.
   const VLXUnicodeString text("String or initialization");
   jstring probe = nullptr;
   const long status = VLXJBXJNIConverter::ConvertToJavaType(env, text, probe);
   if (status < 0) {
-    printf("Error VLXJBXJNIConverter::ConvertToJavaType replicaName\n");
-    fflush(stdout);
+    fprintf(stderr, "Error VLXJBXJNIConverter::ConvertToJavaType replicaName\n");
+    fflush(stderr);
   } else {
     VLXJBXJNIHelper::DeleteLocalRef(env, probe);
   }
@@ -109,18 +124,23 @@ long VLXKDMJavaObject::StartJavaSide(JNIEnv* env)
 
 long VLXKDMJavaObject::InitJavaAndTestIsBuilt(JNIEnv*& env, const char* methodName)
 {
-  long status = InitJava(env, methodName);
+  const long status = InitJava(env, methodName);
   // A successful start has just found no Java exception pending: a built proxy needs no more.
-  if (status >= 0 && GetHandle()) return VLX_S_OK;
-  if (status >= 0) status = VLX_E_FAIL;
-  return HandleReplicaError(env, status, methodName);
+  if (status < 0 || GetHandle()) return status;
+  MaybeLocked lock(_mutex, true);
+  return RaiseNew("VLXJBXInfraERR_1003", methodName,
+                  VLXUnicodeString("the object is not attached to a Java object (it was never built, or its "
+                                   "Java object was released)"),
+                  kLineNewError);
 }
 
 long VLXKDMJavaObject::HandleReplicaError(JNIEnv* env, long status, const char* methodName)
 {
   if (!env) {
     MaybeLocked lock(_mutex, true);
-    return RaiseNew("VLXJBXInfraERR_1002", methodName, kLineNoEnvironment);
+    // The bridge's own account (the JVM's options and code, the class path) becomes the cause.
+    return RaiseNew("VLXJBXInfraERR_1002", methodName, OwnCause("the Java bridge recorded no cause"),
+                    kLineNoEnvironment);
   }
   if (VLXJBXJNIHelper::ExceptionCheck(env)) {
     MaybeLocked lock(_mutex, true);
@@ -128,12 +148,41 @@ long VLXKDMJavaObject::HandleReplicaError(JNIEnv* env, long status, const char* 
   }
   if (status >= 0) return VLXError::GetReturn(1, nullptr, nullptr, kSourcePath, kLineSuccess);
 
+  // The error that this operation's failure recorded is kept; one recorded by an earlier operation
+  // never describes this one.
   MaybeLocked lock(_mutex, true);
-  if (VLXError* pending = VLXError::VLXGetLastError(VLX_E_FAIL, nullptr)) {
+  if (VLXError* own = VLXError::VLXGetOperationError()) {
     VLXError::VLXCleanLastError();
-    return VLXError::GetReturn(2, pending, nullptr, kSourcePath, kLineReRaise);
+    return VLXError::GetReturn(2, own, nullptr, kSourcePath, kLineReRaise);
   }
-  return RaiseNew("VLXJBXInfraERR_1003", methodName, kLineNewError);
+  const std::string cause = "it failed with the code " + std::to_string(status) + " and recorded no cause";
+  return RaiseNew("VLXJBXInfraERR_1003", methodName, VLXUnicodeString(cause.c_str()), kLineNewError);
+}
+
+long VLXKDMJavaObject::CheckJavaClass(JNIEnv* env, jobject object, int javaClass, const char* operation)
+{
+  const ReplicaStubs* st = _st.load(std::memory_order_acquire);
+  if (!st || !st->IsBound()) {  // an object attached before any operation started the Java side
+    JNIEnv* started = nullptr;
+    if (InitJava(started, operation) < 0) return VLX_E_FAIL;
+    st = _st.load(std::memory_order_acquire);
+    if (!st) return VLX_E_FAIL;
+    if (!st->IsBound()) return st->ReportUnbound(operation);
+  }
+  if (!object) return corvexa::RejectValue(operation, "the Java object is null");
+  const corvexa::Slot slot = static_cast<corvexa::Slot>(javaClass);
+  if (VLXJBXJNIHelper::IsInstanceOf(env, object, st->Class(slot))) return VLX_S_OK;
+
+  std::string expected = ReplicaStubs::ClassPath(slot);
+  for (char& c : expected)
+    if (c == '/') c = '.';
+  VLXUnicodeString actual;
+  const std::string why =
+      "the Java object is " +
+      (VLXJBXJNIUtilities::GetClassName(env, object, actual) < 0 ? std::string("of a class whose name cannot be read")
+                                                                 : std::string("a ") + actual.c_str()) +
+      ", not a " + expected;
+  return corvexa::RejectValue(operation, why);
 }
 
 extern "C" int VELMORA_QKA2_INTERNAL_Corvexa() { return 1; }

@@ -6,7 +6,7 @@
 
 using namespace corvexa;
 
-VLXKDM_PROXY_DEFINITIONS(VLXKDMModel)
+VLXKDM_PROXY_DEFINITIONS(VLXKDMModel, Model)
 
 long VLXKDMModel::Build(const VLXKDMClassDef& classDef)
 {

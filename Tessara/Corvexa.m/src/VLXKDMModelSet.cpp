@@ -5,7 +5,7 @@
 
 using namespace corvexa;
 
-VLXKDM_PROXY_DEFINITIONS(VLXKDMModelSet)
+VLXKDM_PROXY_DEFINITIONS(VLXKDMModelSet, ModelSet)
 
 long VLXKDMModelSet::GetCount(int& count)
 {

@@ -6,7 +6,7 @@
 
 using namespace corvexa;
 
-VLXKDM_PROXY_DEFINITIONS(VLXKDMReplica)
+VLXKDM_PROXY_DEFINITIONS(VLXKDMReplica, Replica)
 
 long VLXKDMReplica::Build()
 {
@@ -191,6 +191,8 @@ long VLXKDMReplica::BuildFromJavaHolder(JNIEnv* env, jobject holder)
   long status = VLX_S_OK;
   const ReplicaStubs* st = FrameAccess::StartJavaFacing(env, name, status);
   if (!st) return status;
+  const long checked = CheckJavaClass(env, holder, ReplicaHolder, name);
+  if (checked < 0) return checked;
   const LocalRef replica(env, VLXJBXJNIHelper::CallObjectMethod(env, holder, st->Method(ReplicaHolder_getValue)));
   if (VLXJBXJNIHelper::ExceptionCheck(env)) {
     status = VLX_E_FAIL;
@@ -207,6 +209,10 @@ long VLXKDMReplica::ConvertToJavaHolder(JNIEnv* env, jobject& holder)
   long status = VLX_S_OK;
   const ReplicaStubs* st = FrameAccess::StartJavaFacing(env, name, status);
   if (!st) return status;
+  if (holder) {
+    const long checked = CheckJavaClass(env, holder, ReplicaHolder, name);
+    if (checked < 0) return checked;
+  }
 
   // A holder made here is handed out only when it holds the replica.
   LocalRef created(env, holder ? nullptr

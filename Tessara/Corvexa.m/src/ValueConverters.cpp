@@ -66,11 +66,17 @@ const ReplicaStubs* TableFor(const char* name, long& status)
   return st;
 }
 
-// A Java date's milliseconds as whole seconds: (ms + 500) / 1000, the quotient rounded toward zero.
+// A Java date's milliseconds as the nearest whole second, halves rounded up: floor((ms + 500) / 1000),
+// computed without overflow at the ends of the 64-bit range. Every whole second comes back as it was.
 time_t Seconds(jlong ms)
 {
-  if (ms > LLONG_MAX - 500) return static_cast<time_t>(ms / 1000 + (ms % 1000 + 500) / 1000);
-  return static_cast<time_t>((ms + 500) / 1000);
+  long long seconds = ms / 1000;  // rounded toward zero
+  long long rest = ms % 1000;     // same sign as ms
+  if (rest < 0) {                 // floor division
+    seconds -= 1;
+    rest += 1000;
+  }
+  return static_cast<time_t>(rest >= 500 ? seconds + 1 : seconds);
 }
 
 // A time's seconds as a Java date's milliseconds; false when they do not fit in 64 bits.
@@ -233,8 +239,8 @@ long VLXKDMJavaObject::ConvertToJavaType(JNIEnv* env, double input, jobject& out
 
 long VLXKDMJavaObject::ConvertToJavaType(JNIEnv* env, VLXBoolean input, jobject& output)
 {
-  // The byte as it is, not narrowed to 0 or 1.
-  return ConvertScalar(env, Boolean, Boolean_new, static_cast<jboolean>(input), output, kConvertBoolean);
+  // Any non-zero byte is true: Java sees only 0 or 1.
+  return ConvertScalar(env, Boolean, Boolean_new, static_cast<jboolean>(input != 0), output, kConvertBoolean);
 }
 
 long VLXKDMJavaObject::ConvertToJavaType(JNIEnv* env, const VLXTime& input, jobject& output)
