@@ -7,6 +7,8 @@
 //      back, and check that every value survived;
 // and show how a failure comes back. Usage: corvexa-example [directory of the sample data]
 #include <cstdio>
+#include <initializer_list>
+#include <iterator>
 #include <string>
 #include <vector>
 
@@ -21,6 +23,8 @@
 #include "VLXKDMModelSet.h"
 #include "VLXKDMReplica.h"
 #include "VLXListValVLXKDMInstance.h"
+#include "VLXRawColldouble.h"
+#include "VLXRawCollint.h"
 
 #ifndef CORVEXA_EXAMPLES_DIR
 #define CORVEXA_EXAMPLES_DIR "examples"
@@ -188,32 +192,56 @@ VLXTime Time(time_t seconds)
   return t;
 }
 
-// Sets the fourteen values of sensor number n; next and peers point at the given sensors.
-long Fill(VLXKDMInstance& sensor, int n, const VLXKDMInstance& next, const VLXListOfVLXKDMInstance& peers)
+template <class List, class T>
+List ListOf(std::initializer_list<T> values)
+{
+  List list;
+  for (const T& v : values) list.Append(v);
+  return list;
+}
+
+// The fourteen values of sensor number n, in the order of kSensorAttributes, as the program means
+// them: what Fill writes and what every copy of the replica must hold. Times before 1970 included.
+std::vector<VLXKDMInstanceValue> Written(int n, const VLXKDMInstance& next, const VLXListOfVLXKDMInstance& peers)
 {
   const unsigned char firmware[] = {0x00, 0xFF, static_cast<unsigned char>(n), 0x7F};
-  VLXListOfVLXTime serviced;
-  serviced.Append(Time(1700000000 + n));
-  serviced.Append(Time(-86400L * n));
-  VLXListOfVLXBinary blobs;
-  blobs.Append(VLXBinary(firmware, 4));
-  blobs.Append(VLXBinary());
+  std::vector<VLXKDMInstanceValue> v(14);
+  v[0].SetInteger(1000 + n);
+  v[1].SetListOfInteger(ListOf<VLXRawCollint>({n, -n, 2147483647}));
+  v[2].SetDouble(20.5 + n / 3.0);
+  v[3].SetListOfDouble(ListOf<VLXRawColldouble>({-0.0, 1e-300}));
+  v[4].SetString(U("Sensor n\xC2\xB0" + std::to_string(n) + " \xE2\x9C\x93 \xF0\x9F\x8C\xA1"));
+  v[5].SetListOfString(ListOf<VLXListValVLXUnicodeString>({VLXUnicodeString("indoor"), VLXUnicodeString("<a & b>")}));
+  v[6].SetDate(Time(1262304000L + 3600L * n));
+  v[7].SetListOfDate(ListOf<VLXListOfVLXTime>({Time(1700000000 + n), Time(-86400L * n - 1)}));
+  v[8].SetBoolean(static_cast<VLXBoolean>(n % 2));
+  v[9].SetListOfBoolean(ListOf<VLXListValVLXBoolean>({VLXBoolean(1), VLXBoolean(0), VLXBoolean(1)}));
+  v[10].SetBinary(VLXBinary(firmware, 4));
+  v[11].SetListOfBinary(ListOf<VLXListOfVLXBinary>({VLXBinary(firmware, 4), VLXBinary()}));
+  v[12].SetInstance(next);
+  v[13].SetListOfInstance(peers);
+  return v;
+}
+
+// Sets the fourteen values of sensor number n with the typed and the variadic setters.
+long Fill(VLXKDMInstance& sensor, int n, const std::vector<VLXKDMInstanceValue>& v)
+{
   const long results[] = {
       sensor.SetID(U("S-" + std::to_string(n))),
-      sensor.SetValue(VLXUnicodeString("serial"), 1000 + n),
+      sensor.SetValue(VLXUnicodeString("serial"), v[0].GetInteger()),
       sensor.SetValueIntegers(VLXUnicodeString("counts"), 3, n, -n, 2147483647),
-      sensor.SetValue(VLXUnicodeString("reading"), 20.5 + n / 3.0),
+      sensor.SetValue(VLXUnicodeString("reading"), v[2].GetDouble()),
       sensor.SetValueDoubles(VLXUnicodeString("history"), 2, -0.0, 1e-300),
-      sensor.SetValue(VLXUnicodeString("label"), U("Sensor n\xC2\xB0" + std::to_string(n) + " \xE2\x9C\x93 \xF0\x9F\x8C\xA1")),
+      sensor.SetValue(VLXUnicodeString("label"), v[4].GetString()),
       sensor.SetValueStrings(VLXUnicodeString("tags"), 2, "indoor", "<a & b>"),
-      sensor.SetValue(VLXUnicodeString("installed"), Time(1262304000L + 3600L * n)),
-      sensor.SetValue(VLXUnicodeString("serviced"), serviced),
-      sensor.SetValue(VLXUnicodeString("active"), static_cast<VLXBoolean>(n % 2)),
+      sensor.SetValue(VLXUnicodeString("installed"), v[6].GetDate()),
+      sensor.SetValue(VLXUnicodeString("serviced"), v[7].GetListOfDate()),
+      sensor.SetValue(VLXUnicodeString("active"), v[8].GetBoolean()),
       sensor.SetValueBooleans(VLXUnicodeString("flags"), 3, 1, 0, 1),
-      sensor.SetValue(VLXUnicodeString("firmware"), VLXBinary(firmware, 4)),
-      sensor.SetValue(VLXUnicodeString("blobs"), blobs),
-      sensor.SetValue(VLXUnicodeString("next"), next),
-      sensor.SetValue(VLXUnicodeString("peers"), peers),
+      sensor.SetValue(VLXUnicodeString("firmware"), v[10].GetBinary()),
+      sensor.SetValue(VLXUnicodeString("blobs"), v[11].GetListOfBinary()),
+      sensor.SetValue(VLXUnicodeString("next"), v[12].GetInstance()),
+      sensor.SetValue(VLXUnicodeString("peers"), v[13].GetListOfInstance()),
   };
   for (long rc : results)
     if (VLX_FAILED(rc)) return rc;
@@ -232,11 +260,12 @@ std::string Id(const VLXKDMInstance& instance)
 
 // Whether two values hold the same data; instances compare by their identifiers, since the two
 // replicas hold different Java objects.
-bool SameValue(VLXKDMInstanceValue& a, VLXKDMInstanceValue& b)
+bool SameValue(const VLXKDMInstanceValue& a, VLXKDMInstanceValue& b)
 {
-  if (a.GetType() != b.GetType() || a.IsMultiValuated() != b.IsMultiValuated()) return false;
+  if (const_cast<VLXKDMInstanceValue&>(a).GetType() != b.GetType() || a.IsMultiValuated() != b.IsMultiValuated())
+    return false;
   const bool list = a.IsMultiValuated();
-  switch (a.GetType()) {
+  switch (b.GetType()) {
     case VLXKDMInstanceValue::IntegerType:
       return list ? a.GetListOfInteger() == b.GetListOfInteger() : a.GetInteger() == b.GetInteger();
     case VLXKDMInstanceValue::DoubleType:
@@ -277,20 +306,20 @@ std::vector<VLXKDMInstance> Sensors(VLXKDMReplica& replica)
   return out;
 }
 
-// Compares every value of every sensor of copy with the original's; prints and counts differences.
-void Compare(const char* how, VLXKDMReplica& original, VLXKDMReplica& copy)
+// Compares every value of every sensor of a replica with the values written (not with another
+// read, which could repeat the same change); prints and counts differences.
+void Compare(const char* how, const std::vector<std::vector<VLXKDMInstanceValue>>& written, VLXKDMReplica& copy)
 {
-  std::vector<VLXKDMInstance> a = Sensors(original), b = Sensors(copy);
-  int compared = 0, different = a.size() == b.size() ? 0 : 1;
-  for (size_t i = 0; i < a.size() && i < b.size(); ++i) {
-    for (const SensorAttribute& wanted : kSensorAttributes) {
-      VLXKDMInstanceValue x, y;
-      const bool readA = VLX_SUCCEEDED(a[i].GetValue(VLXUnicodeString(wanted.name), x));
-      const bool readB = VLX_SUCCEEDED(b[i].GetValue(VLXUnicodeString(wanted.name), y));
+  std::vector<VLXKDMInstance> b = Sensors(copy);
+  int compared = 0, different = written.size() == b.size() ? 0 : 1;
+  for (size_t i = 0; i < written.size() && i < b.size(); ++i) {
+    for (size_t k = 0; k < std::size(kSensorAttributes); ++k) {
+      VLXKDMInstanceValue y;
+      const bool read = VLX_SUCCEEDED(b[i].GetValue(VLXUnicodeString(kSensorAttributes[k].name), y));
       ++compared;
-      if (!readA || !readB || !SameValue(x, y)) {
+      if (!read || !SameValue(written[i][k], y)) {
         ++different;
-        std::printf("      %s of %s differs\n", wanted.name, Id(a[i]).c_str());
+        std::printf("      %s of %s differs\n", kSensorAttributes[k].name, Id(b[i]).c_str());
       }
     }
   }
@@ -313,12 +342,15 @@ bool DataOfEveryType(VLXKDMReplica& replica)
   for (VLXKDMInstance& sensor : sensors)
     if (VLX_SUCCEEDED(rc)) rc = model.CreateInstance(sensor);
   if (!Must("Create 5 sensors", rc)) return false;
+  std::vector<std::vector<VLXKDMInstanceValue>> written;
   for (int n = 0; n < kSensors && VLX_SUCCEEDED(rc); ++n) {
     VLXListOfVLXKDMInstance peers;
     for (int p = 0; p < n; ++p) peers.Append(sensors[static_cast<size_t>(p)]);
-    rc = Fill(sensors[static_cast<size_t>(n)], n, sensors[static_cast<size_t>((n + 1) % kSensors)], peers);
+    written.push_back(Written(n, sensors[static_cast<size_t>((n + 1) % kSensors)], peers));
+    rc = Fill(sensors[static_cast<size_t>(n)], n, written.back());
   }
   if (!Must("Fill 5 sensors with 14 values each", rc) || !Must("Commit", replica.Commit())) return false;
+  Compare("the replica itself", written, replica);
 
   VLXUnicodeString xml;
   VLXKDMReplica fromXml;
@@ -326,7 +358,7 @@ bool DataOfEveryType(VLXKDMReplica& replica)
       !Must("Read that XML into a new replica", VLXKDMReplica::ReadFromXmlString(xml, fromXml)))
     return false;
   std::printf("      %d bytes of XML\n", xml.GetLengthInByte());
-  Compare("XML", replica, fromXml);
+  Compare("XML", written, fromXml);
 
   for (VLXBoolean compressed : {VLXBoolean(0), VLXBoolean(1)}) {
     VLXBinary bytes;
@@ -336,7 +368,7 @@ bool DataOfEveryType(VLXKDMReplica& replica)
         !Must("Read those bytes into a new replica", VLXKDMReplica::GetReplicaFromBinary(bytes, compressed, fromBytes)))
       return false;
     std::printf("      %d bytes\n", bytes.getLength());
-    Compare(compressed ? "compressed bytes" : "bytes", replica, fromBytes);
+    Compare(compressed ? "compressed bytes" : "bytes", written, fromBytes);
   }
   return true;
 }
