@@ -37,6 +37,7 @@
 #include "VLXFatalError.h"
 #include "VLXJBXException.h"
 #include "VLXJBXJNIHelper.h"
+#include "VLXJBXJNIUtilities.h"
 #include "VLXKDMInstance.h"
 #include "VLXKDMInstanceValue.h"
 #include "VLXKDMJavaObject.h"
@@ -79,6 +80,20 @@ class FrameAccess {
     return self ? self->InitJavaAndTestIsBuilt(env, name) : VLXKDMJavaObject::InitJava(env, name);
   }
   static ReplicaStubs* Table() { return VLXKDMJavaObject::_st.load(std::memory_order_acquire); }
+  // The bound table for an object attached outside any operation (the Java side is started if no
+  // operation has started it); null with the failure in status.
+  static const ReplicaStubs* BoundTable(const char* operation, long& status) {
+    const ReplicaStubs* st = Table();
+    if (!st || !st->IsBound()) {
+      JNIEnv* started = nullptr;
+      status = VLXKDMJavaObject::InitJava(started, operation);
+      if (status < 0) return nullptr;
+      st = Table();
+      status = !st ? VLX_E_FAIL : !st->IsBound() ? st->ReportUnbound(operation) : VLX_S_OK;
+      if (status < 0) return nullptr;
+    }
+    return st;
+  }
   // Attaches proxy to object, whose Java class the binding table's method signature establishes.
   static long Attach(VLXKDMJavaObject& proxy, JNIEnv* env, jobject object) {
     return proxy.ReplaceGlobalRef(env, object);
@@ -371,6 +386,13 @@ struct Values : VLXKDMJavaObject {
     return VLXJBXJNIConverter::BuildFromJavaType(env, input, output);
   }
 };
+
+// The Java class of object (not null) for an error text: "a java.lang.Long".
+inline std::string ClassText(JNIEnv* env, jobject object) {
+  VLXUnicodeString name;
+  return VLXJBXJNIUtilities::GetClassName(env, object, name) < 0 ? std::string("of a class whose name cannot be read")
+                                                                 : std::string("a ") + name.c_str();
+}
 
 // Records that operation was given a value it cannot take (why says which and why) as the thread's
 // last error; returns VLX_E_INVALIDARG.

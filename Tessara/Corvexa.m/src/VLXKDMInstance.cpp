@@ -26,12 +26,8 @@ struct IdentifierOut {
 // returns VLX_E_FAIL.
 inline long RejectIdentifier(JNIEnv* env, jobject identifier, const char* name)
 {
-  VLXUnicodeString javaName;
-  const std::string what = "the identifier is " +
-                           (VLXJBXJNIUtilities::GetClassName(env, identifier, javaName) < 0
-                                ? std::string("of a Java class whose name cannot be read")
-                                : std::string("a ") + javaName.c_str()) +
-                           ", neither a java.lang.String nor a byte array";
+  const std::string what =
+      "the identifier is " + ClassText(env, identifier) + ", neither a java.lang.String nor a byte array";
   VLXJBXException* error = new VLXJBXException(VLXJBXMessages::ConversionFailed);
   const VLXUnicodeString parameters[2] = {VLXUnicodeString(name), VLXUnicodeString(what.c_str())};
   error->SetNLSRequestParams(2, parameters);
@@ -392,36 +388,20 @@ T ValueAt(const T* pointer)
   return pointer ? *pointer : T();
 }
 
-long GatherBinaries(const char* operation, int count, va_list args, VLXListValVLXBinary& list)
-{
-  return Gather<const VLXBinary*>(operation, count, args, list, ValueAt<VLXBinary>);
-}
+// Any non-zero boolean argument is true.
+VLXBoolean Truth(int b) { return static_cast<VLXBoolean>(b != 0); }
+template <class T>
+T Same(T value) { return value; }
 
-long GatherBooleans(const char* operation, int count, va_list args, VLXListValVLXBoolean& list)
+long GatherBinaries(const char* op, int n, va_list a, VLXListValVLXBinary& l) { return Gather<const VLXBinary*>(op, n, a, l, ValueAt<VLXBinary>); }
+long GatherBooleans(const char* op, int n, va_list a, VLXListValVLXBoolean& l) { return Gather<int>(op, n, a, l, Truth); }
+long GatherDates(const char* op, int n, va_list a, VLXListValVLXTime& l) { return Gather<const VLXTime*, true>(op, n, a, l, ValueAt<VLXTime>); }
+long GatherDoubles(const char* op, int n, va_list a, VLXRawColldouble& l) { return Gather<double>(op, n, a, l, Same<double>); }
+long GatherInstances(const char* op, int n, va_list a, VLXListValVLXKDMInstance& l)
 {
-  // Any non-zero argument is true.
-  return Gather<int>(operation, count, args, list, [](int b) { return static_cast<VLXBoolean>(b != 0); });
+  return Gather<const VLXKDMInstance*, true>(op, n, a, l, ValueAt<VLXKDMInstance>);
 }
-
-long GatherDates(const char* operation, int count, va_list args, VLXListValVLXTime& list)
-{
-  return Gather<const VLXTime*, true>(operation, count, args, list, ValueAt<VLXTime>);
-}
-
-long GatherDoubles(const char* operation, int count, va_list args, VLXRawColldouble& list)
-{
-  return Gather<double>(operation, count, args, list, [](double d) { return d; });
-}
-
-long GatherInstances(const char* operation, int count, va_list args, VLXListValVLXKDMInstance& list)
-{
-  return Gather<const VLXKDMInstance*, true>(operation, count, args, list, ValueAt<VLXKDMInstance>);
-}
-
-long GatherIntegers(const char* operation, int count, va_list args, VLXRawCollint& list)
-{
-  return Gather<int>(operation, count, args, list, [](int n) { return n; });
-}
+long GatherIntegers(const char* op, int n, va_list a, VLXRawCollint& l) { return Gather<int>(op, n, a, l, Same<int>); }
 
 }  // namespace
 

@@ -192,22 +192,12 @@ long VLXKDMInstanceValue::AcceptObject(JNIEnv* env, jobject object)
 {
   // Whatever happens, the Java object no longer stands for the local value.
   _isSynchronized = false;
-  const ReplicaStubs* st = FrameAccess::Table();
-  if (!st || !st->IsBound()) {
-    long status = VLX_S_OK;
-    JNIEnv* started = nullptr;
-    if ((status = InitJava(started, kSetHandle)) < 0) return status;
-    if (!(st = FrameAccess::Table())) return VLX_E_FAIL;
-    if (!st->IsBound()) return st->ReportUnbound(kSetHandle);
-  }
+  long status = VLX_S_OK;
+  const ReplicaStubs* st = FrameAccess::BoundTable(kSetHandle, status);
+  if (!st) return status;
   if (Dispatch::Recognise(env, *st, object)) return VLX_S_OK;
-  VLXUnicodeString actual;
-  const std::string why = "the Java object is " +
-                          (VLXJBXJNIUtilities::GetClassName(env, object, actual) < 0
-                               ? std::string("of a class whose name cannot be read")
-                               : std::string("a ") + actual.c_str()) +
-                          ", none of the classes of an attribute value";
-  return RejectValue(kSetHandle, why);
+  return RejectValue(kSetHandle,
+                     "the Java object is " + ClassText(env, object) + ", none of the classes of an attribute value");
 }
 
 long VLXKDMInstanceValue::BuildRemote()

@@ -161,14 +161,9 @@ long VLXKDMJavaObject::HandleReplicaError(JNIEnv* env, long status, const char* 
 
 long VLXKDMJavaObject::CheckJavaClass(JNIEnv* env, jobject object, int javaClass, const char* operation)
 {
-  const ReplicaStubs* st = _st.load(std::memory_order_acquire);
-  if (!st || !st->IsBound()) {  // an object attached before any operation started the Java side
-    JNIEnv* started = nullptr;
-    if (InitJava(started, operation) < 0) return VLX_E_FAIL;
-    st = _st.load(std::memory_order_acquire);
-    if (!st) return VLX_E_FAIL;
-    if (!st->IsBound()) return st->ReportUnbound(operation);
-  }
+  long status = VLX_S_OK;
+  const ReplicaStubs* st = corvexa::FrameAccess::BoundTable(operation, status);
+  if (!st) return status;
   if (!object) return corvexa::RejectValue(operation, "the Java object is null");
   const corvexa::Slot slot = static_cast<corvexa::Slot>(javaClass);
   if (VLXJBXJNIHelper::IsInstanceOf(env, object, st->Class(slot))) return VLX_S_OK;
@@ -176,13 +171,7 @@ long VLXKDMJavaObject::CheckJavaClass(JNIEnv* env, jobject object, int javaClass
   std::string expected = ReplicaStubs::ClassPath(slot);
   for (char& c : expected)
     if (c == '/') c = '.';
-  VLXUnicodeString actual;
-  const std::string why =
-      "the Java object is " +
-      (VLXJBXJNIUtilities::GetClassName(env, object, actual) < 0 ? std::string("of a class whose name cannot be read")
-                                                                 : std::string("a ") + actual.c_str()) +
-      ", not a " + expected;
-  return corvexa::RejectValue(operation, why);
+  return corvexa::RejectValue(operation, "the Java object is " + corvexa::ClassText(env, object) + ", not a " + expected);
 }
 
 extern "C" int VELMORA_QKA2_INTERNAL_Corvexa() { return 1; }
