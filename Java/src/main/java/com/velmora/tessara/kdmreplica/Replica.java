@@ -24,6 +24,10 @@ import java.util.function.Function;
  * instances and clears the created and modified flags.
  *
  * <p>Process-wide settings: {@link #setFeature} and {@link #setSchemaLocation}.
+ *
+ * <p>Files: a relative path given to a member (and a relative schema location of a document
+ * given as a string) is taken from the process's current directory at the time of the call, so
+ * it follows a change of directory by native code.
  */
 public class Replica {
     /** Most violations listed by one refused commit; the count of the others is given. */
@@ -485,7 +489,7 @@ public class Replica {
 
     /**
      * A new replica from a document: the schema embedded in it, or else the local schema file its
-     * {@code xsi:schemaLocation} names (relative paths from the working directory; URLs are
+     * {@code xsi:schemaLocation} names (relative paths from the current directory; URLs are
      * refused). The replica's schema location is the one the document names ("" if none).
      *
      * @throws XmlDocumentException naming the line, column and offending name, or saying that the

@@ -17,7 +17,7 @@ import javax.xml.stream.XMLStreamConstants;
  *
  * <p>Schema: a new replica takes the {@code xs:schema} embedded as the document's first child,
  * or else the local file named by the document's {@code xsi:schemaLocation} for the replica
- * namespace (relative to the document's file, or to the working directory for a string; URLs are
+ * namespace (relative to the document's file, or to the current directory for a string; URLs are
  * refused unread). Locations for other namespaces are ignored. Populating an existing replica
  * reads no schema: its classes must be known, an embedded schema is skipped.
  *

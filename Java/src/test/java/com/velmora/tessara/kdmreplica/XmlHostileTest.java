@@ -9,9 +9,11 @@ import static org.junit.jupiter.api.Assertions.assertFalse;
 import static org.junit.jupiter.api.Assertions.assertThrows;
 import static org.junit.jupiter.api.Assertions.assertTrue;
 
+import java.io.File;
 import java.nio.charset.StandardCharsets;
 import java.nio.file.Files;
 import java.nio.file.Path;
+import java.nio.file.Paths;
 import java.util.List;
 import java.util.function.Consumer;
 import java.util.stream.Stream;
@@ -58,6 +60,7 @@ class XmlHostileTest {
     @AfterEach
     void tearDown() throws Exception {
         Replica.setFeature("validate", false);
+        Replica.setSchemaLocation(null);
         assertEquals(0, net.connections(), "nothing may be fetched from the network");
         net.close();
         assertEquals(before, dump(target), "the replica is unchanged");
@@ -327,5 +330,37 @@ class XmlHostileTest {
         assertThrows(IllegalArgumentException.class, () -> target.populatesFromXmlString(null));
         assertThrows(IllegalArgumentException.class, () -> Replica.readFromXmlFile(null));
         assertThrows(IllegalArgumentException.class, () -> target.insertSchemaString(null));
+    }
+
+    /** Reads by relative paths, in a process whose directory is not its user.dir (as after a native chdir). */
+    static final class ReadRelative {
+        public static void main(String[] args) {
+            Replica r = new Replica("r");
+            r.insertSchemaFile("s.xsd");
+            r.populatesFromXmlFile("d.xml");
+            System.out.print(r.getModels().getItem(0).getClassDef().getClassName() + " "
+                    + Replica.readFromXmlFile("d.xml").getName() + " "
+                    + Replica.readFromXmlString(args[0]).getModels().getItem(0).getClassDef().getClassName());
+        }
+    }
+
+    @Test
+    void relativePathsAreTakenFromTheProcessDirectoryNotFromUserDir() throws Exception {
+        Replica.setSchemaLocation("s.xsd");
+        for (String name : new String[] {"Here", "There"}) { // a schema and a document of the same names in each
+            Replica r = new Replica(name);
+            addClass(r, name, null);
+            Path d = Files.createDirectory(dir.resolve(name));
+            write(d.resolve("s.xsd"), r.getXsd());
+            write(d.resolve("d.xml"), r.getXml(false));
+        }
+        String cp = Paths.get(Replica.class.getProtectionDomain().getCodeSource().getLocation().toURI())
+                + File.pathSeparator
+                + Paths.get(ReadRelative.class.getProtectionDomain().getCodeSource().getLocation().toURI());
+        Process child = new ProcessBuilder(Paths.get(System.getProperty("java.home"), "bin", "java").toString(),
+                "-Duser.dir=" + dir.resolve("There"), "-cp", cp, ReadRelative.class.getName(),
+                Files.readString(dir.resolve("Here/d.xml"))).directory(dir.resolve("Here").toFile())
+                .redirectErrorStream(true).start();
+        assertEquals("Here Here Here", new String(child.getInputStream().readAllBytes(), StandardCharsets.UTF_8));
     }
 }
