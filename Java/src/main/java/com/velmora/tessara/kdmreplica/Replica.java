@@ -27,7 +27,8 @@ import java.util.function.Function;
  *
  * <p>Files: a relative path given to a member (and a relative schema location of a document
  * given as a string) is taken from the process's current directory at the time of the call, so
- * it follows a change of directory by native code.
+ * it follows a change of directory by native code. Only regular files are read: a directory, pipe
+ * or device is refused unopened.
  */
 public class Replica {
     /** Most violations listed by one refused commit; the count of the others is given. */

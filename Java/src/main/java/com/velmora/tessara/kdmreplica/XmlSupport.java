@@ -108,6 +108,11 @@ final class XmlSupport {
                 if (file == null) {
                     return new In(f.createXMLStreamReader(new StringReader(text)), this, null);
                 }
+                // checked before opening: opening a pipe blocks, a device may never end
+                if (!Files.isRegularFile(file) && Files.exists(file)) {
+                    throw new IllegalArgumentException("cannot read " + name + ": it is not a regular file (a"
+                            + " directory, pipe or device is not read)");
+                }
                 InputStream s;
                 try {
                     s = new BufferedInputStream(Files.newInputStream(file), 1 << 16);
@@ -131,7 +136,7 @@ final class XmlSupport {
          * other content of the input. Reads at most up to the place and a few characters beyond.
          */
         String tagAt(int line, int column) {
-            if (line < 1 || column < 2) {
+            if (line < 1 || column < 2 || file != null && !Files.isRegularFile(file)) {
                 return null;
             }
             try (BufferedReader rd = new BufferedReader(file == null ? new StringReader(text)

@@ -2,14 +2,17 @@ package com.velmora.tessara.kdmreplica;
 
 import static com.velmora.tessara.kdmreplica.Fx.addAttr;
 import static com.velmora.tessara.kdmreplica.Fx.addClass;
+import static com.velmora.tessara.kdmreplica.Fx.throwsWith;
 import static com.velmora.tessara.kdmreplica.XmlFx.dump;
 import static com.velmora.tessara.kdmreplica.XmlFx.failsAt;
 import static org.junit.jupiter.api.Assertions.assertEquals;
 import static org.junit.jupiter.api.Assertions.assertFalse;
 import static org.junit.jupiter.api.Assertions.assertThrows;
 import static org.junit.jupiter.api.Assertions.assertTrue;
+import static org.junit.jupiter.api.Assumptions.assumeTrue;
 
 import java.io.File;
+import java.io.IOException;
 import java.nio.charset.StandardCharsets;
 import java.nio.file.Files;
 import java.nio.file.Path;
@@ -20,6 +23,8 @@ import java.util.stream.Stream;
 import org.junit.jupiter.api.AfterEach;
 import org.junit.jupiter.api.BeforeEach;
 import org.junit.jupiter.api.Test;
+import org.junit.jupiter.api.Timeout;
+import org.junit.jupiter.api.function.Executable;
 import org.junit.jupiter.api.io.TempDir;
 import org.junit.jupiter.params.ParameterizedTest;
 import org.junit.jupiter.params.provider.Arguments;
@@ -330,6 +335,31 @@ class XmlHostileTest {
         assertThrows(IllegalArgumentException.class, () -> target.populatesFromXmlString(null));
         assertThrows(IllegalArgumentException.class, () -> Replica.readFromXmlFile(null));
         assertThrows(IllegalArgumentException.class, () -> target.insertSchemaString(null));
+    }
+
+    @Test
+    @Timeout(value = 60, threadMode = Timeout.ThreadMode.SEPARATE_THREAD) // a guard: opening a pipe blocks
+    void pipesDirectoriesAndDevicesAreRefusedUnopened() throws Exception {
+        Path fifo = dir.resolve("fifo.xml");
+        Process mkfifo;
+        try {
+            mkfifo = new ProcessBuilder("mkfifo", fifo.toString()).start();
+        } catch (IOException e) {
+            mkfifo = null;
+        }
+        assumeTrue(mkfifo != null && mkfifo.waitFor() == 0, "mkfifo makes the pipe");
+        for (Path p : new Path[] {fifo, Files.createDirectory(dir.resolve("dir.xsd")), Paths.get("/dev/zero")}) {
+            String path = p.toString();
+            String doc = "<replica xmlns=\"urn:corvexa:replica:1\""
+                    + " xmlns:xsi=\"http://www.w3.org/2001/XMLSchema-instance\""
+                    + " xsi:schemaLocation=\"urn:corvexa:replica:1 " + path + "\"/>";
+            // first a call that locks no replica of the test: a blocked one would hold that lock
+            for (Executable read : new Executable[] {() -> Replica.readFromXmlFile(path),
+                () -> Replica.readFromXmlString(doc), () -> target.populatesFromXmlFile(path),
+                () -> target.insertSchemaFile(path)}) {
+                throwsWith(IllegalArgumentException.class, read, "'" + path + "'", "not a regular file");
+            }
+        }
     }
 
     /** Reads by relative paths, in a process whose directory is not its user.dir (as after a native chdir). */
