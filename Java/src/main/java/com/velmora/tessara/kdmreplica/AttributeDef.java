@@ -15,9 +15,11 @@ import java.util.concurrent.locks.Lock;
  * no target names or references. A null text stores the empty text; a null array stores an empty
  * array; arrays are copied in and out.
  *
- * <p>Changing a property affects later {@code setValue} calls only (length, access mode, target
- * names), except {@link #setMultiValuation}, which is refused while any instance holds a value of
- * the attribute.
+ * <p>Changing a property affects later {@code setValue} calls (length, access mode, target names).
+ * Inside a replica, a change that values the replica holds would break is refused and changes
+ * nothing: {@link #setMultiValuation} while any instance holds a value of the attribute,
+ * {@link #setTargetNames} that leave out the class of a stored reference, {@link #setLength} below
+ * the length of a stored value.
  */
 public class AttributeDef {
     final String name;
@@ -55,6 +57,12 @@ public class AttributeDef {
         this(Names.generate("attribute"), AttributeType.String);
     }
 
+    /** The replica of the owning class, or null (caller holds a lock of this definition). */
+    private Replica replicaOf() {
+        ClassDef c = owner;
+        return c == null ? null : c.replica;
+    }
+
     /** "Class.attribute", or the bare name for a definition of no class. */
     String qualifiedName() {
         ClassDef c = owner;
@@ -86,11 +94,22 @@ public class AttributeDef {
     /**
      * Names of the classes that a relationship may point to (an instance of such a class or of one
      * of its subclasses). Empty: any class of the replica.
+     *
+     * @throws IllegalStateException when a stored value of the attribute (of a live instance or of
+     *         a deleted one not yet committed) refers to an instance that the names leave out,
+     *         naming both instances and the class; nothing changes then
      */
     public void setTargetNames(String[] names) {
         String[] copy = Names.copyStrings("AttributeDef '" + name + "' target names", names);
         Lock l = Locks.write(this);
         try {
+            Replica r = replicaOf();
+            String bad = r == null || type != AttributeType.Relationship ? null
+                    : r.objection(this, null, v -> r.refusedTarget(copy, v));
+            if (bad != null) {
+                throw new IllegalStateException("attribute '" + qualifiedName() + "' cannot take the target names "
+                        + Arrays.toString(copy) + ": " + bad);
+            }
             targetNames = copy;
         } finally {
             l.unlock();
@@ -213,10 +232,21 @@ public class AttributeDef {
     /**
      * Maximum length of a String value (characters, that is code points) or of a Binary value
      * (bytes), checked by {@code setValue} on each value or element; 0 or less means no limit.
+     *
+     * @throws IllegalStateException when a stored value (of a live instance or of a deleted one not
+     *         yet committed) is longer, naming the instance and that length; nothing changes then
      */
     public void setLength(int length) {
         Lock l = Locks.write(this);
         try {
+            Replica r = replicaOf();
+            String unit = type == AttributeType.String ? " characters" : " bytes";
+            String bad = r == null || length <= 0 ? null : r.objection(this, null,
+                    v -> Values.longest(v) > length ? "holds a value of " + Values.longest(v) + unit : null);
+            if (bad != null) {
+                throw new IllegalStateException("attribute '" + qualifiedName() + "' cannot be limited to " + length
+                        + unit + ": " + bad);
+            }
             this.length = length;
         } finally {
             l.unlock();

@@ -63,8 +63,8 @@ import java.util.zip.Inflater;
  * <p>Values are decoded straight into their stored forms ({@code Values}), each form fixed by the
  * attribute's type, and placed into the staged instances: the checks of {@code Staging.setValue}
  * judge new writes (length limits, target names, deleted targets), while a binary replica restores
- * values the replica already held, which those rules may no longer accept (a length lowered later,
- * a reference to an instance removed since).
+ * values the replica already held, which those rules may not accept (a value longer than its
+ * length, read from a document; a reference to an instance removed since).
  */
 final class BinaryCodec {
     static final byte[] MAGIC = {'C', 'V', 'R', 'B'};

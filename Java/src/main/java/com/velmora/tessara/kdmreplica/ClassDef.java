@@ -81,10 +81,15 @@ public class ClassDef {
 
     /** Runs a schema change; when the replica's schema becomes invalid the undo runs and the error is thrown. */
     void changeSchema(Runnable change, Runnable undo) {
+        changeSchema(change, undo, false);
+    }
+
+    /** As {@link #changeSchema(Runnable, Runnable)}; {@code reparents}: the change is one of this class's super class. */
+    private void changeSchema(Runnable change, Runnable undo, boolean reparents) {
         change.run();
         if (replica != null) {
             try {
-                replica.schemaChanged();
+                replica.schemaChanged(reparents ? this : null);
             } catch (RuntimeException e) {
                 undo.run();
                 throw e;
@@ -99,8 +104,9 @@ public class ClassDef {
     }
 
     /**
-     * Renames the class. Inside a replica the new name must be free; subclasses follow the rename
-     * (their super name is updated). Target names of relationship attributes are not rewritten.
+     * Renames the class. Inside a replica the new name must be free; the replica follows the
+     * rename: subclasses name it as their super class, and target names of relationship attributes
+     * that named the old name name the new one.
      *
      * @throws IllegalArgumentException for an invalid name or a name taken in the replica
      */
@@ -134,13 +140,16 @@ public class ClassDef {
      * @throws IllegalArgumentException inside a replica, for an unknown or cyclic super class, or
      *         when an inherited attribute name clashes with an attribute of this class or of a
      *         subclass; the super name is then left as it was
+     * @throws IllegalStateException when a stored reference to an instance of this class (or of a
+     *         subclass) would then no longer be of a target class of its attribute, naming it; the
+     *         super name is then left as it was
      */
     public void setSuperName(String superName) {
         String s = Names.orEmpty(superName);
         Lock l = Locks.write(this);
         try {
             String old = this.superName;
-            changeSchema(() -> this.superName = s, () -> this.superName = old);
+            changeSchema(() -> this.superName = s, () -> this.superName = old, true);
         } finally {
             l.unlock();
         }

@@ -251,7 +251,10 @@ public class ModelSet {
         }
     }
 
-    /** Renames a class of this replica (caller holds the replica's write lock). */
+    /**
+     * Renames a class of this replica, and the class in every super name and target name list
+     * that names it (caller holds the replica's write lock).
+     */
     void renameClass(ClassDef c, String newName) {
         String old = c.name;
         if (old.equals(newName)) {
@@ -267,6 +270,16 @@ public class ModelSet {
         for (Model other : items) {
             if (other.classDef.superName.equals(old)) {
                 other.classDef.superName = newName;
+            }
+            for (AttributeDef a : other.classDef.attributes.items) {
+                String[] targets = a.targetNames;
+                for (int i = 0; i < targets.length; i++) {
+                    if (targets[i].equals(old)) {
+                        targets = targets == a.targetNames ? targets.clone() : targets;
+                        targets[i] = newName;
+                    }
+                }
+                a.targetNames = targets;
             }
         }
     }

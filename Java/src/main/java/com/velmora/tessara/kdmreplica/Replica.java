@@ -2,6 +2,7 @@ package com.velmora.tessara.kdmreplica;
 
 import java.util.ArrayDeque;
 import java.util.ArrayList;
+import java.util.Arrays;
 import java.util.Collections;
 import java.util.HashMap;
 import java.util.IdentityHashMap;
@@ -11,6 +12,7 @@ import java.util.Map;
 import java.util.Set;
 import java.util.concurrent.locks.Lock;
 import java.util.concurrent.locks.ReentrantReadWriteLock;
+import java.util.function.Function;
 
 /**
  * A replica: a schema (the class definitions of its models, one model per class) and the data of
@@ -22,6 +24,11 @@ import java.util.concurrent.locks.ReentrantReadWriteLock;
  * instances and clears the created and modified flags.
  *
  * <p>Process-wide settings: {@link #setFeature} and {@link #setSchemaLocation}.
+ *
+ * <p>Files: a relative path given to a member (and a relative schema location of a document
+ * given as a string) is taken from the process's current directory at the time of the call, so
+ * it follows a change of directory by native code. Only regular files are read: a directory, pipe
+ * or device is refused unopened.
  */
 public class Replica {
     /** Most violations listed by one refused commit; the count of the others is given. */
@@ -193,7 +200,73 @@ public class Replica {
 
     /** Recomputes and installs every layout (caller holds the write lock). @throws IllegalArgumentException */
     void schemaChanged() {
-        Schema.apply(this, Schema.compute(this));
+        schemaChanged(null);
+    }
+
+    /**
+     * As {@link #schemaChanged()}; {@code reparented}, when not null, is a class whose super class
+     * changed: the change is refused, before any layout is installed, when a stored reference would
+     * then no longer be of a target class of its attribute.
+     *
+     * @throws IllegalStateException for such a reference, naming it
+     */
+    void schemaChanged(ClassDef reparented) {
+        Map<ClassDef, AttributeDef[]> layouts = Schema.compute(this);
+        if (reparented != null) {
+            for (Model m : models.items) {
+                for (AttributeDef a : m.classDef.attributes.items) {
+                    String[] targets = a.targetNames;
+                    String bad = a.type != AttributeType.Relationship || targets.length == 0 ? null
+                            : objection(a, layouts, v -> refusedTarget(targets, v));
+                    if (bad != null) {
+                        throw new IllegalStateException("class '" + reparented.name + "' cannot "
+                                + (reparented.superName.isEmpty() ? "leave its super class"
+                                        : "take the super class '" + reparented.superName + "'")
+                                + ": through attribute '" + a.qualifiedName() + "', " + bad);
+                    }
+                }
+            }
+        }
+        Schema.apply(this, layouts);
+    }
+
+    /**
+     * The first stored value of {@code a} that {@code objection} objects to, as "instance X" and
+     * the objection, or null: values of live instances, then of deleted ones that the next commit
+     * forgets (caller holds a lock). With {@code layouts}, values that those layouts of their
+     * class no longer hold are passed over.
+     */
+    String objection(AttributeDef a, Map<ClassDef, AttributeDef[]> layouts, Function<Object, String> objection) {
+        for (Model m : models.items) {
+            int p = Arrays.asList(m.alignedTo).indexOf(a);
+            if (p < 0 || layouts != null && !Arrays.asList(layouts.get(m.classDef)).contains(a)) {
+                continue;
+            }
+            int live = m.instances.count;
+            for (int k = 0, n = live + (m.deleted == null ? 0 : m.deleted.size()); k < n; k++) {
+                Instance x = k < live ? m.instances.items[k] : m.deleted.get(k - live);
+                String o = x.values[p] == null ? null : objection.apply(x.values[p]);
+                if (o != null) {
+                    return "instance " + x.describe() + " " + o;
+                }
+            }
+        }
+        return null;
+    }
+
+    /**
+     * For a stored relationship value: the first target of this replica that {@code targets}
+     * do not allow, described; or null (caller holds a lock).
+     */
+    String refusedTarget(String[] targets, Object stored) {
+        for (Instance t : Values.targets(stored)) {
+            Model tm = t.model;
+            if (tm != null && tm.replica == this && !Values.isTarget(targets, tm.classDef, models)) {
+                return "refers to " + t.describe() + ", of class '" + tm.classDef.name + "', not of a target class "
+                        + Arrays.toString(targets);
+            }
+        }
+        return null;
     }
 
     /** Instances (live or deleted) that hold a value of {@code a} (caller holds a lock). */
@@ -417,7 +490,7 @@ public class Replica {
 
     /**
      * A new replica from a document: the schema embedded in it, or else the local schema file its
-     * {@code xsi:schemaLocation} names (relative paths from the working directory; URLs are
+     * {@code xsi:schemaLocation} names (relative paths from the current directory; URLs are
      * refused). The replica's schema location is the one the document names ("" if none).
      *
      * @throws XmlDocumentException naming the line, column and offending name, or saying that the

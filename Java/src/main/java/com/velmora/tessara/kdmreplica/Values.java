@@ -192,20 +192,47 @@ final class Values {
             throw new IllegalArgumentException(who(x) + ": attribute '" + def.qualifiedName() + "': " + where(element)
                     + ", " + t.describe() + ", is deleted");
         }
-        String[] targets = def.targetNames;
-        if (targets.length == 0) {
-            return;
+        if (!isTarget(def.targetNames, m.classDef, replica.models)) {
+            throw new IllegalArgumentException(who(x) + ": attribute '" + def.qualifiedName() + "': "
+                    + where(element) + ", " + t.describe() + ", is of class '" + m.classDef.name
+                    + "', not of a target class " + Arrays.toString(def.targetNames));
         }
-        for (ClassDef c = m.classDef; c != null; c = replica.models.superOf(c)) {
+    }
+
+    /**
+     * Whether target names allow an instance of class {@code c}: they are empty, or name {@code c}
+     * or one of its super classes in {@code models} (caller holds a lock of their replica).
+     */
+    static boolean isTarget(String[] targets, ClassDef c, ModelSet models) {
+        if (targets.length == 0) {
+            return true;
+        }
+        for (; c != null; c = models.superOf(c)) {
             for (String target : targets) {
                 if (target.equals(c.name)) {
-                    return;
+                    return true;
                 }
             }
         }
-        throw new IllegalArgumentException(who(x) + ": attribute '" + def.qualifiedName() + "': " + where(element)
-                + ", " + t.describe() + ", is of class '" + m.classDef.name + "', not of a target class "
-                + Arrays.toString(targets));
+        return false;
+    }
+
+    /**
+     * The longest String (in characters, that is code points) or Binary (in bytes) of a stored
+     * value or of its elements; -1 for other values.
+     */
+    static int longest(Object stored) {
+        int n = -1;
+        if (stored instanceof String) {
+            n = ((String) stored).codePointCount(0, ((String) stored).length());
+        } else if (stored instanceof byte[]) {
+            n = ((byte[]) stored).length;
+        } else if (stored instanceof String[] || stored instanceof byte[][]) {
+            for (Object e : (Object[]) stored) {
+                n = Math.max(n, longest(e));
+            }
+        }
+        return n;
     }
 
     /** The caller's copy of a stored value. */

@@ -17,14 +17,14 @@ import javax.xml.stream.XMLStreamConstants;
  *
  * <p>Schema: a new replica takes the {@code xs:schema} embedded as the document's first child,
  * or else the local file named by the document's {@code xsi:schemaLocation} for the replica
- * namespace (relative to the document's file, or to the working directory for a string; URLs are
+ * namespace (relative to the document's file, or to the current directory for a string; URLs are
  * refused unread). Locations for other namespaces are ignored. Populating an existing replica
  * reads no schema: its classes must be known, an embedded schema is skipped.
  *
  * <p>Instances without {@code state} are loaded unchanged; {@code state} gives created, modified
  * or deleted. Values are loaded as written: the reader does not apply attribute lengths (a
- * replica may hold values written before a length was lowered); the "validate" feature checks
- * the whole document against the replica's schema.
+ * document may hold values longer than the lengths of the schema it is read with); the "validate"
+ * feature checks the whole document against the replica's schema.
  */
 final class XmlReader {
     private final Staging st;
@@ -539,7 +539,7 @@ final class XmlReader {
                             + r.from.describe() + ": attribute '" + def.qualifiedName() + "' refers to key '"
                             + XmlSupport.clip(k.key) + "', which no instance of the document has", null);
                 }
-                if (!allowed(def, t)) {
+                if (!Values.isTarget(def.targetNames, t.model.classDef, target.models)) {
                     throw new XmlDocumentException(in.source, k.line, k.column, "instance "
                             + r.from.describe() + ": attribute '" + def.qualifiedName() + "' refers to key '"
                             + XmlSupport.clip(k.key) + "', an instance of class '" + t.model.classDef.name
@@ -549,19 +549,5 @@ final class XmlReader {
             }
             r.from.values[r.position] = def.multi ? targets : targets[0];
         }
-    }
-
-    private boolean allowed(AttributeDef def, Instance t) {
-        if (def.targetNames.length == 0) {
-            return true;
-        }
-        for (ClassDef c = t.model.classDef; c != null; c = target.models.superOf(c)) {
-            for (String n : def.targetNames) {
-                if (n.equals(c.name)) {
-                    return true;
-                }
-            }
-        }
-        return false;
     }
 }

@@ -89,7 +89,7 @@ final class XmlSupport {
             }
             Path p;
             try {
-                p = Paths.get(path).toAbsolutePath().normalize();
+                p = callerPath(path);
             } catch (InvalidPathException e) {
                 throw new IllegalArgumentException("Replica." + member + ": '" + path + "' is not a valid path: "
                         + e.getMessage(), e);
@@ -97,9 +97,9 @@ final class XmlSupport {
             return new Src(null, p, kind + " file '" + p + "'");
         }
 
-        /** The directory that relative names in this input are resolved against. */
+        /** The directory that relative names in this input are resolved against (now, for a string). */
         Path baseDir() {
-            return file != null ? file.getParent() : Paths.get("").toAbsolutePath();
+            return file != null ? file.getParent() : currentDir();
         }
 
         In open() {
@@ -107,6 +107,11 @@ final class XmlSupport {
             try {
                 if (file == null) {
                     return new In(f.createXMLStreamReader(new StringReader(text)), this, null);
+                }
+                // checked before opening: opening a pipe blocks, a device may never end
+                if (!Files.isRegularFile(file) && Files.exists(file)) {
+                    throw new IllegalArgumentException("cannot read " + name + ": it is not a regular file (a"
+                            + " directory, pipe or device is not read)");
                 }
                 InputStream s;
                 try {
@@ -131,7 +136,7 @@ final class XmlSupport {
          * other content of the input. Reads at most up to the place and a few characters beyond.
          */
         String tagAt(int line, int column) {
-            if (line < 1 || column < 2) {
+            if (line < 1 || column < 2 || file != null && !Files.isRegularFile(file)) {
                 return null;
             }
             try (BufferedReader rd = new BufferedReader(file == null ? new StringReader(text)
@@ -190,6 +195,29 @@ final class XmlSupport {
     }
 
     private static final int TAG_WINDOW = 128;
+
+    /**
+     * A path a caller gave, absolute and normalized; a relative one is taken from the process's
+     * current directory at the time of the call.
+     *
+     * @throws InvalidPathException for text that is no path
+     */
+    static Path callerPath(String path) {
+        return currentDir().resolve(path).normalize();
+    }
+
+    /**
+     * The process's current directory now. Native code may change it (chdir) after the JVM
+     * started, which neither user.dir nor the JDK's resolution of relative paths follows; so it is
+     * read from /proc/self/cwd, and taken from user.dir only where that does not exist.
+     */
+    static Path currentDir() {
+        try {
+            return Paths.get("/proc/self/cwd").toRealPath();
+        } catch (IOException e) {
+            return Paths.get("").toAbsolutePath();
+        }
+    }
 
     private static boolean isNameChar(char c) {
         return c >= 'a' && c <= 'z' || c >= 'A' && c <= 'Z' || c >= '0' && c <= '9' || c == '_' || c == '-'

@@ -130,7 +130,7 @@ class BinaryCodecTest {
         ghost.setValue("n", 99);
         changed.setValue("link", ghost);
         part.getInstances().remove(ghost);
-        link.setTargetNames(new String[] {"Elsewhere"}); // the values held no longer fit
+        link.targetNames = new String[] {"Elsewhere"}; // the values held no longer fit (setTargetNames refuses that)
 
         Replica read = back(r, true);
         InstanceSet s = read.getModels().getItem(0).getInstances();
@@ -176,7 +176,7 @@ class BinaryCodecTest {
         Instance child = base.createInstance();
         parent.setValue("label", "a long label");
         parent.setValue("owns", new Instance[] {child});
-        label.setLength(3);
+        label.length = 3; // below the value held (setLength refuses that)
         label.setAccessMode(AccessMode.Read);
         r.commit();
 

@@ -136,7 +136,8 @@ final class BinaryFx {
      * A replica with up to five classes (some extending others), attributes of every type single
      * and multi-valued with random properties, committed instances then pending changes: created,
      * modified and deleted instances, references to deleted ones and to ones removed before any
-     * commit, and constraints tightened after the values were set.
+     * commit, and constraints tightened past the values held (set directly: the public setters
+     * refuse that, but a replica read from a document or an older binary form can hold such values).
      */
     static Replica generate(long seed, int instancesPerClass) {
         Random rnd = new Random(seed);
@@ -221,7 +222,7 @@ final class BinaryFx {
                 }
             }
         }
-        // Constraints tightened afterwards: the values held stay as they are.
+        // Constraints tightened afterwards, past the values held, which stay as they are.
         for (Model m : models) {
             ClassDef c = m.getClassDef();
             c.setAbstract(rnd.nextInt(5) == 0);
@@ -229,12 +230,12 @@ final class BinaryFx {
                 AttributeDef a = c.getAttributes().getItem(k);
                 a.setMandatory(rnd.nextInt(3) == 0);
                 a.setUnicity(rnd.nextInt(3) == 0);
-                a.setLength(rnd.nextInt(3) == 0 ? rnd.nextInt(5) - 1 : 0);
+                a.length = rnd.nextInt(3) == 0 ? rnd.nextInt(5) - 1 : 0;
                 if (rnd.nextInt(4) == 0) {
                     a.setAccessMode(AccessMode.Read);
                 }
                 if (a.getAttributeType() == AttributeType.Relationship && rnd.nextBoolean()) {
-                    a.setTargetNames(new String[] {models.get(rnd.nextInt(models.size())).getClassDef().getClassName()});
+                    a.targetNames = new String[] {models.get(rnd.nextInt(models.size())).getClassDef().getClassName()};
                 }
             }
         }

@@ -3,6 +3,7 @@ package com.velmora.tessara.kdmreplica;
 import static com.velmora.tessara.kdmreplica.Fx.addAttr;
 import static com.velmora.tessara.kdmreplica.Fx.addClass;
 import static com.velmora.tessara.kdmreplica.Fx.throwsWith;
+import static com.velmora.tessara.kdmreplica.XmlFx.dump;
 import static org.junit.jupiter.api.Assertions.assertArrayEquals;
 import static org.junit.jupiter.api.Assertions.assertEquals;
 import static org.junit.jupiter.api.Assertions.assertFalse;
@@ -10,8 +11,10 @@ import static org.junit.jupiter.api.Assertions.assertNull;
 import static org.junit.jupiter.api.Assertions.assertSame;
 import static org.junit.jupiter.api.Assertions.assertThrows;
 
+import java.util.Arrays;
 import org.junit.jupiter.api.BeforeEach;
 import org.junit.jupiter.api.Test;
+import org.junit.jupiter.api.function.Executable;
 
 /** Inheritance, schema checks, lookups and what schema changes do to existing instances. */
 class SchemaTest {
@@ -142,12 +145,27 @@ class SchemaTest {
     }
 
     @Test
-    void aClassNameIsTakenOnceAndRenamesCarrySubclasses() {
+    void aClassNameIsTakenOnceAndRenamesCarrySubclassesAndTargets() {
         throwsWith(IllegalArgumentException.class, () -> r.getModels().add(new Model(new ClassDef("Part"))),
                 "already has a class 'Part'");
         throwsWith(IllegalArgumentException.class, () -> part.getClassDef().setClassName("Bolt"), "taken");
+        AttributeDef link = addAttr(part, "link", AttributeType.Relationship, false);
+        link.setTargetNames(new String[] {"Nut", "Part"});
+        Instance b = bolt.createInstance();
+        b.setValue("link", b);
         part.getClassDef().setClassName("Item");
         assertEquals("Item", bolt.getClassDef().getSuperName());
+        assertArrayEquals(new String[] {"Nut", "Item"}, link.getTargetNames());
+        part.createInstance().setValue("link", b);
+        r.commit();
+        String expected = dump(r);
+        Replica viaXsd = new Replica("plant");
+        viaXsd.insertSchemaString(r.getXsd());
+        viaXsd.populatesFromXmlString(r.getXml(false));
+        for (Replica back : new Replica[] {viaXsd, Replica.readFromXmlString(r.getXml(true)),
+                Replica.getReplicaFromBinary(Replica.getBinaryFromReplica(r, false), false)}) {
+            assertEquals(expected, dump(back));
+        }
         assertSame(part, r.getModels().getItem("Item"));
         assertNull(r.getModels().getItem("Part"));
         throwsWith(IllegalArgumentException.class, () -> r.getModels().remove("Item"), "'Bolt' extends it");
@@ -182,6 +200,39 @@ class SchemaTest {
         nut.getClassDef().getAttributes().add(a);
         assertSame(nut.getClassDef(), a.getClassDef());
         assertEquals("AttributeDef 'Nut.name' String", a.toString());
+    }
+
+    @Test
+    void editsThatStoredValuesWouldBreakAreRefusedAndChangeNothing() {
+        AttributeDef link = addAttr(part, "link", AttributeType.Relationship, false);
+        link.setTargetNames(new String[] {"Part"});
+        AttributeDef blobs = addAttr(bolt, "blobs", AttributeType.Binary, true);
+        Instance b = bolt.createInstance();
+        b.setValue("blobs", new byte[][] {{}, {1, 2, 3}});
+        b.setValue("link", b); // dropped with Part.link when Bolt leaves Part: no obstacle to that
+        part.createInstance().setValue("link", b);
+        Instance gone = part.createInstance();
+        gone.setValue("name", "plate \ud83d\udd29");
+        r.commit();
+        part.getInstances().remove(gone); // deleted: written with the states until the next commit
+        String before = dump(r);
+        AttributeDef name = r.getAttributeDef("Part.name");
+        Object[][] edits = {
+            {(Executable) () -> link.setTargetNames(new String[] {"Nut"}), "'Part.link'", "Part[#0]", "Bolt[#0]",
+                "class 'Bolt'"},
+            {(Executable) () -> bolt.getClassDef().setSuperName(null), "class 'Bolt'", "'Part.link'", "Part[#0]"},
+            {(Executable) () -> name.setLength(6), "'Part.name'", "Part[deleted]", "7 characters", " 6 "},
+            {(Executable) () -> blobs.setLength(2), "'Bolt.blobs'", "Bolt[#0]", "3 bytes", " 2 "},
+        };
+        for (Object[] e : edits) {
+            throwsWith(IllegalStateException.class, (Executable) e[0], Arrays.copyOfRange(e, 1, e.length, String[].class));
+            assertEquals(before, dump(r));
+        }
+        name.setLength(7);
+        blobs.setLength(3);
+        part.getInstances().getItem(0).clearValue("link");
+        bolt.getClassDef().setSuperName(null);
+        link.setTargetNames(new String[] {"Nut"});
     }
 
     @Test

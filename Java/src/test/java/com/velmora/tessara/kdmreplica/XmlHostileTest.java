@@ -2,22 +2,29 @@ package com.velmora.tessara.kdmreplica;
 
 import static com.velmora.tessara.kdmreplica.Fx.addAttr;
 import static com.velmora.tessara.kdmreplica.Fx.addClass;
+import static com.velmora.tessara.kdmreplica.Fx.throwsWith;
 import static com.velmora.tessara.kdmreplica.XmlFx.dump;
 import static com.velmora.tessara.kdmreplica.XmlFx.failsAt;
 import static org.junit.jupiter.api.Assertions.assertEquals;
 import static org.junit.jupiter.api.Assertions.assertFalse;
 import static org.junit.jupiter.api.Assertions.assertThrows;
 import static org.junit.jupiter.api.Assertions.assertTrue;
+import static org.junit.jupiter.api.Assumptions.assumeTrue;
 
+import java.io.File;
+import java.io.IOException;
 import java.nio.charset.StandardCharsets;
 import java.nio.file.Files;
 import java.nio.file.Path;
+import java.nio.file.Paths;
 import java.util.List;
 import java.util.function.Consumer;
 import java.util.stream.Stream;
 import org.junit.jupiter.api.AfterEach;
 import org.junit.jupiter.api.BeforeEach;
 import org.junit.jupiter.api.Test;
+import org.junit.jupiter.api.Timeout;
+import org.junit.jupiter.api.function.Executable;
 import org.junit.jupiter.api.io.TempDir;
 import org.junit.jupiter.params.ParameterizedTest;
 import org.junit.jupiter.params.provider.Arguments;
@@ -58,6 +65,7 @@ class XmlHostileTest {
     @AfterEach
     void tearDown() throws Exception {
         Replica.setFeature("validate", false);
+        Replica.setSchemaLocation(null);
         assertEquals(0, net.connections(), "nothing may be fetched from the network");
         net.close();
         assertEquals(before, dump(target), "the replica is unchanged");
@@ -327,5 +335,62 @@ class XmlHostileTest {
         assertThrows(IllegalArgumentException.class, () -> target.populatesFromXmlString(null));
         assertThrows(IllegalArgumentException.class, () -> Replica.readFromXmlFile(null));
         assertThrows(IllegalArgumentException.class, () -> target.insertSchemaString(null));
+    }
+
+    @Test
+    @Timeout(value = 60, threadMode = Timeout.ThreadMode.SEPARATE_THREAD) // a guard: opening a pipe blocks
+    void pipesDirectoriesAndDevicesAreRefusedUnopened() throws Exception {
+        Path fifo = dir.resolve("fifo.xml");
+        Process mkfifo;
+        try {
+            mkfifo = new ProcessBuilder("mkfifo", fifo.toString()).start();
+        } catch (IOException e) {
+            mkfifo = null;
+        }
+        assumeTrue(mkfifo != null && mkfifo.waitFor() == 0, "mkfifo makes the pipe");
+        for (Path p : new Path[] {fifo, Files.createDirectory(dir.resolve("dir.xsd")), Paths.get("/dev/zero")}) {
+            String path = p.toString();
+            String doc = "<replica xmlns=\"urn:corvexa:replica:1\""
+                    + " xmlns:xsi=\"http://www.w3.org/2001/XMLSchema-instance\""
+                    + " xsi:schemaLocation=\"urn:corvexa:replica:1 " + path + "\"/>";
+            // first a call that locks no replica of the test: a blocked one would hold that lock
+            for (Executable read : new Executable[] {() -> Replica.readFromXmlFile(path),
+                () -> Replica.readFromXmlString(doc), () -> target.populatesFromXmlFile(path),
+                () -> target.insertSchemaFile(path)}) {
+                throwsWith(IllegalArgumentException.class, read, "'" + path + "'", "not a regular file");
+            }
+        }
+    }
+
+    /** Reads by relative paths, in a process whose directory is not its user.dir (as after a native chdir). */
+    static final class ReadRelative {
+        public static void main(String[] args) {
+            Replica r = new Replica("r");
+            r.insertSchemaFile("s.xsd");
+            r.populatesFromXmlFile("d.xml");
+            System.out.print(r.getModels().getItem(0).getClassDef().getClassName() + " "
+                    + Replica.readFromXmlFile("d.xml").getName() + " "
+                    + Replica.readFromXmlString(args[0]).getModels().getItem(0).getClassDef().getClassName());
+        }
+    }
+
+    @Test
+    void relativePathsAreTakenFromTheProcessDirectoryNotFromUserDir() throws Exception {
+        Replica.setSchemaLocation("s.xsd");
+        for (String name : new String[] {"Here", "There"}) { // a schema and a document of the same names in each
+            Replica r = new Replica(name);
+            addClass(r, name, null);
+            Path d = Files.createDirectory(dir.resolve(name));
+            write(d.resolve("s.xsd"), r.getXsd());
+            write(d.resolve("d.xml"), r.getXml(false));
+        }
+        String cp = Paths.get(Replica.class.getProtectionDomain().getCodeSource().getLocation().toURI())
+                + File.pathSeparator
+                + Paths.get(ReadRelative.class.getProtectionDomain().getCodeSource().getLocation().toURI());
+        Process child = new ProcessBuilder(Paths.get(System.getProperty("java.home"), "bin", "java").toString(),
+                "-Duser.dir=" + dir.resolve("There"), "-cp", cp, ReadRelative.class.getName(),
+                Files.readString(dir.resolve("Here/d.xml"))).directory(dir.resolve("Here").toFile())
+                .redirectErrorStream(true).start();
+        assertEquals("Here Here Here", new String(child.getInputStream().readAllBytes(), StandardCharsets.UTF_8));
     }
 }
