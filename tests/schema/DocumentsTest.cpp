@@ -1,6 +1,10 @@
 // Replica documents end to end, against the real replica package: schemas in, XML in and out,
 // bytes in and out, and what a broken or hostile document does to the replica it was meant for.
+#include <sys/stat.h>
+#include <unistd.h>
+
 #include <cstdio>
+#include <cstdlib>
 #include <fstream>
 #include <string>
 
@@ -126,6 +130,35 @@ TEST(XmlDocuments, AreReadIntoAnUnbuiltOrABuiltProxyAndWrittenBackUnchanged)
   ASSERT_EQ(VLX_S_OK, target.GetXml(0, one));
   EXPECT_EQ(std::string::npos, Text(one).find("schema>"));
   EXPECT_NE(std::string::npos, standalone.find("schema>"));
+}
+
+// A relative path is the process's current directory's at the time of the call, whatever directory
+// the JVM started in: after chdir, a file of the same name elsewhere is not read.
+TEST(XmlDocuments, RelativePathsFollowTheCurrentDirectory)
+{
+  char started[4096];
+  ASSERT_NE(nullptr, getcwd(started, sizeof started));
+  const std::string root = ::testing::TempDir() + "corvexa-cwd-" + std::to_string(getpid());
+  VLXKDMReplica sample;
+  ReadSample(sample);
+  ASSERT_EQ(0, mkdir(root.c_str(), 0700));
+  for (const char* name : {"here", "elsewhere"}) {
+    const std::string dir = root + "/" + name;
+    ASSERT_EQ(0, mkdir(dir.c_str(), 0700));
+    ASSERT_EQ(VLX_S_OK, sample.SetName(VLXUnicodeString(name)));
+    std::ofstream(dir + "/doc.xml") << Xml(sample, 1, 0);
+    std::ofstream(dir + "/schema.xsd") << [&] { VLXUnicodeString x; sample.GetXsd(x); return Text(x); }();
+  }
+  ASSERT_EQ(0, chdir((root + "/elsewhere").c_str()));
+  VLXKDMReplica read, schema;
+  const long rc = VLXKDMReplica::ReadFromXmlFile(VLXUnicodeString("doc.xml"), read);
+  ASSERT_EQ(VLX_S_OK, schema.Build(VLXUnicodeString("schema")));
+  const long inserted = schema.InsertSchemaFile(VLXUnicodeString("../here/schema.xsd"));
+  ASSERT_EQ(0, chdir(started));
+  ASSERT_EQ(VLX_S_OK, rc);
+  EXPECT_EQ("elsewhere", Name(read));
+  EXPECT_EQ(VLX_S_OK, inserted);
+  std::system(("rm -rf " + root).c_str());
 }
 
 TEST(XmlDocuments, PendingChangesTravelOnlyWithTheStateFlag)
