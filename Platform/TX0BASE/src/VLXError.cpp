@@ -24,11 +24,9 @@ CatalogRegistry& Catalogs()
 }
 
 // The calling thread's last error; the slot owns one reference, released when the thread exits.
-// `fresh` says whether it was recorded since the operation mark.
 struct LastErrorSlot
 {
   VLXError* error = nullptr;
-  bool fresh = false;
   ~LastErrorSlot()
   {
     VLXError* e = error;
@@ -39,6 +37,10 @@ struct LastErrorSlot
 };
 
 thread_local LastErrorSlot t_lastError;
+// Whether the last error was recorded since the thread's operation mark. Kept apart from the slot,
+// which has a destructor: a trivial thread-local is reached without an initialisation check, and
+// the mark is made at the start of every operation.
+thread_local bool t_lastErrorFresh = false;
 }
 
 VLXError::VLXError(const char* messageId, const char* catalog)
@@ -167,7 +169,7 @@ long VLXError::GetReturn(int kind, VLXError* error, void*, const char* file, int
     error->SetSource(file, line);
     VLXError* previous = t_lastError.error;
     t_lastError.error = error;
-    t_lastError.fresh = true;
+    t_lastErrorFresh = true;
     // Released after the swap: `previous` may be `error` itself (a re-raise without a clean).
     if (previous != nullptr)
       previous->Release();
@@ -177,10 +179,10 @@ long VLXError::GetReturn(int kind, VLXError* error, void*, const char* file, int
 
 void VLXError::MarkOperationStart()
 {
-  t_lastError.fresh = false;
+  t_lastErrorFresh = false;
 }
 
 VLXError* VLXError::VLXGetOperationError()
 {
-  return t_lastError.fresh ? VLXGetLastError(0, nullptr) : nullptr;
+  return t_lastErrorFresh ? VLXGetLastError(0, nullptr) : nullptr;
 }
