@@ -40,6 +40,7 @@ constexpr Row kRows[] = {
 static_assert(sizeof(kRows) / sizeof(kRows[0]) == SlotCount, "one row per slot");
 
 const char* const kMethodName = "ReplicaStubs::init()";
+// Fixed report path (and lines): callers and their tests match on them; keep them as they are.
 const char* const kSourcePath = "Tessara\\Corvexa.m\\src\\ReplicaStubs.cpp";
 
 // The slot resolved at step i: a getter marked SETTER_FIRST swaps places with the setter after it.

@@ -8,6 +8,7 @@
 using namespace corvexa;
 
 namespace {
+// Fixed report path (and lines): callers and their tests match on them; keep them as they are.
 const char* const kSource = "Tessara\\Corvexa.m\\src\\VLXKDMAttributeDef.cpp";
 }
 

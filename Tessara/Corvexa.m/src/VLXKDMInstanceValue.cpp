@@ -16,6 +16,7 @@ using V = VLXKDMInstanceValue;
 
 using H = VLXJBXJNIHelper;
 
+// Fixed report path (and lines): callers and their tests match on them; keep them as they are.
 const char* const kSource = "Tessara\\Corvexa.m\\src\\VLXKDMInstanceValue.cpp";
 const int kLineUnknownClass = 99;
 const int kLineNoType = 380;

@@ -19,6 +19,7 @@
 namespace {
 
 // The source path that the error translation hands to GetReturn, with the line of each branch.
+// Fixed report path (and lines): callers and their tests match on them; keep them as they are.
 const char* const kSourcePath = "Tessara\\Corvexa.m\\src\\VLXKDMJavaObject.cpp";
 const int kLineNoEnvironment = 86;
 const int kLineSuccess = 96;

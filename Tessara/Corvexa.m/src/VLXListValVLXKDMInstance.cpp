@@ -5,6 +5,7 @@
 
 namespace {
 
+// Fixed report path (and lines): callers and their tests match on them; keep them as they are.
 const char* const kSource = "Tessara\\Corvexa.m\\src\\VLXListValVLXKDMInstance.cpp";
 
 // What an element read out of range (or one whose copy could not be made) stands for: an

@@ -23,6 +23,7 @@ namespace {
 using H = VLXJBXJNIHelper;
 
 // The unit whose path the converters' precondition reports carry.
+// Fixed report path (and lines): callers and their tests match on them; keep them as they are.
 const char* const kSource = "Tessara\\Corvexa.m\\src\\VLXKDMJavaObject.cpp";
 const int kLineUnattachedInstance = 157;
 const int kLineUnattachedElement = 192;

@@ -50,7 +50,7 @@ final class XsdReader {
             + " xs:import of local files";
 
     /** A class as read. */
-    private static final class TypeSpec {
+    private static final class DeclaredType {
         String name;
         String source;
         int line;
@@ -61,11 +61,11 @@ final class XsdReader {
         boolean abstractAttr;
         ClassDef props;
         boolean hasContent;
-        final List<ElemSpec> elems = new ArrayList<>();
+        final List<DeclaredElement> elems = new ArrayList<>();
     }
 
     /** An attribute as read. */
-    private static final class ElemSpec {
+    private static final class DeclaredElement {
         String name;
         int line;
         int column;
@@ -82,7 +82,7 @@ final class XsdReader {
     private final String refusal;
     private Path currentDir;
     private final Set<Path> visited = new HashSet<>();
-    private final List<TypeSpec> types = new ArrayList<>();
+    private final List<DeclaredType> types = new ArrayList<>();
 
     private XsdReader(Path schemaFile, String refusal) {
         this.refusal = refusal;
@@ -289,8 +289,8 @@ final class XsdReader {
         }
     }
 
-    private TypeSpec complexType(XmlSupport.In in) {
-        TypeSpec t = new TypeSpec();
+    private DeclaredType complexType(XmlSupport.In in) {
+        DeclaredType t = new DeclaredType();
         t.source = in.source;
         t.line = in.line();
         t.column = in.column();
@@ -338,7 +338,7 @@ final class XsdReader {
         return t;
     }
 
-    private static void content(XmlSupport.In in, TypeSpec t) {
+    private static void content(XmlSupport.In in, DeclaredType t) {
         if (t.hasContent) {
             throw in.fail("xs:complexType '" + t.name + "' has a second content model " + in.qname());
         }
@@ -371,7 +371,7 @@ final class XsdReader {
         return new String[] {ns == null ? "" : ns, local};
     }
 
-    private void complexContent(XmlSupport.In in, TypeSpec t) {
+    private void complexContent(XmlSupport.In in, DeclaredType t) {
         for (int i = 0; i < in.r.getAttributeCount(); i++) {
             String n = in.r.getAttributeLocalName(i);
             if (!plain(in, i) || !n.equals("id") && !(n.equals("mixed") && !bool(in, n, in.r.getAttributeValue(i)))) {
@@ -437,7 +437,7 @@ final class XsdReader {
         in.skip();
     }
 
-    private void sequence(XmlSupport.In in, TypeSpec t) {
+    private void sequence(XmlSupport.In in, DeclaredType t) {
         for (int i = 0; i < in.r.getAttributeCount(); i++) {
             String n = in.r.getAttributeLocalName(i);
             String v = in.r.getAttributeValue(i).strip();
@@ -472,8 +472,8 @@ final class XsdReader {
         throw in.fail(what + " '" + XmlSupport.clip(v) + "' of " + in.qname() + " is not a count");
     }
 
-    private ElemSpec localElement(XmlSupport.In in, TypeSpec t) {
-        ElemSpec e = new ElemSpec();
+    private DeclaredElement localElement(XmlSupport.In in, DeclaredType t) {
+        DeclaredElement e = new DeclaredElement();
         e.line = in.line();
         e.column = in.column();
         int min = 1;
@@ -530,7 +530,7 @@ final class XsdReader {
         return e;
     }
 
-    private static void resolveType(XmlSupport.In in, ElemSpec e, String type) {
+    private static void resolveType(XmlSupport.In in, DeclaredElement e, String type) {
         String[] q = qname(in, "type", type);
         if (XS.equals(q[0])) {
             switch (q[1]) {
@@ -562,7 +562,7 @@ final class XsdReader {
     }
 
     /** An anonymous simple or complex type: a restriction of a string or binary type by xs:maxLength. */
-    private static void anonymousType(XmlSupport.In in, ElemSpec e) {
+    private static void anonymousType(XmlSupport.In in, DeclaredElement e) {
         boolean complex = in.is(XS, "complexType");
         if (in.r.getAttributeCount() > 0) {
             throw unsupportedAttr(in, 0);
@@ -603,7 +603,7 @@ final class XsdReader {
         }
     }
 
-    private static void restriction(XmlSupport.In in, ElemSpec e, boolean complex) {
+    private static void restriction(XmlSupport.In in, DeclaredElement e, boolean complex) {
         String base = in.attr("base");
         if (base == null || in.r.getAttributeCount() != 1) {
             throw in.fail("xs:restriction in element '" + e.name + "' needs exactly a base");
@@ -638,7 +638,7 @@ final class XsdReader {
         }
     }
 
-    private static void annotation(XmlSupport.In in, TypeSpec t, ElemSpec e) {
+    private static void annotation(XmlSupport.In in, DeclaredType t, DeclaredElement e) {
         while (in.nextTag("xs:annotation") == XMLStreamConstants.START_ELEMENT) {
             if (in.is(XS, "documentation")) {
                 in.skip();
@@ -778,16 +778,16 @@ final class XsdReader {
 
     // ---------------------------------------------------------------- building
 
-    private static XmlDocumentException at(TypeSpec t, int line, int column, String message, Throwable cause) {
+    private static XmlDocumentException at(DeclaredType t, int line, int column, String message, Throwable cause) {
         return new XmlDocumentException(t.source, line, column, message, cause);
     }
 
     /** Adds the classes read to a staging (caller finishes or abandons it). */
     void apply(Staging st) {
         Replica r = st.replica();
-        Map<String, TypeSpec> byName = new LinkedHashMap<>();
-        for (TypeSpec t : types) {
-            TypeSpec first = byName.putIfAbsent(t.name, t);
+        Map<String, DeclaredType> byName = new LinkedHashMap<>();
+        for (DeclaredType t : types) {
+            DeclaredType first = byName.putIfAbsent(t.name, t);
             if (first != null) {
                 throw at(t, t.line, t.column, "class '" + t.name + "' is defined twice (first in " + first.source
                         + " at line " + first.line + ")", null);
@@ -796,19 +796,19 @@ final class XsdReader {
                 throw at(t, t.line, t.column, "replica '" + r.name + "' already has a class '" + t.name + "'", null);
             }
         }
-        for (TypeSpec t : types) {
+        for (DeclaredType t : types) {
             if (t.base != null && !byName.containsKey(t.base) && !r.models.byName.containsKey(t.base)) {
                 throw at(t, t.baseLine, t.baseColumn, "the base type '" + t.base + "' of class '" + t.name
                         + "' is not defined (neither in the schema nor in replica '" + r.name + "')", null);
             }
-            for (ElemSpec e : t.elems) {
+            for (DeclaredElement e : t.elems) {
                 if (e.classRef != null && !byName.containsKey(e.classRef) && !r.models.byName.containsKey(e.classRef)) {
                     throw at(t, e.line, e.column, "the type '" + e.classRef + "' of element '" + e.name + "' in class '"
                             + t.name + "' is not defined (neither in the schema nor in replica '" + r.name + "')", null);
                 }
             }
             LinkedHashSet<String> chain = new LinkedHashSet<>();
-            for (TypeSpec c = t; c != null; c = c.base == null ? null : byName.get(c.base)) {
+            for (DeclaredType c = t; c != null; c = c.base == null ? null : byName.get(c.base)) {
                 if (!chain.add(c.name)) {
                     throw at(t, t.line, t.column, "class '" + t.name + "' has a cyclic super class chain: "
                             + String.join(" -> ", chain) + " -> " + c.name, null);
@@ -816,11 +816,11 @@ final class XsdReader {
             }
         }
         List<ClassDef> made = new ArrayList<>();
-        for (TypeSpec t : types) {
+        for (DeclaredType t : types) {
             made.add(build(t));
         }
         for (int i = 0; i < made.size(); i++) {
-            TypeSpec t = types.get(i);
+            DeclaredType t = types.get(i);
             try {
                 st.addClass(made.get(i));
             } catch (IllegalArgumentException x) {
@@ -835,7 +835,7 @@ final class XsdReader {
         }
     }
 
-    private static ClassDef build(TypeSpec t) {
+    private static ClassDef build(DeclaredType t) {
         ClassDef c;
         try {
             c = new ClassDef(t.name);
@@ -857,7 +857,7 @@ final class XsdReader {
         } else {
             c.abstractClass = t.abstractAttr;
         }
-        for (ElemSpec e : t.elems) {
+        for (DeclaredElement e : t.elems) {
             AttributeDef a;
             try {
                 a = new AttributeDef(e.name, e.type);
