@@ -5,6 +5,9 @@
 
 #include "VLXError.h"
 
+#include <initializer_list>
+#include <string>
+
 namespace VLXJBXMessages
 {
 // The catalog name.
@@ -38,6 +41,11 @@ public:
   VLXJBXException(const VLXJBXException&) = default;
   VLXJBXException& operator=(const VLXJBXException&) = default;
   ~VLXJBXException() override;
+
+  // Records a new error of the catalog with `id` and `parameters` as the calling thread's last
+  // error, stamped with `file` and `line`, and returns `code`. The one way errors are raised.
+  static long Raise(long code, const char* id, std::initializer_list<std::string> parameters, const char* file,
+                    int line);
 };
 
 #endif

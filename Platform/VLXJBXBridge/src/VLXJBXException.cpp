@@ -41,6 +41,12 @@ VLXJBXException::~VLXJBXException() = default;
 long VLXJBXDetail::Raise(long code, const char* id, std::initializer_list<std::string> parameters, const char* file,
                          int line)
 {
+  return VLXJBXException::Raise(code, id, parameters, file, line);
+}
+
+long VLXJBXException::Raise(long code, const char* id, std::initializer_list<std::string> parameters,
+                            const char* file, int line)
+{
   VLXJBXException* error = new VLXJBXException(id, VLXJBXMessages::Catalog);
   if (error == nullptr) // out of memory: the code alone must do
     return code;

@@ -2,6 +2,7 @@
 #ifndef VLXJBXInternal_h
 #define VLXJBXInternal_h
 
+#include "VLXJBXLocalRef.h"
 #include "VLXUnicodeString.h"
 
 #include <jni.h>
@@ -12,31 +13,7 @@
 
 namespace VLXJBXDetail
 {
-// Owns one local reference and deletes it on every path.
-class LocalRef
-{
-public:
-  LocalRef(JNIEnv* env, jobject ref) : _env(env), _ref(ref) {}
-  ~LocalRef()
-  {
-    if (_ref != nullptr)
-      _env->DeleteLocalRef(_ref);
-  }
-  LocalRef(const LocalRef&) = delete;
-  LocalRef& operator=(const LocalRef&) = delete;
-  jobject get() const { return _ref; }
-  // Gives up ownership.
-  jobject release()
-  {
-    jobject r = _ref;
-    _ref = nullptr;
-    return r;
-  }
-
-private:
-  JNIEnv* _env;
-  jobject _ref;
-};
+using LocalRef = VLXJBXLocalRef;
 
 // Java classes and members of java.lang the bridge itself uses, resolved once per process through
 // uncounted global references that are never released. A member is null when its lookup failed.

@@ -118,20 +118,15 @@ long ToJavaArray(JNIEnv* env, const Element* data, int size, JArray (JNIEnv::*ma
   const long rc = Enter(env, operation);
   if (VLX_FAILED(rc))
     return rc;
-  JArray array = (env->*make)(size);
-  if (array == nullptr || env->ExceptionCheck()) {
-    if (array != nullptr)
-      env->DeleteLocalRef(array);
+  LocalRef array(env, (env->*make)(size));
+  if (array.get() == nullptr || env->ExceptionCheck())
     return JavaFailed(env, operation, "creating the array");
-  }
   if (size > 0) {
-    (env->*set)(array, 0, size, reinterpret_cast<const JElement*>(data));
-    if (env->ExceptionCheck()) {
-      env->DeleteLocalRef(array);
+    (env->*set)(static_cast<JArray>(array.get()), 0, size, reinterpret_cast<const JElement*>(data));
+    if (env->ExceptionCheck())
       return JavaFailed(env, operation, "filling the array");
-    }
   }
-  output = array;
+  output = static_cast<JArray>(array.release());
   return VLX_S_OK;
 }
 
@@ -223,8 +218,8 @@ long VLXJBXJNIConverter::ConvertToJavaType(JNIEnv* env, const VLXListValVLXUnico
                                          "element " + std::to_string(i) + " of the list", element);
     if (VLX_FAILED(converted))
       return converted;
+    const LocalRef owned(env, element);
     env->SetObjectArrayElement(result, i - 1, element);
-    env->DeleteLocalRef(element);
     if (env->ExceptionCheck())
       return JavaFailed(env, kOperation, "storing an element");
   }

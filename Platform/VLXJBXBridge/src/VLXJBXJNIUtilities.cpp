@@ -321,11 +321,10 @@ long VLXJBXJNIUtilities::HandleJavaError(JNIEnv* env, long code, const char* con
   if (env != nullptr && env->ExceptionCheck()) {
     if (flag != 0) {
       // ExceptionDescribe clears the exception: keep it to describe it afterwards.
-      jthrowable pending = env->ExceptionOccurred();
+      const LocalRef pending(env, env->ExceptionOccurred());
       env->ExceptionDescribe();
       env->ExceptionClear();
-      env->Throw(pending);
-      env->DeleteLocalRef(pending);
+      env->Throw(static_cast<jthrowable>(pending.get()));
     }
     if (error != nullptr) {
       env->ExceptionClear();

@@ -9,18 +9,18 @@
 
 #include <mutex>
 
+using VLXJBXDetail::LocalRef;
+
 namespace
 {
 jclass GlobalClass(JNIEnv* env, const char* name)
 {
-  jclass local = env->FindClass(name);
+  const LocalRef local(env, env->FindClass(name));
   if (env->ExceptionCheck()) {
     env->ExceptionClear();
     return nullptr;
   }
-  jclass global = static_cast<jclass>(env->NewGlobalRef(local));
-  env->DeleteLocalRef(local);
-  return global;
+  return static_cast<jclass>(env->NewGlobalRef(local.get()));
 }
 
 jmethodID Method(JNIEnv* env, jclass cls, const char* name, const char* signature)
@@ -69,19 +69,16 @@ const VLXJBXDetail::JavaLang& VLXJBXDetail::Lang(JNIEnv* env)
     lang.byteArrayClass = GlobalClass(env, "[B");
     lang.intArrayClass = GlobalClass(env, "[I");
     lang.doubleArrayClass = GlobalClass(env, "[D");
-    jclass classClass = env->FindClass("java/lang/Class");
+    const LocalRef classClass(env, env->FindClass("java/lang/Class"));
     if (env->ExceptionCheck())
       env->ExceptionClear();
-    lang.classGetName = Method(env, classClass, "getName", "()Ljava/lang/String;");
-    if (classClass != nullptr)
-      env->DeleteLocalRef(classClass);
-    jclass throwable = env->FindClass("java/lang/Throwable");
+    lang.classGetName = Method(env, static_cast<jclass>(classClass.get()), "getName", "()Ljava/lang/String;");
+    const LocalRef throwable(env, env->FindClass("java/lang/Throwable"));
     if (env->ExceptionCheck())
       env->ExceptionClear();
-    lang.throwableGetMessage = Method(env, throwable, "getMessage", "()Ljava/lang/String;");
-    lang.throwableGetCause = Method(env, throwable, "getCause", "()Ljava/lang/Throwable;");
-    if (throwable != nullptr)
-      env->DeleteLocalRef(throwable);
+    const jclass throwableClass = static_cast<jclass>(throwable.get());
+    lang.throwableGetMessage = Method(env, throwableClass, "getMessage", "()Ljava/lang/String;");
+    lang.throwableGetCause = Method(env, throwableClass, "getCause", "()Ljava/lang/Throwable;");
   });
   return lang;
 }

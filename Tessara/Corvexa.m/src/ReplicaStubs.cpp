@@ -7,6 +7,7 @@
 #include "VLXJBXException.h"
 #include "VLXJBXJNIHelper.h"
 #include "VLXJBXJNIUtilities.h"
+#include "VLXJBXLocalRef.h"
 #include "VLXKDMJavaObject.h"
 #include "VLXUnicodeString.h"
 
@@ -104,9 +105,8 @@ long ReplicaStubs::init(JNIEnv* env)
         jfieldID field = nullptr;
         status = VLXJBXJNIUtilities::GetStaticFieldID(_env, owner, row.name, signature, field);
         if (status >= 0) {
-          jobject constant = VLXJBXJNIHelper::GetStaticObjectField(_env, owner, field);
-          _slot[slot] = VLXJBXJNIHelper::NewGlobalRef(_env, constant);
-          VLXJBXJNIHelper::DeleteLocalRef(_env, constant);
+          const VLXJBXLocalRef constant(_env, VLXJBXJNIHelper::GetStaticObjectField(_env, owner, field));
+          _slot[slot] = VLXJBXJNIHelper::NewGlobalRef(_env, constant.get());
         } else {
           snprintf(_missing, sizeof _missing, "the Java constant %s.%s", ownerPath, row.name);
         }
@@ -128,9 +128,6 @@ long ReplicaStubs::init(JNIEnv* env)
 
 long ReplicaStubs::ReportUnbound(const char* methodName) const
 {
-  VLXJBXException* error = new VLXJBXException("VLXJBXInfraERR_1010", "VLXJBXInfraErrorMessages");
-  const VLXUnicodeString parameters[2] = {VLXUnicodeString(methodName), VLXUnicodeString(_missing)};
-  error->SetNLSRequestParams(2, parameters);
-  VLXError::VLXCleanLastError();
-  return VLXError::GetReturn(2, error, nullptr, kSourcePath, __LINE__);
+  return VLXJBXException::Raise(VLX_E_FAIL, VLXJBXMessages::BindingMissing, {methodName, _missing}, kSourcePath,
+                                __LINE__);
 }

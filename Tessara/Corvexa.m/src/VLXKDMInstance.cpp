@@ -26,14 +26,10 @@ struct IdentifierOut {
 // returns VLX_E_FAIL.
 inline long RejectIdentifier(JNIEnv* env, jobject identifier, const char* name)
 {
-  const std::string what =
-      "the identifier is " + ClassText(env, identifier) + ", neither a java.lang.String nor a byte array";
-  VLXJBXException* error = new VLXJBXException(VLXJBXMessages::ConversionFailed);
-  const VLXUnicodeString parameters[2] = {VLXUnicodeString(name), VLXUnicodeString(what.c_str())};
-  error->SetNLSRequestParams(2, parameters);
-  VLXError::VLXCleanLastError();
-  VLXError::GetReturn(2, error, nullptr, __FILE__, __LINE__);
-  return VLX_E_FAIL;
+  return VLXJBXException::Raise(
+      VLX_E_FAIL, VLXJBXMessages::ConversionFailed,
+      {name, "the identifier is " + ClassText(env, identifier) + ", neither a java.lang.String nor a byte array"},
+      __FILE__, __LINE__);
 }
 
 // "getID" answers null, a Java string or a Java byte array; the class is compared by identity.

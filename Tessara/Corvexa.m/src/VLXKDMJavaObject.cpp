@@ -26,8 +26,6 @@ const int kLineSuccess = 96;
 const int kLineReRaise = 102;
 const int kLineNewError = 108;
 
-const char* const kCatalog = "VLXJBXInfraErrorMessages";
-
 // Holds the library's mutex for one scope, when asked to.
 class MaybeLocked {
  public:
@@ -46,11 +44,9 @@ class MaybeLocked {
 
 // Raises a new error of our catalog naming methodName and the cause as the thread's last error.
 long RaiseNew(const char* messageId, const char* methodName, const VLXUnicodeString& cause, int line) {
-  VLXJBXException* error = new VLXJBXException(messageId, kCatalog);
-  const VLXUnicodeString parameters[2] = {VLXUnicodeString(methodName), cause};
-  error->SetNLSRequestParams(2, parameters);
-  VLXError::VLXCleanLastError();
-  return VLXError::GetReturn(2, error, nullptr, kSourcePath, line);
+  return VLXJBXException::Raise(VLX_E_FAIL, messageId,
+                                {methodName, std::string(cause.c_str(), static_cast<size_t>(cause.GetLengthInByte()))},
+                                kSourcePath, line);
 }
 
 // The text of the error that the current operation recorded, or the given text when it recorded none.
@@ -114,11 +110,10 @@ long VLXKDMJavaObject::StartJavaSide(JNIEnv* env)
   const VLXUnicodeString text("String or initialization");
   jstring probe = nullptr;
   const long status = VLXJBXJNIConverter::ConvertToJavaType(env, text, probe);
+  const corvexa::LocalRef owned(env, probe);
   if (status < 0) {
     fprintf(stderr, "Error VLXJBXJNIConverter::ConvertToJavaType replicaName\n");
     fflush(stderr);
-  } else {
-    VLXJBXJNIHelper::DeleteLocalRef(env, probe);
   }
   return status;
 }
