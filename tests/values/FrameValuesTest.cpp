@@ -58,7 +58,7 @@ struct Things {
 
   long Get(const char* name, VLXKDMInstanceValue& value)
   {
-    return Call(first, kGet, Instance_getValueNamed).with(VLXUnicodeString(name)).returning(value);
+    return Call(first, kGet, slot<Instance_getValueNamed>).with(VLXUnicodeString(name)).returning(value);
   }
 };
 
@@ -66,15 +66,15 @@ TEST(FrameValues, NativeValuesGoAsTheirJavaObjectsAndComeBackIntoAHolder)
 {
   Things t;
   const VLXUnicodeString count("count"), dates("dates"), others("others");
-  ASSERT_EQ(VLX_S_OK, Call(t.first, kSet, Instance_setValueNamed).with(count, AsJava(42)).run());
+  ASSERT_EQ(VLX_S_OK, Call(t.first, kSet, slot<Instance_setValueNamed>).with(count, AsJava(42)).run());
   VLXListValVLXTime times;
   times.Append(Seconds(10));
   times.Append(Seconds(3));
-  ASSERT_EQ(VLX_S_OK, Call(t.first, kSet, Instance_setValueNamed).with(dates, AsJava(times)).run());
+  ASSERT_EQ(VLX_S_OK, Call(t.first, kSet, slot<Instance_setValueNamed>).with(dates, AsJava(times)).run());
   VLXListValVLXKDMInstance both;
   both.Append(t.first);
   both.Append(t.second);
-  ASSERT_EQ(VLX_S_OK, Call(t.first, kSet, Instance_setValueNamed).with(others, AsJava(both)).run());
+  ASSERT_EQ(VLX_S_OK, Call(t.first, kSet, slot<Instance_setValueNamed>).with(others, AsJava(both)).run());
 
   VLXKDMInstanceValue value;
   ASSERT_EQ(VLX_S_OK, t.Get("count", value));
@@ -94,7 +94,7 @@ TEST(FrameValues, NativeValuesGoAsTheirJavaObjectsAndComeBackIntoAHolder)
   // An unattached instance is reported and nothing reaches Java.
   FatalRecorder recorder;
   both.Append(VLXKDMInstance());
-  EXPECT_LT(Call(t.first, kSet, Instance_setValueNamed).with(others, AsJava(both)).run(), 0);
+  EXPECT_LT(Call(t.first, kSet, slot<Instance_setValueNamed>).with(others, AsJava(both)).run(), 0);
   ASSERT_EQ(VLX_S_OK, t.Get("others", value));
   EXPECT_EQ(2, value.GetListOfInstance().Size());
 }
@@ -105,7 +105,7 @@ TEST(FrameValues, AHolderGoesAfterBuildRemoteAndAHolderWithoutTypeStopsTheCall)
   const VLXUnicodeString count("count");
   VLXKDMInstanceValue value;
   value.SetInteger(7);
-  ASSERT_EQ(VLX_S_OK, Call(t.first, kSet, Instance_setValueNamed).with(count, Remote(value)).run());
+  ASSERT_EQ(VLX_S_OK, Call(t.first, kSet, slot<Instance_setValueNamed>).with(count, Remote(value)).run());
   EXPECT_TRUE(IsExactly(value.GetHandle(), "java/lang/Integer"));
   VLXKDMInstanceValue read;
   ASSERT_EQ(VLX_S_OK, t.Get("count", read));
@@ -114,13 +114,13 @@ TEST(FrameValues, AHolderGoesAfterBuildRemoteAndAHolderWithoutTypeStopsTheCall)
   // BuildRemote runs before the name is converted: a bad name fails after the value got its object.
   VLXKDMInstanceValue pending;
   pending.SetInteger(8);
-  EXPECT_LT(Call(t.first, kSet, Instance_setValueNamed).with(VLXUnicodeString("\xC3"), Remote(pending)).run(), 0);
+  EXPECT_LT(Call(t.first, kSet, slot<Instance_setValueNamed>).with(VLXUnicodeString("\xC3"), Remote(pending)).run(), 0);
   EXPECT_NE(nullptr, pending.GetHandle());
 
   FatalRecorder recorder;
   VLXKDMInstanceValue untyped;
   ClearLastError();
-  EXPECT_LT(Call(t.first, kSet, Instance_setValueNamed).with(count, Remote(untyped)).run(), 0);
+  EXPECT_LT(Call(t.first, kSet, slot<Instance_setValueNamed>).with(count, Remote(untyped)).run(), 0);
   EXPECT_EQ(1u, FatalRecorder::Reports().size());
   ASSERT_EQ(VLX_S_OK, t.Get("count", read));
   EXPECT_EQ(7, read.GetInteger());  // no null was sent to clear it

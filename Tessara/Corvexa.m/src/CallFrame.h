@@ -24,6 +24,7 @@
 #pragma once
 
 #include <cstddef>
+#include <string_view>
 #include <tuple>
 #include <type_traits>
 #include <utility>
@@ -38,26 +39,82 @@ namespace corvexa {
 
 enum class Target { Handle, Class, Constructor };
 
-template <class... A>
+// A binding-table slot known at compile time: slot<Replica_getName>. The frame checks the slot's
+// JNI signature against the C++ types that cross at the call (SignatureFits below).
+template <Slot S>
+struct SlotTag {};
+template <Slot S>
+inline constexpr SlotTag<S> slot{};
+
+// ---- The signature check ----------------------------------------------------------------------
+// A row's JNI signature must fit the JNI types its call passes and receives: a drift between the
+// binding table and a call site fails the build instead of the user's process.
+
+// The length of the JNI type at the start of t ("I", "[B", "Ljava/lang/String;").
+constexpr std::size_t JniTypeLength(std::string_view t) {
+  std::size_t i = 0;
+  while (i < t.size() && t[i] == '[') ++i;
+  if (i < t.size() && t[i] == 'L')
+    while (i < t.size() && t[i] != ';') ++i;
+  return i + 1;
+}
+
+// Whether a value of the JNI type J passes for the JNI type t (any reference passes for an Object).
+template <class J>
+constexpr bool JniFits(std::string_view t) {
+  if constexpr (std::is_pointer_v<J>)
+    if (t == "Ljava/lang/Object;") return true;
+  if constexpr (std::is_void_v<J>) return t == "V";
+  else if constexpr (std::is_same_v<J, jint>) return t == "I";
+  else if constexpr (std::is_same_v<J, jboolean>) return t == "Z";
+  else if constexpr (std::is_same_v<J, jdouble>) return t == "D";
+  else if constexpr (std::is_same_v<J, jlong>) return t == "J";
+  else if constexpr (std::is_same_v<J, jstring>) return t == "Ljava/lang/String;";
+  else if constexpr (std::is_same_v<J, jbyteArray>) return t == "[B";
+  else if constexpr (std::is_same_v<J, jobjectArray>) return t.size() > 1 && t[0] == '[' && (t[1] == 'L' || t[1] == '[');
+  else if constexpr (std::is_same_v<J, jobject>) return !t.empty() && (t[0] == 'L' || t[0] == '[');
+  else return false;
+}
+
+// Whether the row of slot S is a method whose parameters are J... and whose result is Raw (a
+// constructor's is its new object).
+template <Slot S, class Raw, class... J>
+constexpr bool SignatureFits() {
+  const BindingRow row = kBindingRows[S];
+  if (row.signature == nullptr) return false;
+  const std::string_view signature(row.signature);
+  if (signature.empty() || signature[0] != '(') return false;
+  std::size_t at = 1;
+  bool fits = true;
+  auto parameter = [&](bool one) {
+    if (!fits || at >= signature.size() || signature[at] == ')') return fits = false;
+    const std::size_t length = JniTypeLength(signature.substr(at));
+    fits = one;
+    at += length;
+    return fits;
+  };
+  (parameter(JniFits<J>(signature.substr(at, JniTypeLength(signature.substr(at))))), ...);
+  if (!fits || at >= signature.size() || signature[at] != ')') return false;
+  const std::string_view result = signature.substr(at + 1);
+  if (std::string_view(row.name) == "<init>") return result == "V" && std::is_same_v<Raw, jobject>;
+  return JniFits<Raw>(result);
+}
+
+// ---- The frame -------------------------------------------------------------------------------
+
+template <Slot S, class... A>
 class Bound;
 
+template <Slot S>
 class Call {
  public:
   // An instance method of a built proxy.
-  Call(VLXKDMJavaObject& self, const char* name, Slot method)
-      : _self(&self), _name(name), _method(method), _class(SlotCount), _target(Target::Handle) {}
-
-  // A static method of the class in slot cls; no proxy is needed.
-  static Call Static(const char* name, Slot cls, Slot method) {
-    return Call(nullptr, name, method, cls, Target::Class);
-  }
-  // A new Java object of the class in slot cls, made by constructor ctor and attached to self; self
-  // need not be built.
-  static Call Construct(VLXKDMJavaObject& self, const char* name, Slot cls, Slot ctor) {
-    Call call(nullptr, name, ctor, cls, Target::Constructor);
-    call._created = &self;
-    return call;
-  }
+  Call(VLXKDMJavaObject& self, const char* name, SlotTag<S>)
+      : _self(&self), _name(name), _class(SlotCount), _target(Target::Handle) {}
+  // A static method of the class in slot cls (CallStatic), or a constructor of that class whose new
+  // object is attached to created (Construct).
+  Call(const char* name, Slot cls, Target target, VLXKDMJavaObject* created)
+      : _self(nullptr), _created(created), _name(name), _class(cls), _target(target) {}
 
   // The rest of a frame that an operation forwarding here has started on env (steps 1 to 3 done
   // for the same proxy, no exception pending); null runs the whole frame.
@@ -74,7 +131,7 @@ class Call {
 
   // The arguments, in the Java method's parameter order.
   template <class... A>
-  Bound<A...> with(const A&... args) const;
+  Bound<S, A...> with(const A&... args) const;
   // Shorthands for a method without arguments.
   template <class Out>
   long returning(Out&& out) const;
@@ -82,26 +139,34 @@ class Call {
   long construct() const;
 
  private:
-  template <class... A>
+  template <Slot, class...>
   friend class Bound;
-
-  Call(VLXKDMJavaObject* self, const char* name, Slot method, Slot cls, Target target)
-      : _self(self), _name(name), _method(method), _class(cls), _target(target) {}
 
   VLXKDMJavaObject* _self;
   VLXKDMJavaObject* _created = nullptr;
   JNIEnv* _started = nullptr;
   const char* _name;
-  Slot _method;
   Slot _class;
   Target _target;
   bool _rawConversionCode = false;
 };
 
-template <class... A>
+// A static method of the class in slot cls; no proxy is needed.
+template <Slot S>
+Call<S> CallStatic(const char* name, Slot cls, SlotTag<S>) {
+  return Call<S>(name, cls, Target::Class, nullptr);
+}
+// A new Java object of the class in slot cls, made by constructor S and attached to self; self
+// need not be built.
+template <Slot S>
+Call<S> Construct(VLXKDMJavaObject& self, const char* name, Slot cls, SlotTag<S>) {
+  return Call<S>(name, cls, Target::Constructor, &self);
+}
+
+template <Slot S, class... A>
 class Bound {
  public:
-  Bound(const Call& call, const A&... args) : _call(call), _args(args...) {}
+  Bound(const Call<S>& call, const A&... args) : _call(call), _args(args...) {}
 
   // The method returns a value that lands in out.
   template <class Out>
@@ -129,6 +194,10 @@ class Bound {
 
   template <class Result, class Out>
   long Execute(Out& out) {
+    // A forwarded operation makes its Java call through another, which is checked there.
+    static_assert(std::is_same_v<Result, Forwarded> ||
+                      SignatureFits<S, typename Result::Raw, typename ArgOf<A>::J...>(),
+                  "the binding table's signature of this slot does not fit the types the call passes");
     const char* const name = _call._name;
     JNIEnv* env = _call._started;                                                   // 1
     long status = VLX_S_OK;
@@ -200,7 +269,7 @@ class Bound {
   // Step 6: the Call*Method that fits the target and the Java return type.
   template <class Raw>
   Raw Invoke(JNIEnv* env, const ReplicaStubs& st, JArgs& jargs) {
-    const jmethodID method = st.Method(_call._method);
+    const jmethodID method = st.Method(S);
     return std::apply(
         [&](auto... j) -> Raw {
           switch (_call._target) {
@@ -232,20 +301,24 @@ class Bound {
         jargs);
   }
 
-  const Call& _call;
+  const Call<S>& _call;
   std::tuple<const A&...> _args;
 };
 
+template <Slot S>
 template <class... A>
-Bound<A...> Call::with(const A&... args) const {
-  return Bound<A...>(*this, args...);
+Bound<S, A...> Call<S>::with(const A&... args) const {
+  return Bound<S, A...>(*this, args...);
 }
+template <Slot S>
 template <class Out>
-long Call::returning(Out&& out) const {
+long Call<S>::returning(Out&& out) const {
   return with().returning(std::forward<Out>(out));
 }
-inline long Call::run() const { return with().run(); }
-inline long Call::construct() const { return with().construct(); }
+template <Slot S>
+long Call<S>::run() const { return with().run(); }
+template <Slot S>
+long Call<S>::construct() const { return with().construct(); }
 
 }  // namespace corvexa
 

@@ -29,6 +29,33 @@ enum Slot : int {
 };
 static_assert(SlotCount == 188, "the binding table has 188 slots");
 
+enum class BindingKind { Class, Method, Static, SetterFirst, Constant, Reserved };
+
+// One row of the binding table, as declared.
+struct BindingRow {
+  BindingKind kind;
+  const char* name;       // class path, member or field name
+  const char* signature;  // methods only
+};
+
+// The rows in slot order: read by init() and, at compile time, by the frame's signature check.
+inline constexpr BindingRow kBindingRows[] = {
+#define CLASS(name, path) {BindingKind::Class, path, nullptr},
+#define METHOD(name, member, signature) {BindingKind::Method, member, signature},
+#define STATIC(name, member, signature) {BindingKind::Static, member, signature},
+#define SETTER_FIRST(name, member, signature) {BindingKind::SetterFirst, member, signature},
+#define CONSTANT(name, field) {BindingKind::Constant, field, nullptr},
+#define RESERVED(name) {BindingKind::Reserved, nullptr, nullptr},
+#include "BindingTable.def"
+#undef CLASS
+#undef METHOD
+#undef STATIC
+#undef SETTER_FIRST
+#undef CONSTANT
+#undef RESERVED
+};
+static_assert(sizeof(kBindingRows) / sizeof(kBindingRows[0]) == SlotCount, "one row per slot");
+
 }  // namespace corvexa
 
 class CORVEXA_API ReplicaStubs {

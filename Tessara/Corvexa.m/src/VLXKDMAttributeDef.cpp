@@ -16,8 +16,8 @@ VLXKDM_PROXY_DEFINITIONS(VLXKDMAttributeDef, AttributeDef)
 
 long VLXKDMAttributeDef::Build(const VLXUnicodeString& name, VLXKDMAttributeType::Type type)
 {
-  return Call::Construct(*this, "VLXKDMAttributeDef::Build(const VLXUnicodeString&, VLXKDMAttributeType::Type)",
-                         AttributeDef, AttributeDef_new_name_type)
+  return Construct(*this, "VLXKDMAttributeDef::Build(const VLXUnicodeString&, VLXKDMAttributeType::Type)",
+                         AttributeDef, slot<AttributeDef_new_name_type>)
       .rawConversionCode()
       .with(name, Enum(type, {"AssertionFailed:type != NULL", kSource, 41}))
       .construct();
@@ -25,35 +25,35 @@ long VLXKDMAttributeDef::Build(const VLXUnicodeString& name, VLXKDMAttributeType
 
 long VLXKDMAttributeDef::GetAttributeName(VLXUnicodeString& name)
 {
-  return Call(*this, "VLXKDMAttributeDef::GetAttributeName(VLXUnicodeString&)", AttributeDef_getAttributeName)
+  return Call(*this, "VLXKDMAttributeDef::GetAttributeName(VLXUnicodeString&)", slot<AttributeDef_getAttributeName>)
       .returning(name);
 }
 
 long VLXKDMAttributeDef::GetAttributeType(VLXKDMAttributeType::Type& type)
 {
-  return Call(*this, "VLXKDMAttributeDef::GetAttributeType(VLXKDMAttributeType::Type&)", AttributeDef_getAttributeType)
+  return Call(*this, "VLXKDMAttributeDef::GetAttributeType(VLXKDMAttributeType::Type&)", slot<AttributeDef_getAttributeType>)
       .returning(Enum(type));
 }
 
 long VLXKDMAttributeDef::GetUuid(VLXUnicodeString& uuid)
 {
-  return Call(*this, "VLXKDMAttributeDef::GetUuid(VLXUnicodeString&)", AttributeDef_getUuid).returning(uuid);
+  return Call(*this, "VLXKDMAttributeDef::GetUuid(VLXUnicodeString&)", slot<AttributeDef_getUuid>).returning(uuid);
 }
 
 long VLXKDMAttributeDef::SetUuid(const VLXUnicodeString& uuid)
 {
-  return Call(*this, "VLXKDMAttributeDef::SetUuid(const VLXUnicodeString&)", AttributeDef_setUuid).with(uuid).run();
+  return Call(*this, "VLXKDMAttributeDef::SetUuid(const VLXUnicodeString&)", slot<AttributeDef_setUuid>).with(uuid).run();
 }
 
 long VLXKDMAttributeDef::GetQKAComment(VLXUnicodeString& comment)
 {
-  return Call(*this, "VLXKDMAttributeDef::GetQKAComment(VLXUnicodeString&)", AttributeDef_getQKAComment)
+  return Call(*this, "VLXKDMAttributeDef::GetQKAComment(VLXUnicodeString&)", slot<AttributeDef_getQKAComment>)
       .returning(comment);
 }
 
 long VLXKDMAttributeDef::SetQKAComment(const VLXUnicodeString& comment)
 {
-  return Call(*this, "VLXKDMAttributeDef::SetQKAComment(const VLXUnicodeString&)", AttributeDef_setQKAComment)
+  return Call(*this, "VLXKDMAttributeDef::SetQKAComment(const VLXUnicodeString&)", slot<AttributeDef_setQKAComment>)
       .rawConversionCode()
       .with(comment)
       .run();
@@ -61,14 +61,14 @@ long VLXKDMAttributeDef::SetQKAComment(const VLXUnicodeString& comment)
 
 long VLXKDMAttributeDef::GetTargetNames(VLXListOfVLXUnicodeString& names)
 {
-  return Call(*this, "VLXKDMAttributeDef::GetTargetNames(VLXListOfVLXUnicodeString&)", AttributeDef_getTargetNames)
+  return Call(*this, "VLXKDMAttributeDef::GetTargetNames(VLXListOfVLXUnicodeString&)", slot<AttributeDef_getTargetNames>)
       .returning(names);
 }
 
 long VLXKDMAttributeDef::SetTargetNames(const VLXListOfVLXUnicodeString& names)
 {
   return Call(*this, "VLXKDMAttributeDef::SetTargetNames(const VLXListOfVLXUnicodeString&)",
-              AttributeDef_setTargetNames)
+              slot<AttributeDef_setTargetNames>)
       .rawConversionCode()
       .with(names)
       .run();
@@ -82,13 +82,13 @@ long VLXKDMAttributeDef::SetTargetNames(int count, ...)
 
 long VLXKDMAttributeDef::GetTargetRefs(VLXListOfVLXUnicodeString& refs)
 {
-  return Call(*this, "VLXKDMAttributeDef::GetTargetRefs(VLXListOfVLXUnicodeString&)", AttributeDef_getTargetRefs)
+  return Call(*this, "VLXKDMAttributeDef::GetTargetRefs(VLXListOfVLXUnicodeString&)", slot<AttributeDef_getTargetRefs>)
       .returning(refs);
 }
 
 long VLXKDMAttributeDef::SetTargetRefs(const VLXListOfVLXUnicodeString& refs)
 {
-  return Call(*this, "VLXKDMAttributeDef::SetTargetRefs(const VLXListOfVLXUnicodeString&)", AttributeDef_setTargetRefs)
+  return Call(*this, "VLXKDMAttributeDef::SetTargetRefs(const VLXListOfVLXUnicodeString&)", slot<AttributeDef_setTargetRefs>)
       .with(refs)
       .run();
 }
@@ -102,27 +102,27 @@ long VLXKDMAttributeDef::SetTargetRefs(int count, ...)
 long VLXKDMAttributeDef::GetAggregationType(VLXKDMAggregationType::Type& type)
 {
   return Call(*this, "VLXKDMAttributeDef::GetAggregationType(VLXKDMAggregationType::Type&)",
-              AttributeDef_getAggregationType)
+              slot<AttributeDef_getAggregationType>)
       .returning(Enum(type));
 }
 
 long VLXKDMAttributeDef::SetAggregationType(VLXKDMAggregationType::Type type)
 {
   return Call(*this, "VLXKDMAttributeDef::SetAggregationType(VLXKDMAggregationType::Type)",
-              AttributeDef_setAggregationType)
+              slot<AttributeDef_setAggregationType>)
       .with(Enum(type, {"AssertionFailed:agg != NULL", kSource, 139}))
       .run();
 }
 
 long VLXKDMAttributeDef::GetAccessMode(VLXKDMAccessMode::Mode& mode)
 {
-  return Call(*this, "VLXKDMAttributeDef::GetAccessMode(VLXKDMAccessMode::Mode&)", AttributeDef_getAccessMode)
+  return Call(*this, "VLXKDMAttributeDef::GetAccessMode(VLXKDMAccessMode::Mode&)", slot<AttributeDef_getAccessMode>)
       .returning(Enum(mode));
 }
 
 long VLXKDMAttributeDef::SetAccessMode(VLXKDMAccessMode::Mode mode)
 {
-  return Call(*this, "VLXKDMAttributeDef::SetAccessMode(VLXKDMAccessMode::Mode)", AttributeDef_setAccessMode)
+  return Call(*this, "VLXKDMAttributeDef::SetAccessMode(VLXKDMAccessMode::Mode)", slot<AttributeDef_setAccessMode>)
       .with(Enum(mode, {"AssertionFailed:mode != NULL", kSource, 245}))
       .run();
 }
@@ -130,67 +130,67 @@ long VLXKDMAttributeDef::SetAccessMode(VLXKDMAccessMode::Mode mode)
 long VLXKDMAttributeDef::GetSoftwareVisibility(VLXKDMVisibility::Mode& visibility)
 {
   return Call(*this, "VLXKDMAttributeDef::GetSoftwareVisibility(VLXKDMVisibility::Mode&)",
-              AttributeDef_getSoftwareVisibility)
+              slot<AttributeDef_getSoftwareVisibility>)
       .returning(Enum(visibility));
 }
 
 long VLXKDMAttributeDef::SetSoftwareVisibility(VLXKDMVisibility::Mode visibility)
 {
   return Call(*this, "VLXKDMAttributeDef::SetSoftwareVisibility(VLXKDMVisibility::Mode)",
-              AttributeDef_setSoftwareVisibility)
+              slot<AttributeDef_setSoftwareVisibility>)
       .with(Enum(visibility, {"AssertionFailed:vis != NULL", kSource, 290}))
       .run();
 }
 
 long VLXKDMAttributeDef::GetLength(int& length)
 {
-  return Call(*this, "VLXKDMAttributeDef::GetLength(int&)", AttributeDef_getLength).returning(length);
+  return Call(*this, "VLXKDMAttributeDef::GetLength(int&)", slot<AttributeDef_getLength>).returning(length);
 }
 
 long VLXKDMAttributeDef::SetLength(int length)
 {
-  return Call(*this, "VLXKDMAttributeDef::SetLength(int)", AttributeDef_setLength).with(length).run();
+  return Call(*this, "VLXKDMAttributeDef::SetLength(int)", slot<AttributeDef_setLength>).with(length).run();
 }
 
 long VLXKDMAttributeDef::IsMandatory(VLXBoolean& isMandatory)
 {
-  return Call(*this, "VLXKDMAttributeDef::IsMandatory(VLXBoolean&)", AttributeDef_isMandatory).returning(isMandatory);
+  return Call(*this, "VLXKDMAttributeDef::IsMandatory(VLXBoolean&)", slot<AttributeDef_isMandatory>).returning(isMandatory);
 }
 
 long VLXKDMAttributeDef::SetMandatory(VLXBoolean isMandatory)
 {
-  return Call(*this, "VLXKDMAttributeDef::SetMandatory(VLXBoolean)", AttributeDef_setMandatory).with(isMandatory).run();
+  return Call(*this, "VLXKDMAttributeDef::SetMandatory(VLXBoolean)", slot<AttributeDef_setMandatory>).with(isMandatory).run();
 }
 
 long VLXKDMAttributeDef::IsMultiValuated(VLXBoolean& isMultiValuated)
 {
-  return Call(*this, "VLXKDMAttributeDef::IsMultiValuated(VLXBoolean&)", AttributeDef_isMultiValuated)
+  return Call(*this, "VLXKDMAttributeDef::IsMultiValuated(VLXBoolean&)", slot<AttributeDef_isMultiValuated>)
       .returning(isMultiValuated);
 }
 
 long VLXKDMAttributeDef::SetMultiValuation(VLXBoolean isMultiValuated)
 {
-  return Call(*this, "VLXKDMAttributeDef::SetMultiValuation(VLXBoolean)", AttributeDef_setMultiValuation)
+  return Call(*this, "VLXKDMAttributeDef::SetMultiValuation(VLXBoolean)", slot<AttributeDef_setMultiValuation>)
       .with(isMultiValuated)
       .run();
 }
 
 long VLXKDMAttributeDef::IsUnique(VLXBoolean& isUnique)
 {
-  return Call(*this, "VLXKDMAttributeDef::IsUnique(VLXBoolean&)", AttributeDef_isUnique).returning(isUnique);
+  return Call(*this, "VLXKDMAttributeDef::IsUnique(VLXBoolean&)", slot<AttributeDef_isUnique>).returning(isUnique);
 }
 
 long VLXKDMAttributeDef::SetUnicity(VLXBoolean isUnique)
 {
-  return Call(*this, "VLXKDMAttributeDef::SetUnicity(VLXBoolean)", AttributeDef_setUnicity).with(isUnique).run();
+  return Call(*this, "VLXKDMAttributeDef::SetUnicity(VLXBoolean)", slot<AttributeDef_setUnicity>).with(isUnique).run();
 }
 
 long VLXKDMAttributeDef::GetClassDef(VLXKDMClassDef& classDef)
 {
-  return Call(*this, "VLXKDMAttributeDef::GetClassDef(VLXKDMClassDef&)", AttributeDef_getClassDef).returning(classDef);
+  return Call(*this, "VLXKDMAttributeDef::GetClassDef(VLXKDMClassDef&)", slot<AttributeDef_getClassDef>).returning(classDef);
 }
 
 long VLXKDMAttributeDef::ToString(VLXUnicodeString& text)
 {
-  return Call(*this, "VLXKDMAttributeDef::ToString(VLXUnicodeString&)", AttributeDef_toString).returning(text);
+  return Call(*this, "VLXKDMAttributeDef::ToString(VLXUnicodeString&)", slot<AttributeDef_toString>).returning(text);
 }

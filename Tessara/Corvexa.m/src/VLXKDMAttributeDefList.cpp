@@ -9,12 +9,12 @@ VLXKDM_PROXY_DEFINITIONS(VLXKDMAttributeDefList, AttributeDefList)
 
 long VLXKDMAttributeDefList::GetCount(int& count)
 {
-  return Call(*this, "VLXKDMAttributeDefList::GetCount(int&)", AttributeDefList_getCount).returning(count);
+  return Call(*this, "VLXKDMAttributeDefList::GetCount(int&)", slot<AttributeDefList_getCount>).returning(count);
 }
 
 long VLXKDMAttributeDefList::GetItem(int position, VLXKDMAttributeDef& item)
 {
-  return Call(*this, "VLXKDMAttributeDefList::GetItem(int, VLXKDMAttributeDef&)", AttributeDefList_getItemAt)
+  return Call(*this, "VLXKDMAttributeDefList::GetItem(int, VLXKDMAttributeDef&)", slot<AttributeDefList_getItemAt>)
       .with(position)
       .returning(item);
 }
@@ -22,7 +22,7 @@ long VLXKDMAttributeDefList::GetItem(int position, VLXKDMAttributeDef& item)
 long VLXKDMAttributeDefList::GetItem(const VLXUnicodeString& name, VLXKDMAttributeDef& item)
 {
   return Call(*this, "VLXKDMAttributeDefList::GetItem(const VLXUnicodeString&, VLXKDMAttributeDef&)",
-              AttributeDefList_getItemNamed)
+              slot<AttributeDefList_getItemNamed>)
       .with(name)
       .returning(item);
 }
@@ -30,45 +30,45 @@ long VLXKDMAttributeDefList::GetItem(const VLXUnicodeString& name, VLXKDMAttribu
 long VLXKDMAttributeDefList::Includes(const VLXUnicodeString& name, VLXBoolean& included)
 {
   return Call(*this, "VLXKDMAttributeDefList::Includes(const VLXUnicodeString&, VLXBoolean&)",
-              AttributeDefList_includes)
+              slot<AttributeDefList_includes>)
       .with(name)
       .returning(included);
 }
 
 long VLXKDMAttributeDefList::IndexOf(const VLXKDMAttributeDef& item, int& position)
 {
-  return Call(*this, "VLXKDMAttributeDefList::IndexOf(const VLXKDMAttributeDef&, int&)", AttributeDefList_indexOf)
+  return Call(*this, "VLXKDMAttributeDefList::IndexOf(const VLXKDMAttributeDef&, int&)", slot<AttributeDefList_indexOf>)
       .with(item)
       .returning(position);
 }
 
 long VLXKDMAttributeDefList::IndexOf(const VLXUnicodeString& name, int& position)
 {
-  return Call(*this, "VLXKDMAttributeDefList::IndexOf(const VLXUnicodeString&, int&)", AttributeDefList_indexOfNamed)
+  return Call(*this, "VLXKDMAttributeDefList::IndexOf(const VLXUnicodeString&, int&)", slot<AttributeDefList_indexOfNamed>)
       .with(name)
       .returning(position);
 }
 
 long VLXKDMAttributeDefList::Add(const VLXKDMAttributeDef& item)
 {
-  return Call(*this, "VLXKDMAttributeDefList::Add(const VLXKDMAttributeDef&)", AttributeDefList_add).with(item).run();
+  return Call(*this, "VLXKDMAttributeDefList::Add(const VLXKDMAttributeDef&)", slot<AttributeDefList_add>).with(item).run();
 }
 
 long VLXKDMAttributeDefList::Remove(const VLXKDMAttributeDef& item)
 {
-  return Call(*this, "VLXKDMAttributeDefList::Remove(const VLXKDMAttributeDef&)", AttributeDefList_remove)
+  return Call(*this, "VLXKDMAttributeDefList::Remove(const VLXKDMAttributeDef&)", slot<AttributeDefList_remove>)
       .with(item)
       .run();
 }
 
 long VLXKDMAttributeDefList::Remove(const VLXUnicodeString& name)
 {
-  return Call(*this, "VLXKDMAttributeDefList::Remove(const VLXUnicodeString&)", AttributeDefList_removeNamed)
+  return Call(*this, "VLXKDMAttributeDefList::Remove(const VLXUnicodeString&)", slot<AttributeDefList_removeNamed>)
       .with(name)
       .run();
 }
 
 long VLXKDMAttributeDefList::Remove(int position)
 {
-  return Call(*this, "VLXKDMAttributeDefList::Remove(int)", AttributeDefList_removeAt).with(position).run();
+  return Call(*this, "VLXKDMAttributeDefList::Remove(int)", slot<AttributeDefList_removeAt>).with(position).run();
 }

@@ -15,80 +15,80 @@ VLXKDM_PROXY_DEFINITIONS(VLXKDMClassDef, ClassDef)
 
 long VLXKDMClassDef::Build(const VLXUnicodeString& name)
 {
-  return Call::Construct(*this, "VLXKDMClassDef::Build(const VLXUnicodeString&)", ClassDef, ClassDef_new_name)
+  return Construct(*this, "VLXKDMClassDef::Build(const VLXUnicodeString&)", ClassDef, slot<ClassDef_new_name>)
       .with(name)
       .construct();
 }
 
 long VLXKDMClassDef::Build()
 {
-  return Call::Construct(*this, "VLXKDMClassDef::Build()", ClassDef, ClassDef_new).construct();
+  return Construct(*this, "VLXKDMClassDef::Build()", ClassDef, slot<ClassDef_new>).construct();
 }
 
 long VLXKDMClassDef::GetClassName(VLXUnicodeString& name)
 {
-  return Call(*this, "VLXKDMClassDef::GetClassName(VLXUnicodeString&)", ClassDef_getClassName).returning(name);
+  return Call(*this, "VLXKDMClassDef::GetClassName(VLXUnicodeString&)", slot<ClassDef_getClassName>).returning(name);
 }
 
 long VLXKDMClassDef::SetClassName(const VLXUnicodeString& name)
 {
-  return Call(*this, "VLXKDMClassDef::SetClassName(const VLXUnicodeString&)", ClassDef_setClassName).with(name).run();
+  return Call(*this, "VLXKDMClassDef::SetClassName(const VLXUnicodeString&)", slot<ClassDef_setClassName>).with(name).run();
 }
 
 long VLXKDMClassDef::GetSuperName(VLXUnicodeString& name)
 {
-  return Call(*this, "VLXKDMClassDef::GetSuperName(VLXUnicodeString&)", ClassDef_getSuperName).returning(name);
+  return Call(*this, "VLXKDMClassDef::GetSuperName(VLXUnicodeString&)", slot<ClassDef_getSuperName>).returning(name);
 }
 
 long VLXKDMClassDef::SetSuperName(const VLXUnicodeString& name)
 {
-  return Call(*this, "VLXKDMClassDef::SetSuperName(const VLXUnicodeString&)", ClassDef_setSuperName).with(name).run();
+  return Call(*this, "VLXKDMClassDef::SetSuperName(const VLXUnicodeString&)", slot<ClassDef_setSuperName>).with(name).run();
 }
 
 long VLXKDMClassDef::GetUuid(VLXUnicodeString& uuid)
 {
-  return Call(*this, "VLXKDMClassDef::GetUuid(VLXUnicodeString&)", ClassDef_getUuid).returning(uuid);
+  return Call(*this, "VLXKDMClassDef::GetUuid(VLXUnicodeString&)", slot<ClassDef_getUuid>).returning(uuid);
 }
 
 long VLXKDMClassDef::SetUuid(const VLXUnicodeString& uuid)
 {
-  return Call(*this, "VLXKDMClassDef::SetUuid(const VLXUnicodeString&)", ClassDef_setUuid).with(uuid).run();
+  return Call(*this, "VLXKDMClassDef::SetUuid(const VLXUnicodeString&)", slot<ClassDef_setUuid>).with(uuid).run();
 }
 
 long VLXKDMClassDef::GetQKAComment(VLXUnicodeString& comment)
 {
-  return Call(*this, "VLXKDMClassDef::GetQKAComment(VLXUnicodeString&)", ClassDef_getQKAComment).returning(comment);
+  return Call(*this, "VLXKDMClassDef::GetQKAComment(VLXUnicodeString&)", slot<ClassDef_getQKAComment>).returning(comment);
 }
 
 long VLXKDMClassDef::SetQKAComment(const VLXUnicodeString& comment)
 {
-  return Call(*this, "VLXKDMClassDef::SetQKAComment(const VLXUnicodeString&)", ClassDef_setQKAComment)
+  return Call(*this, "VLXKDMClassDef::SetQKAComment(const VLXUnicodeString&)", slot<ClassDef_setQKAComment>)
       .with(comment)
       .run();
 }
 
 long VLXKDMClassDef::GetQKADerivability(VLXUnicodeString& derivability)
 {
-  return Call(*this, "VLXKDMClassDef::GetQKADerivability(VLXUnicodeString&)", ClassDef_getQKADerivability)
+  return Call(*this, "VLXKDMClassDef::GetQKADerivability(VLXUnicodeString&)", slot<ClassDef_getQKADerivability>)
       .returning(derivability);
 }
 
 long VLXKDMClassDef::SetQKADerivability(const VLXUnicodeString& derivability)
 {
-  return Call(*this, "VLXKDMClassDef::SetQKADerivability(const VLXUnicodeString&)", ClassDef_setQKADerivability)
+  return Call(*this, "VLXKDMClassDef::SetQKADerivability(const VLXUnicodeString&)", slot<ClassDef_setQKADerivability>)
       .with(derivability)
       .run();
 }
 
 long VLXKDMClassDef::GetScopeNames(VLXListOfVLXUnicodeString& names)
 {
-  return Call(*this, "VLXKDMClassDef::GetScopeNames(VLXListOfVLXUnicodeString&)", ClassDef_getScopeNames)
+  return Call(*this, "VLXKDMClassDef::GetScopeNames(VLXListOfVLXUnicodeString&)", slot<ClassDef_getScopeNames>)
       .returning(names);
 }
 
 long VLXKDMClassDef::SetScopeNames(const VLXListOfVLXUnicodeString& names)
 {
-  return Call(*this, "VLXKDMClassDef::SetScopeNames(const VLXListOfVLXUnicodeString&)", ClassDef_setScopeNames)
+  return Call(*this, "VLXKDMClassDef::SetScopeNames(const VLXListOfVLXUnicodeString&)", slot<ClassDef_setScopeNames>)
       .with(names)
       .run();
 }
@@ -101,69 +101,69 @@ long VLXKDMClassDef::SetScopeNames(int count, ...)
 
 long VLXKDMClassDef::IsAbstract(VLXBoolean& isAbstract)
 {
-  return Call(*this, "VLXKDMClassDef::IsAbstract(VLXBoolean&)", ClassDef_isAbstract).returning(isAbstract);
+  return Call(*this, "VLXKDMClassDef::IsAbstract(VLXBoolean&)", slot<ClassDef_isAbstract>).returning(isAbstract);
 }
 
 long VLXKDMClassDef::SetAbstract(VLXBoolean isAbstract)
 {
-  return Call(*this, "VLXKDMClassDef::SetAbstract(VLXBoolean)", ClassDef_setAbstract).with(isAbstract).run();
+  return Call(*this, "VLXKDMClassDef::SetAbstract(VLXBoolean)", slot<ClassDef_setAbstract>).with(isAbstract).run();
 }
 
 long VLXKDMClassDef::IsExtensible(VLXBoolean& isExtensible)
 {
-  return Call(*this, "VLXKDMClassDef::IsExtensible(VLXBoolean&)", ClassDef_isExtensible).returning(isExtensible);
+  return Call(*this, "VLXKDMClassDef::IsExtensible(VLXBoolean&)", slot<ClassDef_isExtensible>).returning(isExtensible);
 }
 
 long VLXKDMClassDef::SetExtensibility(VLXBoolean isExtensible)
 {
-  return Call(*this, "VLXKDMClassDef::SetExtensibility(VLXBoolean)", ClassDef_setExtensibility)
+  return Call(*this, "VLXKDMClassDef::SetExtensibility(VLXBoolean)", slot<ClassDef_setExtensibility>)
       .with(isExtensible)
       .run();
 }
 
 long VLXKDMClassDef::IsPersistent(VLXBoolean& isPersistent)
 {
-  return Call(*this, "VLXKDMClassDef::IsPersistent(VLXBoolean&)", ClassDef_isPersistent).returning(isPersistent);
+  return Call(*this, "VLXKDMClassDef::IsPersistent(VLXBoolean&)", slot<ClassDef_isPersistent>).returning(isPersistent);
 }
 
 long VLXKDMClassDef::SetPersistency(VLXBoolean isPersistent)
 {
-  return Call(*this, "VLXKDMClassDef::SetPersistency(VLXBoolean)", ClassDef_setPersistency).with(isPersistent).run();
+  return Call(*this, "VLXKDMClassDef::SetPersistency(VLXBoolean)", slot<ClassDef_setPersistency>).with(isPersistent).run();
 }
 
 long VLXKDMClassDef::GetClassType(VLXKDMClassType::Type& type)
 {
-  return Call(*this, "VLXKDMClassDef::GetClassType(VLXKDMClassType::Type&)", ClassDef_getClassType)
+  return Call(*this, "VLXKDMClassDef::GetClassType(VLXKDMClassType::Type&)", slot<ClassDef_getClassType>)
       .returning(Enum(type));
 }
 
 long VLXKDMClassDef::SetClassType(VLXKDMClassType::Type type)
 {
-  return Call(*this, "VLXKDMClassDef::SetClassType(VLXKDMClassType::Type)", ClassDef_setClassType)
+  return Call(*this, "VLXKDMClassDef::SetClassType(VLXKDMClassType::Type)", slot<ClassDef_setClassType>)
       .with(Enum(type, {"AssertionFailed:type != NULL", kSource, 341}))
       .run();
 }
 
 long VLXKDMClassDef::GetSoftwareVisibility(VLXKDMVisibility::Mode& visibility)
 {
-  return Call(*this, "VLXKDMClassDef::GetSoftwareVisibility(VLXKDMVisibility::Mode&)", ClassDef_getSoftwareVisibility)
+  return Call(*this, "VLXKDMClassDef::GetSoftwareVisibility(VLXKDMVisibility::Mode&)", slot<ClassDef_getSoftwareVisibility>)
       .returning(Enum(visibility));
 }
 
 long VLXKDMClassDef::SetSoftwareVisibility(VLXKDMVisibility::Mode visibility)
 {
-  return Call(*this, "VLXKDMClassDef::SetSoftwareVisibility(VLXKDMVisibility::Mode)", ClassDef_setSoftwareVisibility)
+  return Call(*this, "VLXKDMClassDef::SetSoftwareVisibility(VLXKDMVisibility::Mode)", slot<ClassDef_setSoftwareVisibility>)
       .with(Enum(visibility, {"AssertionFailed:vis != NULL", kSource, 211}))
       .run();
 }
 
 long VLXKDMClassDef::GetAttributes(VLXKDMAttributeDefList& attributes)
 {
-  return Call(*this, "VLXKDMClassDef::GetAttributes(VLXKDMAttributeDefList&)", ClassDef_getAttributes)
+  return Call(*this, "VLXKDMClassDef::GetAttributes(VLXKDMAttributeDefList&)", slot<ClassDef_getAttributes>)
       .returning(attributes);
 }
 
 long VLXKDMClassDef::ToString(VLXUnicodeString& text)
 {
-  return Call(*this, "VLXKDMClassDef::ToString(VLXUnicodeString&)", ClassDef_toString).returning(text);
+  return Call(*this, "VLXKDMClassDef::ToString(VLXUnicodeString&)", slot<ClassDef_toString>).returning(text);
 }

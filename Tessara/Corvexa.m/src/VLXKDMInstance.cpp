@@ -98,43 +98,43 @@ VLXKDM_PROXY_DEFINITIONS(VLXKDMInstance, Instance)
 
 long VLXKDMInstance::GetClassDef(VLXKDMClassDef& classDef)
 {
-  return Call(*this, "VLXKDMInstance::GetClassDef(VLXKDMClassDef&)", Instance_getClassDef).returning(classDef);
+  return Call(*this, "VLXKDMInstance::GetClassDef(VLXKDMClassDef&)", slot<Instance_getClassDef>).returning(classDef);
 }
 
 long VLXKDMInstance::GetID(VLXBoolean& noID, VLXBoolean& isText, VLXUnicodeString& text, VLXBinary& bytes)
 {
-  return Call(*this, "VLXKDMInstance::GetID(VLXBoolean&, VLXBoolean&, VLXUnicodeString&, VLXBinary&)", Instance_getID)
+  return Call(*this, "VLXKDMInstance::GetID(VLXBoolean&, VLXBoolean&, VLXUnicodeString&, VLXBinary&)", slot<Instance_getID>)
       .returning(IdentifierOut{noID, isText, text, bytes});
 }
 
 long VLXKDMInstance::SetID(const VLXUnicodeString& id)
 {
-  return Call(*this, "VLXKDMInstance::SetID(const VLXUnicodeString&)", Instance_setID).with(id).run();
+  return Call(*this, "VLXKDMInstance::SetID(const VLXUnicodeString&)", slot<Instance_setID>).with(id).run();
 }
 
 long VLXKDMInstance::SetID(const VLXBinary& id)
 {
-  return Call(*this, "VLXKDMInstance::SetID(const VLXBinary&)", Instance_setID).with(id).run();
+  return Call(*this, "VLXKDMInstance::SetID(const VLXBinary&)", slot<Instance_setID>).with(id).run();
 }
 
 long VLXKDMInstance::IsCreated(VLXBoolean& created)
 {
-  return Call(*this, "VLXKDMInstance::IsCreated(VLXBoolean&)", Instance_isCreated).returning(created);
+  return Call(*this, "VLXKDMInstance::IsCreated(VLXBoolean&)", slot<Instance_isCreated>).returning(created);
 }
 
 long VLXKDMInstance::IsModified(VLXBoolean& modified)
 {
-  return Call(*this, "VLXKDMInstance::IsModified(VLXBoolean&)", Instance_isModified).returning(modified);
+  return Call(*this, "VLXKDMInstance::IsModified(VLXBoolean&)", slot<Instance_isModified>).returning(modified);
 }
 
 long VLXKDMInstance::IsDeleted(VLXBoolean& deleted)
 {
-  return Call(*this, "VLXKDMInstance::IsDeleted(VLXBoolean&)", Instance_isDeleted).returning(deleted);
+  return Call(*this, "VLXKDMInstance::IsDeleted(VLXBoolean&)", slot<Instance_isDeleted>).returning(deleted);
 }
 
 long VLXKDMInstance::IsValuated(const VLXUnicodeString& name, VLXBoolean& valuated)
 {
-  return Call(*this, "VLXKDMInstance::IsValuated(const VLXUnicodeString&, VLXBoolean&)", Instance_isValuatedNamed)
+  return Call(*this, "VLXKDMInstance::IsValuated(const VLXUnicodeString&, VLXBoolean&)", slot<Instance_isValuatedNamed>)
       .rawConversionCode()
       .with(name)
       .returning(valuated);
@@ -142,29 +142,29 @@ long VLXKDMInstance::IsValuated(const VLXUnicodeString& name, VLXBoolean& valuat
 
 long VLXKDMInstance::IsValuated(int position, VLXBoolean& valuated)
 {
-  return Call(*this, "VLXKDMInstance::IsValuated(int, VLXBoolean&)", Instance_isValuatedAt)
+  return Call(*this, "VLXKDMInstance::IsValuated(int, VLXBoolean&)", slot<Instance_isValuatedAt>)
       .with(position)
       .returning(valuated);
 }
 
 long VLXKDMInstance::ClearValue(const VLXUnicodeString& name)
 {
-  return Call(*this, "VLXKDMInstance::ClearValue(const VLXUnicodeString&)", Instance_clearValueNamed).with(name).run();
+  return Call(*this, "VLXKDMInstance::ClearValue(const VLXUnicodeString&)", slot<Instance_clearValueNamed>).with(name).run();
 }
 
 long VLXKDMInstance::ClearValue(int position)
 {
-  return Call(*this, "VLXKDMInstance::ClearValue(int)", Instance_clearValueAt).with(position).run();
+  return Call(*this, "VLXKDMInstance::ClearValue(int)", slot<Instance_clearValueAt>).with(position).run();
 }
 
 long VLXKDMInstance::ToString(VLXUnicodeString& text)
 {
-  return Call(*this, "VLXKDMInstance::ToString(VLXUnicodeString&)", Instance_toString).returning(text);
+  return Call(*this, "VLXKDMInstance::ToString(VLXUnicodeString&)", slot<Instance_toString>).returning(text);
 }
 
 long VLXKDMInstance::ToString(VLXBoolean withValues, VLXUnicodeString& text)
 {
-  return Call(*this, "VLXKDMInstance::ToString(VLXBoolean, VLXUnicodeString&)", Instance_toStringWithValues)
+  return Call(*this, "VLXKDMInstance::ToString(VLXBoolean, VLXUnicodeString&)", slot<Instance_toStringWithValues>)
       .with(withValues)
       .returning(text);
 }
@@ -174,7 +174,7 @@ long VLXKDMInstance::ToString(VLXBoolean withValues, VLXUnicodeString& text)
 long VLXKDMInstance::GetValue(const VLXUnicodeString& name, VLXKDMInstanceValue& value)
 {
   const char* const text = "VLXKDMInstance::GetValue(const VLXUnicodeString&, VLXKDMInstanceValue&)";
-  return Call(*this, text, Instance_getValueNamed)
+  return Call(*this, text, slot<Instance_getValueNamed>)
       .rawConversionCode()
       .with(name)
       .returning(ValueOut<VLXUnicodeString>{value, *this, name, text});
@@ -183,21 +183,21 @@ long VLXKDMInstance::GetValue(const VLXUnicodeString& name, VLXKDMInstanceValue&
 long VLXKDMInstance::GetValue(int position, VLXKDMInstanceValue& value)
 {
   const char* const text = "VLXKDMInstance::GetValue(int, VLXKDMInstanceValue&)";
-  return Call(*this, text, Instance_getValueAt)
+  return Call(*this, text, slot<Instance_getValueAt>)
       .with(position)
       .returning(ValueOut<int>{value, *this, position, text});
 }
 
 long VLXKDMInstance::SetValue(const VLXUnicodeString& name, VLXKDMInstanceValue& value)
 {
-  return Call(*this, "VLXKDMInstance::SetValue(const VLXUnicodeString&, VLXKDMInstanceValue&)", Instance_setValueNamed)
+  return Call(*this, "VLXKDMInstance::SetValue(const VLXUnicodeString&, VLXKDMInstanceValue&)", slot<Instance_setValueNamed>)
       .with(name, Remote(value))
       .run();
 }
 
 long VLXKDMInstance::SetValue(int position, VLXKDMInstanceValue& value)
 {
-  return Call(*this, "VLXKDMInstance::SetValue(int, VLXKDMInstanceValue&)", Instance_setValueAt)
+  return Call(*this, "VLXKDMInstance::SetValue(int, VLXKDMInstanceValue&)", slot<Instance_setValueAt>)
       .with(position, Remote(value))
       .run();
 }
@@ -206,8 +206,9 @@ template <class Attribute>
 long VLXKDMInstance::SetObject(JNIEnv* started, const Attribute& attribute, jobject object)
 {
   constexpr bool kAt = std::is_same_v<Attribute, int>;
+  constexpr Slot kSetValue = kAt ? Instance_setValueAt : Instance_setValueNamed;
   return Call(*this, kAt ? "VLXKDMInstance::SetValue(int, jobject)" : "VLXKDMInstance::SetValue(const VLXUnicodeString&, jobject)",
-              kAt ? Instance_setValueAt : Instance_setValueNamed)
+              slot<kSetValue>)
       .startedOn(started)
       .with(attribute, object)
       .run();
@@ -222,8 +223,8 @@ long VLXKDMInstance::SetValue(int position, jobject object) { return SetObject(n
 template <class Attribute, class T>
 long VLXKDMInstance::SetConverted(const char* methodName, const Attribute& attribute, const T& value)
 {
-  const Slot setValue = std::is_same_v<Attribute, int> ? Instance_setValueAt : Instance_setValueNamed;
-  return Call(*this, methodName, setValue).with(AsJava(value)).forwardTo([&](JNIEnv* env, jobject object) {
+  constexpr Slot setValue = std::is_same_v<Attribute, int> ? Instance_setValueAt : Instance_setValueNamed;
+  return Call(*this, methodName, slot<setValue>).with(AsJava(value)).forwardTo([&](JNIEnv* env, jobject object) {
     return SetObject(env, attribute, object);
   });
 }

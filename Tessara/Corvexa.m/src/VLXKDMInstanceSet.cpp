@@ -9,34 +9,34 @@ VLXKDM_PROXY_DEFINITIONS(VLXKDMInstanceSet, InstanceSet)
 
 long VLXKDMInstanceSet::GetCount(int& count)
 {
-  return Call(*this, "VLXKDMInstanceSet::GetCount(int&)", InstanceSet_getCount).returning(count);
+  return Call(*this, "VLXKDMInstanceSet::GetCount(int&)", slot<InstanceSet_getCount>).returning(count);
 }
 
 long VLXKDMInstanceSet::GetItem(int position, VLXKDMInstance& instance)
 {
-  return Call(*this, "VLXKDMInstanceSet::GetItem(int, VLXKDMInstance&)", InstanceSet_getItem)
+  return Call(*this, "VLXKDMInstanceSet::GetItem(int, VLXKDMInstance&)", slot<InstanceSet_getItem>)
       .with(position)
       .returning(instance);
 }
 
 long VLXKDMInstanceSet::IndexOf(const VLXKDMInstance& instance, int& position)
 {
-  return Call(*this, "VLXKDMInstanceSet::IndexOf(const VLXKDMInstance&, int&)", InstanceSet_indexOf)
+  return Call(*this, "VLXKDMInstanceSet::IndexOf(const VLXKDMInstance&, int&)", slot<InstanceSet_indexOf>)
       .with(instance)
       .returning(position);
 }
 
 long VLXKDMInstanceSet::Remove(const VLXKDMInstance& instance)
 {
-  return Call(*this, "VLXKDMInstanceSet::Remove(const VLXKDMInstance&)", InstanceSet_remove).with(instance).run();
+  return Call(*this, "VLXKDMInstanceSet::Remove(const VLXKDMInstance&)", slot<InstanceSet_remove>).with(instance).run();
 }
 
 long VLXKDMInstanceSet::Remove(int position)
 {
-  return Call(*this, "VLXKDMInstanceSet::Remove(int)", InstanceSet_removeAt).with(position).run();
+  return Call(*this, "VLXKDMInstanceSet::Remove(int)", slot<InstanceSet_removeAt>).with(position).run();
 }
 
 long VLXKDMInstanceSet::RemoveAll()
 {
-  return Call(*this, "VLXKDMInstanceSet::RemoveAll()", InstanceSet_removeAll).run();
+  return Call(*this, "VLXKDMInstanceSet::RemoveAll()", slot<InstanceSet_removeAll>).run();
 }

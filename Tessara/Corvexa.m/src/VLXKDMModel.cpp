@@ -10,32 +10,32 @@ VLXKDM_PROXY_DEFINITIONS(VLXKDMModel, Model)
 
 long VLXKDMModel::Build(const VLXKDMClassDef& classDef)
 {
-  return Call::Construct(*this, "VLXKDMModel::Build(const VLXKDMClassDef&)", Model, Model_new_classDef)
+  return Construct(*this, "VLXKDMModel::Build(const VLXKDMClassDef&)", Model, slot<Model_new_classDef>)
       .with(classDef)
       .construct();
 }
 
 long VLXKDMModel::CreateInstance(VLXKDMInstance& instance)
 {
-  return Call(*this, "VLXKDMModel::CreateInstance(VLXKDMInstance&)", Model_createInstance).returning(instance);
+  return Call(*this, "VLXKDMModel::CreateInstance(VLXKDMInstance&)", slot<Model_createInstance>).returning(instance);
 }
 
 long VLXKDMModel::GetClassDef(VLXKDMClassDef& classDef)
 {
-  return Call(*this, "VLXKDMModel::GetClassDef(VLXKDMClassDef&)", Model_getClassDef).returning(classDef);
+  return Call(*this, "VLXKDMModel::GetClassDef(VLXKDMClassDef&)", slot<Model_getClassDef>).returning(classDef);
 }
 
 long VLXKDMModel::GetInstances(VLXKDMInstanceSet& instances)
 {
-  return Call(*this, "VLXKDMModel::GetInstances(VLXKDMInstanceSet&)", Model_getInstances).returning(instances);
+  return Call(*this, "VLXKDMModel::GetInstances(VLXKDMInstanceSet&)", slot<Model_getInstances>).returning(instances);
 }
 
 long VLXKDMModel::GetReplica(VLXKDMReplica& replica)
 {
-  return Call(*this, "VLXKDMModel::GetReplica(VLXKDMReplica&)", Model_getReplica).returning(replica);
+  return Call(*this, "VLXKDMModel::GetReplica(VLXKDMReplica&)", slot<Model_getReplica>).returning(replica);
 }
 
 long VLXKDMModel::ToString(VLXUnicodeString& text)
 {
-  return Call(*this, "VLXKDMModel::ToString(VLXUnicodeString&)", Model_toString).returning(text);
+  return Call(*this, "VLXKDMModel::ToString(VLXUnicodeString&)", slot<Model_toString>).returning(text);
 }

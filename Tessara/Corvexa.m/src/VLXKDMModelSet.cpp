@@ -9,26 +9,26 @@ VLXKDM_PROXY_DEFINITIONS(VLXKDMModelSet, ModelSet)
 
 long VLXKDMModelSet::GetCount(int& count)
 {
-  return Call(*this, "VLXKDMModelSet::GetCount(int&)", ModelSet_getCount).returning(count);
+  return Call(*this, "VLXKDMModelSet::GetCount(int&)", slot<ModelSet_getCount>).returning(count);
 }
 
 long VLXKDMModelSet::GetItem(int position, VLXKDMModel& model)
 {
-  return Call(*this, "VLXKDMModelSet::GetItem(int, VLXKDMModel&)", ModelSet_getItemAt)
+  return Call(*this, "VLXKDMModelSet::GetItem(int, VLXKDMModel&)", slot<ModelSet_getItemAt>)
       .with(position)
       .returning(model);
 }
 
 long VLXKDMModelSet::GetItem(const VLXUnicodeString& className, VLXKDMModel& model)
 {
-  return Call(*this, "VLXKDMModelSet::GetItem(const VLXUnicodeString&, VLXKDMModel&)", ModelSet_getItemNamed)
+  return Call(*this, "VLXKDMModelSet::GetItem(const VLXUnicodeString&, VLXKDMModel&)", slot<ModelSet_getItemNamed>)
       .with(className)
       .returning(model);
 }
 
 long VLXKDMModelSet::Includes(const VLXUnicodeString& className, VLXBoolean& included)
 {
-  return Call(*this, "VLXKDMModelSet::Includes(const VLXUnicodeString&, VLXBoolean&)", ModelSet_includes)
+  return Call(*this, "VLXKDMModelSet::Includes(const VLXUnicodeString&, VLXBoolean&)", slot<ModelSet_includes>)
       .rawConversionCode()
       .with(className)
       .returning(included);
@@ -36,34 +36,34 @@ long VLXKDMModelSet::Includes(const VLXUnicodeString& className, VLXBoolean& inc
 
 long VLXKDMModelSet::IndexOf(const VLXKDMClassDef& classDef, int& position)
 {
-  return Call(*this, "VLXKDMModelSet::IndexOf(const VLXKDMClassDef&, int&)", ModelSet_indexOf)
+  return Call(*this, "VLXKDMModelSet::IndexOf(const VLXKDMClassDef&, int&)", slot<ModelSet_indexOf>)
       .with(classDef)
       .returning(position);
 }
 
 long VLXKDMModelSet::IndexOf(const VLXUnicodeString& className, int& position)
 {
-  return Call(*this, "VLXKDMModelSet::IndexOf(const VLXUnicodeString&, int&)", ModelSet_indexOfNamed)
+  return Call(*this, "VLXKDMModelSet::IndexOf(const VLXUnicodeString&, int&)", slot<ModelSet_indexOfNamed>)
       .with(className)
       .returning(position);
 }
 
 long VLXKDMModelSet::Add(const VLXKDMModel& model)
 {
-  return Call(*this, "VLXKDMModelSet::Add(const VLXKDMModel&)", ModelSet_add).with(model).run();
+  return Call(*this, "VLXKDMModelSet::Add(const VLXKDMModel&)", slot<ModelSet_add>).with(model).run();
 }
 
 long VLXKDMModelSet::Remove(const VLXKDMClassDef& classDef)
 {
-  return Call(*this, "VLXKDMModelSet::Remove(const VLXKDMClassDef&)", ModelSet_remove).with(classDef).run();
+  return Call(*this, "VLXKDMModelSet::Remove(const VLXKDMClassDef&)", slot<ModelSet_remove>).with(classDef).run();
 }
 
 long VLXKDMModelSet::Remove(const VLXUnicodeString& className)
 {
-  return Call(*this, "VLXKDMModelSet::Remove(const VLXUnicodeString&)", ModelSet_removeNamed).with(className).run();
+  return Call(*this, "VLXKDMModelSet::Remove(const VLXUnicodeString&)", slot<ModelSet_removeNamed>).with(className).run();
 }
 
 long VLXKDMModelSet::Remove(int position)
 {
-  return Call(*this, "VLXKDMModelSet::Remove(int)", ModelSet_removeAt).with(position).run();
+  return Call(*this, "VLXKDMModelSet::Remove(int)", slot<ModelSet_removeAt>).with(position).run();
 }

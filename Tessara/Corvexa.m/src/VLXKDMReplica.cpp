@@ -10,24 +10,24 @@ VLXKDM_PROXY_DEFINITIONS(VLXKDMReplica, Replica)
 
 long VLXKDMReplica::Build()
 {
-  return Call::Construct(*this, "VLXKDMReplica::Build()", Replica, Replica_new).construct();
+  return Construct(*this, "VLXKDMReplica::Build()", Replica, slot<Replica_new>).construct();
 }
 
 long VLXKDMReplica::Build(const VLXUnicodeString& name)
 {
-  return Call::Construct(*this, "VLXKDMReplica::Build(const VLXUnicodeString&)", Replica, Replica_new_name)
+  return Construct(*this, "VLXKDMReplica::Build(const VLXUnicodeString&)", Replica, slot<Replica_new_name>)
       .with(name)
       .construct();
 }
 
 long VLXKDMReplica::GetName(VLXUnicodeString& name)
 {
-  return Call(*this, "VLXKDMReplica::GetName(VLXUnicodeString&)", Replica_getName).returning(name);
+  return Call(*this, "VLXKDMReplica::GetName(VLXUnicodeString&)", slot<Replica_getName>).returning(name);
 }
 
 long VLXKDMReplica::SetName(const VLXUnicodeString& name)
 {
-  return Call(*this, "VLXKDMReplica::SetName(const VLXUnicodeString&)", Replica_setName)
+  return Call(*this, "VLXKDMReplica::SetName(const VLXUnicodeString&)", slot<Replica_setName>)
       .rawConversionCode()
       .with(name)
       .run();
@@ -35,22 +35,22 @@ long VLXKDMReplica::SetName(const VLXUnicodeString& name)
 
 long VLXKDMReplica::ToString(VLXUnicodeString& text)
 {
-  return Call(*this, "VLXKDMReplica::ToString(VLXUnicodeString&)", Replica_toString).returning(text);
+  return Call(*this, "VLXKDMReplica::ToString(VLXUnicodeString&)", slot<Replica_toString>).returning(text);
 }
 
 long VLXKDMReplica::Commit()
 {
-  return Call(*this, "VLXKDMReplica::Commit()", Replica_commit).run();
+  return Call(*this, "VLXKDMReplica::Commit()", slot<Replica_commit>).run();
 }
 
 long VLXKDMReplica::GetModels(VLXKDMModelSet& models)
 {
-  return Call(*this, "VLXKDMReplica::GetModels(VLXKDMModelSet&)", Replica_getModels).returning(models);
+  return Call(*this, "VLXKDMReplica::GetModels(VLXKDMModelSet&)", slot<Replica_getModels>).returning(models);
 }
 
 long VLXKDMReplica::GetClassDef(const VLXUnicodeString& className, VLXKDMClassDef& classDef)
 {
-  return Call(*this, "VLXKDMReplica::GetClassDef(const VLXUnicodeString&, VLXKDMClassDef&)", Replica_getClassDef)
+  return Call(*this, "VLXKDMReplica::GetClassDef(const VLXUnicodeString&, VLXKDMClassDef&)", slot<Replica_getClassDef>)
       .with(className)
       .returning(classDef);
 }
@@ -58,7 +58,7 @@ long VLXKDMReplica::GetClassDef(const VLXUnicodeString& className, VLXKDMClassDe
 long VLXKDMReplica::GetAttributeDef(const VLXUnicodeString& attributeName, VLXKDMAttributeDef& attributeDef)
 {
   return Call(*this, "VLXKDMReplica::GetAttributeDef(const VLXUnicodeString&, VLXKDMAttributeDef&)",
-              Replica_getAttributeDef)
+              slot<Replica_getAttributeDef>)
       .with(attributeName)
       .returning(attributeDef);
 }
@@ -67,99 +67,99 @@ long VLXKDMReplica::GetAttributeDef(const VLXUnicodeString& attributeName, VLXKD
 
 long VLXKDMReplica::SetSchemaLocation(const VLXUnicodeString& location)
 {
-  return Call::Static("VLXKDMReplica::SetSchemaLocation(const VLXUnicodeString&)", Replica, Replica_setSchemaLocation)
+  return CallStatic("VLXKDMReplica::SetSchemaLocation(const VLXUnicodeString&)", Replica, slot<Replica_setSchemaLocation>)
       .with(location)
       .run();
 }
 
 long VLXKDMReplica::GetSchemaLocation(VLXUnicodeString& location)
 {
-  return Call(*this, "VLXKDMReplica::GetSchemaLocation(VLXUnicodeString&)", Replica_getSchemaLocation)
+  return Call(*this, "VLXKDMReplica::GetSchemaLocation(VLXUnicodeString&)", slot<Replica_getSchemaLocation>)
       .returning(location);
 }
 
 long VLXKDMReplica::SetFeature(const VLXUnicodeString& name, VLXBoolean value)
 {
-  return Call::Static("VLXKDMReplica::SetFeature(const VLXUnicodeString&, VLXBoolean)", Replica, Replica_setFeature)
+  return CallStatic("VLXKDMReplica::SetFeature(const VLXUnicodeString&, VLXBoolean)", Replica, slot<Replica_setFeature>)
       .with(name, value)
       .run();
 }
 
 long VLXKDMReplica::InsertSchemaFile(const VLXUnicodeString& path)
 {
-  return Call(*this, "VLXKDMReplica::InsertSchemaFile(const VLXUnicodeString&)", Replica_insertSchemaFile)
+  return Call(*this, "VLXKDMReplica::InsertSchemaFile(const VLXUnicodeString&)", slot<Replica_insertSchemaFile>)
       .with(path)
       .run();
 }
 
 long VLXKDMReplica::InsertSchemaString(const VLXUnicodeString& xsd)
 {
-  return Call(*this, "VLXKDMReplica::InsertSchemaString(const VLXUnicodeString&)", Replica_insertSchemaString)
+  return Call(*this, "VLXKDMReplica::InsertSchemaString(const VLXUnicodeString&)", slot<Replica_insertSchemaString>)
       .with(xsd)
       .run();
 }
 
 long VLXKDMReplica::PopulatesFromXmlFile(const VLXUnicodeString& path)
 {
-  return Call(*this, "VLXKDMReplica::PopulatesFromXmlFile(const VLXUnicodeString&)", Replica_populatesFromXmlFile)
+  return Call(*this, "VLXKDMReplica::PopulatesFromXmlFile(const VLXUnicodeString&)", slot<Replica_populatesFromXmlFile>)
       .with(path)
       .run();
 }
 
 long VLXKDMReplica::PopulatesFromXmlString(const VLXUnicodeString& xml)
 {
-  return Call(*this, "VLXKDMReplica::PopulatesFromXmlString(const VLXUnicodeString&)", Replica_populatesFromXmlString)
+  return Call(*this, "VLXKDMReplica::PopulatesFromXmlString(const VLXUnicodeString&)", slot<Replica_populatesFromXmlString>)
       .with(xml)
       .run();
 }
 
 long VLXKDMReplica::ReadFromXmlFile(const VLXUnicodeString& path, VLXKDMReplica& replica)
 {
-  return Call::Static("VLXKDMReplica::ReadFromXmlFile(const VLXUnicodeString&, VLXKDMReplica&)", Replica,
-                      Replica_readFromXmlFile)
+  return CallStatic("VLXKDMReplica::ReadFromXmlFile(const VLXUnicodeString&, VLXKDMReplica&)", Replica,
+                      slot<Replica_readFromXmlFile>)
       .with(path)
       .returning(replica);
 }
 
 long VLXKDMReplica::ReadFromXmlString(const VLXUnicodeString& xml, VLXKDMReplica& replica)
 {
-  return Call::Static("VLXKDMReplica::ReadFromXmlString(const VLXUnicodeString&, VLXKDMReplica&)", Replica,
-                      Replica_readFromXmlString)
+  return CallStatic("VLXKDMReplica::ReadFromXmlString(const VLXUnicodeString&, VLXKDMReplica&)", Replica,
+                      slot<Replica_readFromXmlString>)
       .with(xml)
       .returning(replica);
 }
 
 long VLXKDMReplica::GetXml(VLXBoolean withSchema, VLXUnicodeString& xml)
 {
-  return Call(*this, "VLXKDMReplica::GetXml(VLXBoolean, VLXUnicodeString&)", Replica_getXml)
+  return Call(*this, "VLXKDMReplica::GetXml(VLXBoolean, VLXUnicodeString&)", slot<Replica_getXml>)
       .with(withSchema)
       .returning(xml);
 }
 
 long VLXKDMReplica::GetXml(VLXBoolean withSchema, VLXBoolean withState, VLXUnicodeString& xml)
 {
-  return Call(*this, "VLXKDMReplica::GetXml(VLXBoolean, VLXBoolean, VLXUnicodeString&)", Replica_getXmlWithState)
+  return Call(*this, "VLXKDMReplica::GetXml(VLXBoolean, VLXBoolean, VLXUnicodeString&)", slot<Replica_getXmlWithState>)
       .with(withSchema, withState)
       .returning(xml);
 }
 
 long VLXKDMReplica::GetXsd(VLXUnicodeString& xsd)
 {
-  return Call(*this, "VLXKDMReplica::GetXsd(VLXUnicodeString&)", Replica_getXsd).returning(xsd);
+  return Call(*this, "VLXKDMReplica::GetXsd(VLXUnicodeString&)", slot<Replica_getXsd>).returning(xsd);
 }
 
 long VLXKDMReplica::GetBinaryFromReplica(const VLXKDMReplica& replica, VLXBoolean compressed, VLXBinary& bytes)
 {
-  return Call::Static("VLXKDMReplica::GetBinaryFromReplica(const VLXKDMReplica&, VLXBoolean, VLXBinary&)", Replica,
-                      Replica_getBinaryFromReplica)
+  return CallStatic("VLXKDMReplica::GetBinaryFromReplica(const VLXKDMReplica&, VLXBoolean, VLXBinary&)", Replica,
+                      slot<Replica_getBinaryFromReplica>)
       .with(replica, compressed)
       .returning(bytes);
 }
 
 long VLXKDMReplica::GetReplicaFromBinary(const VLXBinary& bytes, VLXBoolean compressed, VLXKDMReplica& replica)
 {
-  return Call::Static("VLXKDMReplica::GetReplicaFromBinary(const VLXBinary&, VLXBoolean, VLXKDMReplica&)", Replica,
-                      Replica_getReplicaFromBinary)
+  return CallStatic("VLXKDMReplica::GetReplicaFromBinary(const VLXBinary&, VLXBoolean, VLXKDMReplica&)", Replica,
+                      slot<Replica_getReplicaFromBinary>)
       .with(bytes, compressed)
       .returning(replica);
 }
