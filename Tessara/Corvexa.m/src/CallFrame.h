@@ -86,7 +86,7 @@ constexpr bool SignatureFits() {
   if (signature.empty() || signature[0] != '(') return false;
   std::size_t at = 1;
   bool fits = true;
-  auto parameter = [&](bool one) {
+  [[maybe_unused]] auto parameter = [&](bool one) {
     if (!fits || at >= signature.size() || signature[at] == ')') return fits = false;
     const std::size_t length = JniTypeLength(signature.substr(at));
     fits = one;

@@ -6,7 +6,6 @@
 #include <atomic>
 #include <jni.h>
 
-#include "CorvexaExport.h"
 
 namespace corvexa {
 
@@ -58,7 +57,7 @@ static_assert(sizeof(kBindingRows) / sizeof(kBindingRows[0]) == SlotCount, "one 
 
 }  // namespace corvexa
 
-class CORVEXA_API ReplicaStubs {
+class ReplicaStubs {
  public:
   // Sets no slot: init() fills them.
   ReplicaStubs();

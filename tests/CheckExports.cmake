@@ -1,0 +1,17 @@
+# Checks what the shared library exports: the marker function under its plain name and the API's
+# classes, and nothing of its internals (the frame in namespace corvexa, the binding table).
+execute_process(COMMAND nm -D -C --defined-only ${LIBRARY} OUTPUT_VARIABLE symbols RESULT_VARIABLE rc)
+if(NOT rc EQUAL 0)
+  message(FATAL_ERROR "nm failed on ${LIBRARY}")
+endif()
+foreach(wanted "T VELMORA_QKA2_INTERNAL_Corvexa\n" "VLXKDMReplica::GetName" "VLXKDMJavaObject::_st")
+  string(REGEX MATCH "${wanted}" found "${symbols}")
+  if(NOT found)
+    message(FATAL_ERROR "${LIBRARY} does not export ${wanted}")
+  endif()
+endforeach()
+string(REGEX MATCHALL "[^\n]*(corvexa::|ReplicaStubs)[^\n]*" internals "${symbols}")
+if(internals)
+  message(FATAL_ERROR "${LIBRARY} exports internals: ${internals}")
+endif()
+message(STATUS "the library exports its API only")
