@@ -1,11 +1,11 @@
 package com.velmora.tessara.kdmreplica;
 
-import static com.velmora.tessara.kdmreplica.BinaryFx.allocated;
-import static com.velmora.tessara.kdmreplica.BinaryFx.dump;
-import static com.velmora.tessara.kdmreplica.BinaryFx.generate;
-import static com.velmora.tessara.kdmreplica.BinaryFx.payloadOf;
-import static com.velmora.tessara.kdmreplica.BinaryFx.refused;
-import static com.velmora.tessara.kdmreplica.BinaryFx.seal;
+import static com.velmora.tessara.kdmreplica.Fx.allocated;
+import static com.velmora.tessara.kdmreplica.Fx.dump;
+import static com.velmora.tessara.kdmreplica.Fx.generate;
+import static com.velmora.tessara.kdmreplica.Fx.payloadOf;
+import static com.velmora.tessara.kdmreplica.Fx.refused;
+import static com.velmora.tessara.kdmreplica.Fx.seal;
 import static org.junit.jupiter.api.Assertions.assertArrayEquals;
 import static org.junit.jupiter.api.Assertions.assertEquals;
 import static org.junit.jupiter.api.Assertions.assertTrue;

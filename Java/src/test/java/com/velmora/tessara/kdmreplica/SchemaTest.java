@@ -3,7 +3,7 @@ package com.velmora.tessara.kdmreplica;
 import static com.velmora.tessara.kdmreplica.Fx.addAttr;
 import static com.velmora.tessara.kdmreplica.Fx.addClass;
 import static com.velmora.tessara.kdmreplica.Fx.throwsWith;
-import static com.velmora.tessara.kdmreplica.XmlFx.dump;
+import static com.velmora.tessara.kdmreplica.Fx.dump;
 import static org.junit.jupiter.api.Assertions.assertArrayEquals;
 import static org.junit.jupiter.api.Assertions.assertEquals;
 import static org.junit.jupiter.api.Assertions.assertFalse;

@@ -2,10 +2,11 @@ package com.velmora.tessara.kdmreplica;
 
 import static com.velmora.tessara.kdmreplica.Fx.addAttr;
 import static com.velmora.tessara.kdmreplica.Fx.addClass;
-import static com.velmora.tessara.kdmreplica.XmlFx.dump;
-import static com.velmora.tessara.kdmreplica.XmlFx.failsAt;
+import static com.velmora.tessara.kdmreplica.Fx.dump;
+import static com.velmora.tessara.kdmreplica.Fx.failsAt;
 import static org.junit.jupiter.api.Assertions.assertArrayEquals;
 import static org.junit.jupiter.api.Assertions.assertEquals;
+import static org.junit.jupiter.api.Assertions.assertFalse;
 import static org.junit.jupiter.api.Assertions.assertSame;
 
 import java.util.Date;
@@ -188,5 +189,37 @@ class XmlDocumentsTest {
         String expected = dump(target);
         Replica back = Replica.readFromXmlString(target.getXml(true));
         assertEquals(expected.replace("target", back.getName()), dump(back));
+    }
+
+    @Test
+    void handWrittenDocumentsMayUseCommentsCdataCharacterReferencesAndAnyOrder() {
+        Replica r = new Replica("target");
+        Model part = addClass(r, "Part", null);
+        addAttr(part, "name", AttributeType.String, false);
+        addAttr(part, "tags", AttributeType.String, true);
+        addAttr(part, "made", AttributeType.Date, false);
+        addAttr(part, "w", AttributeType.Double, false);
+        addAttr(part, "ok", AttributeType.Boolean, true);
+        r.populatesFromXmlString("<?xml version='1.0'?>\n<!-- a note -->\n"
+                + "<r:replica xmlns:r='urn:corvexa:replica:1'><?pi data?>\n"
+                + "  <r:Part id='p1'><r:tags>x</r:tags><!-- c --><r:name><![CDATA[<a&b>]]>&#13;&amp;</r:name>"
+                + "<r:made> 2024-02-29T23:30:00+02:30 </r:made><r:tags>y</r:tags><r:w> +1E3 </r:w>"
+                + "<r:ok>1</r:ok><r:ok> false </r:ok></r:Part>\n"
+                + "  <r:Part><r:made>2024-03-01T00:00:00</r:made><r:w>-INF</r:w></r:Part>\n"
+                + "  <r:Part><r:made>2024-03-01T24:00:00.000000Z</r:made><r:w>.5</r:w></r:Part>\n"
+                + "</r:replica>");
+        Instance p = part.getInstances().getItem(0);
+        assertFalse(p.isCreated(), "loaded instances are unchanged");
+        assertEquals("<a&b>\r&", p.getValue("name"));
+        assertArrayEquals(new String[] {"x", "y"}, (String[]) p.getValue("tags"));
+        assertEquals(Date.from(java.time.Instant.parse("2024-02-29T21:00:00Z")), p.getValue("made"));
+        assertEquals(1000.0, p.getValue("w"));
+        assertArrayEquals(new boolean[] {true, false}, (boolean[]) p.getValue("ok"));
+        Instance q = part.getInstances().getItem(1);
+        assertEquals(Date.from(java.time.Instant.parse("2024-03-01T00:00:00Z")), q.getValue("made"),
+                "a time without zone is UTC");
+        assertEquals(Double.NEGATIVE_INFINITY, q.getValue("w"));
+        assertEquals(Date.from(java.time.Instant.parse("2024-03-02T00:00:00Z")),
+                part.getInstances().getItem(2).getValue("made"), "24:00:00 is the end of the day");
     }
 }

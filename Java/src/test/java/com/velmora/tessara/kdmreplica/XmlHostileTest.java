@@ -3,8 +3,8 @@ package com.velmora.tessara.kdmreplica;
 import static com.velmora.tessara.kdmreplica.Fx.addAttr;
 import static com.velmora.tessara.kdmreplica.Fx.addClass;
 import static com.velmora.tessara.kdmreplica.Fx.throwsWith;
-import static com.velmora.tessara.kdmreplica.XmlFx.dump;
-import static com.velmora.tessara.kdmreplica.XmlFx.failsAt;
+import static com.velmora.tessara.kdmreplica.Fx.dump;
+import static com.velmora.tessara.kdmreplica.Fx.failsAt;
 import static org.junit.jupiter.api.Assertions.assertEquals;
 import static org.junit.jupiter.api.Assertions.assertFalse;
 import static org.junit.jupiter.api.Assertions.assertThrows;
@@ -39,14 +39,14 @@ class XmlHostileTest {
 
     @TempDir
     Path dir;
-    private XmlFx.Listener net;
+    private Fx.Listener net;
     private Path secret;
     private Replica target;
     private String before;
 
     @BeforeEach
     void setUp() throws Exception {
-        net = new XmlFx.Listener();
+        net = new Fx.Listener();
         secret = dir.resolve("secret.txt");
         Files.write(secret, SECRET.getBytes(StandardCharsets.US_ASCII));
         target = new Replica("target");

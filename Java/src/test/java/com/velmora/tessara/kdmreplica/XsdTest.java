@@ -2,8 +2,8 @@ package com.velmora.tessara.kdmreplica;
 
 import static com.velmora.tessara.kdmreplica.Fx.addAttr;
 import static com.velmora.tessara.kdmreplica.Fx.addClass;
-import static com.velmora.tessara.kdmreplica.XmlFx.dump;
-import static com.velmora.tessara.kdmreplica.XmlFx.failsAt;
+import static com.velmora.tessara.kdmreplica.Fx.dump;
+import static com.velmora.tessara.kdmreplica.Fx.failsAt;
 import static org.junit.jupiter.api.Assertions.assertArrayEquals;
 import static org.junit.jupiter.api.Assertions.assertEquals;
 import static org.junit.jupiter.api.Assertions.assertFalse;
@@ -39,7 +39,7 @@ class XsdTest {
     }
 
     private static Replica richWithData() {
-        Replica r = XmlFx.richSchema();
+        Replica r = Fx.richSchema();
         Instance s = r.getModels().getItem("Supplier_2").createInstance();
         s.setValue("name", "a\u0002");
         s.setValue("since", new Date(-1));
@@ -56,14 +56,14 @@ class XsdTest {
     @Test
     void theSchemaValidatesEveryDocumentOfTheReplicaAndConstrainsThem() throws Exception {
         Replica r = richWithData();
-        try (XmlFx.Listener net = new XmlFx.Listener()) {
+        try (Fx.Listener net = new Fx.Listener()) {
             Replica.setSchemaLocation(net.url("never-fetched.xsd"));
             for (boolean indent : new boolean[] {true, false}) {
                 Replica.setFeature("indent", indent);
                 String xsd = r.getXsd();
                 for (boolean schema : new boolean[] {false, true}) {
                     for (boolean state : new boolean[] {false, true}) {
-                        XmlFx.validate(xsd, r.getXml(schema, state));
+                        Fx.validate(xsd, r.getXml(schema, state));
                     }
                 }
             }
@@ -82,17 +82,17 @@ class XsdTest {
             {"<name esc=\"a\\u0002\"/>", "<name>x</name><name>y</name>"}, // single-valued twice
             {"<since>", "<until>"},
         };
-        XmlFx.validate(xsd, xml);
+        Fx.validate(xsd, xml);
         for (String[] t : tampered) {
             assertTrue(xml.contains(t[0]), t[0]);
             String bad = xml.replaceFirst(java.util.regex.Pattern.quote(t[0]), t[1]);
-            assertThrows(SAXException.class, () -> XmlFx.validate(xsd, bad), t[1]);
+            assertThrows(SAXException.class, () -> Fx.validate(xsd, bad), t[1]);
         }
     }
 
     @Test
     void writingThenInsertingGivesTheSchemaExactly() {
-        Replica r = XmlFx.richSchema();
+        Replica r = Fx.richSchema();
         for (boolean indent : new boolean[] {true, false}) {
             Replica.setFeature("indent", indent);
             Replica copy = new Replica(r.getName());
