@@ -10,13 +10,14 @@ import static org.junit.jupiter.api.Assertions.assertFalse;
 import static org.junit.jupiter.api.Assertions.assertNull;
 import static org.junit.jupiter.api.Assertions.assertSame;
 import static org.junit.jupiter.api.Assertions.assertThrows;
+import static org.junit.jupiter.api.Assertions.assertTrue;
 
 import java.util.Arrays;
 import org.junit.jupiter.api.BeforeEach;
 import org.junit.jupiter.api.Test;
 import org.junit.jupiter.api.function.Executable;
 
-/** Inheritance, schema checks, lookups and what schema changes do to existing instances. */
+/** Inheritance, schema checks, live collections, lookups and what schema changes do to existing instances. */
 class SchemaTest {
     private Replica r;
     private Model part;
@@ -245,5 +246,92 @@ class SchemaTest {
         w.setMultiValuation(true);
         p.setValue("weight", new double[] {1, 2});
         assertArrayEquals(new double[] {1, 2}, (double[]) p.getValue("weight"));
+    }
+
+    @Test
+    void positionsAreZeroBasedAbsentItemsAnswerNullOrMinusOneAndBadCallsChangeNothing() {
+        Instance x = part.createInstance();
+        Model other = addClass(r, "Other", null);
+        Instance y = other.createInstance();
+        ModelSet models = r.getModels();
+        AttributeDefList attrs = part.getClassDef().getAttributes();
+        InstanceSet set = part.getInstances();
+        assertSame(part, models.getItem(0));
+        assertSame(x, set.getItem(0));
+        assertEquals(0, set.indexOf(x));
+        assertEquals(-1, set.indexOf(y));
+        assertEquals(2, models.indexOf("Other"));
+        assertEquals(2, models.indexOf(other.getClassDef()));
+        assertEquals(1, attrs.indexOf(attrs.getItem("weight")));
+        assertTrue(attrs.includes("name"));
+        assertNull(models.getItem("Nope"));
+        assertEquals(-1, models.indexOf("Nope"));
+        assertEquals(-1, models.indexOf(new ClassDef("Part")));
+        assertFalse(models.includes("Nope"));
+        assertNull(attrs.getItem("b"));
+        assertEquals(-1, attrs.indexOf("b"));
+        assertEquals(-1, attrs.indexOf(new AttributeDef("name", AttributeType.String)));
+        Class<?> index = IndexOutOfBoundsException.class;
+        Class<?> arg = IllegalArgumentException.class;
+        Object[][] refusals = {
+            {index, (Executable) () -> models.getItem(3), "replica 'plant'", "position 3"},
+            {index, (Executable) () -> models.remove(-1), "position -1"},
+            {index, (Executable) () -> attrs.getItem(2), "class 'Part'", "position 2"},
+            {index, (Executable) () -> attrs.remove(5), "position 5"},
+            {index, (Executable) () -> set.getItem(-1), "class 'Part'", "position -1"},
+            {index, (Executable) () -> set.remove(1), "position 1", "count 1"},
+            {index, (Executable) () -> x.getValue(2), "Part[#0]", "position 2"},
+            {index, (Executable) () -> x.setValue(-1, 3), "position -1"},
+            {index, (Executable) () -> x.isValuated(2), "position 2"},
+            {index, (Executable) () -> x.clearValue(2), "position 2"},
+            {arg, (Executable) () -> models.remove("Nope"), "'Nope'"},
+            {arg, (Executable) () -> models.remove(new ClassDef("Part")), "'Part'"},
+            {arg, (Executable) () -> attrs.remove("b"), "'b'"},
+            {arg, (Executable) () -> attrs.remove(new AttributeDef("name", AttributeType.String)), "'name'",
+                "not in this list"},
+            {arg, (Executable) () -> set.remove(y), "Other[#0]", "not in this set"},
+            {arg, (Executable) () -> models.add(null), "model is null"},
+            {arg, (Executable) () -> models.add(part), "already in replica 'plant'"},
+            {arg, (Executable) () -> new Model(null), "null"},
+        };
+        String before = dump(r);
+        for (Object[] row : refusals) {
+            throwsWith(((Class<?>) row[0]).asSubclass(Throwable.class), (Executable) row[1],
+                    Arrays.copyOfRange(row, 2, row.length, String[].class));
+        }
+        assertEquals(before, dump(r));
+    }
+
+    @Test
+    void aRemovedModelLeavesWithItsInstancesAndMayJoinAgain() {
+        part.createInstance();
+        bolt.getClassDef().setSuperName(null);
+        r.getModels().remove(part.getClassDef());
+        assertNull(r.getClassDef("Part"));
+        assertNull(part.getReplica());
+        assertEquals(0, part.getInstances().getCount());
+        r.getModels().add(part);
+        assertEquals(2, part.createInstance().getClassDef().getAttributes().getCount());
+    }
+
+    @Test
+    void noArgumentConstructorsGiveUsableObjects() {
+        ModelSet ms = new ModelSet();
+        Model m = new Model();
+        ms.add(m);
+        assertTrue(m.getReplica().getName().startsWith("Replica"));
+        m.getClassDef().getAttributes().add(new AttributeDef());
+        m.createInstance().setValue(0, "a generated attribute is a String");
+        AttributeDefList list = new AttributeDefList();
+        list.add(new AttributeDef("a", AttributeType.Boolean));
+        assertTrue(list.getItem(0).getClassDef().getClassName().startsWith("Class"));
+        new InstanceSet().removeAll();
+        Instance detached = new Instance();
+        assertNull(detached.getClassDef());
+        detached.setID("free");
+        assertEquals("free", detached.getID());
+        throwsWith(IllegalArgumentException.class, () -> detached.getValue("x"), "'x'");
+        throwsWith(IllegalStateException.class, () -> new Model().createInstance(), "in no replica");
+        assertTrue(new Replica().getName().startsWith("Replica"));
     }
 }
