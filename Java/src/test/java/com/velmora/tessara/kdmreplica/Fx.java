@@ -290,6 +290,9 @@ final class Fx {
         }
     }
 
+    private static final Class<?>[] ELEMENTS = {int.class, double.class, String.class, Date.class, boolean.class,
+        byte[].class, Instance.class};
+
     static Object value(AttributeDef a, Random rnd, List<Instance> live) {
         AttributeType t = a.getAttributeType();
         if (t == AttributeType.Relationship && live.isEmpty()) {
@@ -299,57 +302,11 @@ final class Fx {
             return scalar(t, rnd, live);
         }
         int n = rnd.nextInt(4) == 0 ? 0 : rnd.nextInt(13);
-        switch (t) {
-            case Integer: {
-                int[] v = new int[n];
-                for (int i = 0; i < n; i++) {
-                    v[i] = (Integer) scalar(t, rnd, live);
-                }
-                return v;
-            }
-            case Double: {
-                double[] v = new double[n];
-                for (int i = 0; i < n; i++) {
-                    v[i] = (Double) scalar(t, rnd, live);
-                }
-                return v;
-            }
-            case Boolean: {
-                boolean[] v = new boolean[n];
-                for (int i = 0; i < n; i++) {
-                    v[i] = rnd.nextBoolean();
-                }
-                return v;
-            }
-            case String: {
-                String[] v = new String[n];
-                for (int i = 0; i < n; i++) {
-                    v[i] = text(rnd);
-                }
-                return v;
-            }
-            case Date: {
-                Date[] v = new Date[n];
-                for (int i = 0; i < n; i++) {
-                    v[i] = (Date) scalar(t, rnd, live);
-                }
-                return v;
-            }
-            case Binary: {
-                byte[][] v = new byte[n][];
-                for (int i = 0; i < n; i++) {
-                    v[i] = (byte[]) scalar(t, rnd, live);
-                }
-                return v;
-            }
-            default: {
-                Instance[] v = new Instance[n];
-                for (int i = 0; i < n; i++) {
-                    v[i] = live.get(rnd.nextInt(live.size()));
-                }
-                return v;
-            }
+        Object v = java.lang.reflect.Array.newInstance(ELEMENTS[t.ordinal()], n);
+        for (int i = 0; i < n; i++) {
+            java.lang.reflect.Array.set(v, i, scalar(t, rnd, live));
         }
+        return v;
     }
 
     private static <T> T pick(Random rnd, T[] values) {
