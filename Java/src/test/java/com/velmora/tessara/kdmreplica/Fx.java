@@ -148,30 +148,21 @@ final class Fx {
         } else if (v instanceof Date) {
             b.append("t").append(((Date) v).getTime());
         } else if (v instanceof byte[]) {
-            b.append("x").append(hex((byte[]) v));
+            b.append("x");
+            for (byte x : (byte[]) v) {
+                b.append(String.format("%02x", x));
+            }
         } else if (v instanceof Instance) {
             Instance t = (Instance) v;
-            String n = names.get(t);
-            if (n == null) {
-                n = t.getClassDef().getClassName() + "!" + outside.size();
-                names.put(t, n);
+            if (!names.containsKey(t)) {
+                names.put(t, t.getClassDef().getClassName() + "!" + outside.size());
                 outside.add(t);
             }
-            b.append(n);
-        } else if (v instanceof double[]) {
+            b.append(names.get(t));
+        } else if (v.getClass().isArray()) {
             b.append('[');
-            for (double d : (double[]) v) {
-                b.append(Long.toHexString(Double.doubleToRawLongBits(d))).append(',');
-            }
-            b.append(']');
-        } else if (v instanceof int[]) {
-            b.append(Arrays.toString((int[]) v));
-        } else if (v instanceof boolean[]) {
-            b.append(Arrays.toString((boolean[]) v));
-        } else if (v instanceof Object[]) {
-            b.append('[');
-            for (Object e : (Object[]) v) {
-                value(b, e, names, outside);
+            for (int i = 0; i < java.lang.reflect.Array.getLength(v); i++) {
+                value(b, java.lang.reflect.Array.get(v, i), names, outside);
                 b.append(',');
             }
             b.append(']');
@@ -182,30 +173,15 @@ final class Fx {
 
     static String esc(String s) {
         StringBuilder b = new StringBuilder("\"");
-        for (int i = 0; i < s.length(); i++) {
-            char c = s.charAt(i);
-            if (c >= 0x20 && c < 0x7F && c != '"' && c != '\\') {
-                b.append(c);
-            } else {
-                b.append(String.format("\\u%04x", (int) c));
-            }
+        for (char c : s.toCharArray()) {
+            b.append(c >= 0x20 && c < 0x7F && c != '"' && c != '\\' ? String.valueOf(c) : String.format("\\u%04x", (int) c));
         }
         return b.append('"').toString();
     }
 
     private static String escAll(String[] a) {
-        StringBuilder b = new StringBuilder("[");
-        for (String s : a) {
-            b.append(esc(s)).append(',');
-        }
-        return b.append(']').toString();
-    }
-
-    static String hex(byte[] a) {
         StringBuilder b = new StringBuilder();
-        for (byte x : a) {
-            b.append(String.format("%02x", x));
-        }
+        value(b, a, null, null);
         return b.toString();
     }
 
@@ -251,6 +227,23 @@ final class Fx {
         addAttr(sup, "name", AttributeType.String, false);
         addAttr(sup, "since", AttributeType.Date, false);
         addAttr(sup, "ok", AttributeType.Boolean, true);
+        return r;
+    }
+
+    /** The rich schema with pending instances: texts XML cannot carry, NaN payloads, a missing mandatory value. */
+    static Replica richWithData() {
+        Replica r = richSchema();
+        Instance s = r.getModels().getItem("Supplier_2").createInstance();
+        s.setValue("name", "a\u0002");
+        s.setValue("since", new Date(-1));
+        s.setValue("ok", new boolean[0]);
+        Instance b = r.getModels().getItem("Bolt").createInstance();
+        b.setID("b\n1");
+        b.setValue("supplier", s);
+        b.setValue("thread", 8);
+        b.setValue("blob", new byte[][] {{1, 2, 3, 4}, {}});
+        b.setValue("grade", new double[] {Double.NaN, Double.longBitsToDouble(0x7ff0000000000001L)});
+        r.getModels().getItem("Bolt").createInstance(); // mandatory 'name' missing: still a valid document
         return r;
     }
 
