@@ -169,7 +169,7 @@ class XmlHostileTest {
         return rows.stream();
     }
 
-    @ParameterizedTest(name = "{0}: {1}")
+    @ParameterizedTest(name = "[{index}] {0}: {3}")
     @MethodSource("refusedUnread")
     void hostileDocumentsAreRefusedUnread(String readers, String doc, int line, String[] fragments) {
         for (String name : readers.split(" ")) {
