@@ -97,33 +97,23 @@ class RoundTripTest {
         assertEquals(dump(r), dump(trip(r, f)), f.name());
     }
 
-    private static String allChars(int from, int to) {
-        StringBuilder b = new StringBuilder();
-        for (int c = from; c < to; c++) {
-            b.append((char) c);
-        }
-        return b.toString();
-    }
-
-    private static byte[] allBytes() {
-        byte[] b = new byte[256];
-        for (int i = 0; i < 256; i++) {
-            b[i] = (byte) i;
-        }
-        return b;
-    }
-
     static Stream<Arguments> edgeValues() {
         double nanPayload = Double.longBitsToDouble(0x7ff0000000000123L);
         double negativeNan = Double.longBitsToDouble(0xfff8000000000000L);
         long year0 = -62135596800001L; // 0000-12-31T23:59:59.999Z, proleptic
+        byte[] allBytes = new byte[256];
+        for (int i = 0; i < 256; i++) {
+            allBytes[i] = (byte) i;
+        }
         Object[][] rows = {
             {AttributeType.Integer, new Object[] {0, -1, Integer.MIN_VALUE, Integer.MAX_VALUE},
                 new Object[] {new int[0], new int[] {Integer.MIN_VALUE, 0, Integer.MAX_VALUE}}},
             {AttributeType.Double, new Object[] {0.0, -0.0, Double.NaN, nanPayload, negativeNan, Double.POSITIVE_INFINITY,
                 Double.NEGATIVE_INFINITY, Double.MIN_VALUE, -Double.MAX_VALUE, 0.1, 1.0 / 3, 1e-310, 123456789012345680.0},
                 new Object[] {new double[0], new double[] {-0.0, Double.NaN, nanPayload, 2.5e-300}}},
-            {AttributeType.String, new Object[] {"", " lead and trail ", "a\r\nb\rc\n", "\t", allChars(0, 0x20),
+            {AttributeType.String, new Object[] {"", " lead and trail ", "a\r\nb\rc\n", "\t",
+                "\u0000\u0001\u0002\u0003\u0004\u0005\u0006\u0007\b\t\n\u000b\f\r\u000e\u000f"
+                + "\u0010\u0011\u0012\u0013\u0014\u0015\u0016\u0017\u0018\u0019\u001a\u001b\u001c\u001d\u001e\u001f",
                 "\ufffe\uffff", "lone \ud800 high", "lone \udc00 low", "pair \ud83d\ude00", "back\\slash \\u0041",
                 "]]> <&> \"'", "\u0085\u2028 \u007f", "x".repeat(100_000) + "\u0000"},
                 new Object[] {new String[0], new String[] {""}, new String[] {"a\u0001", "", "\\", "\r"}}},
@@ -133,8 +123,8 @@ class RoundTripTest {
                 new Object[] {new Date[0], new Date[] {new Date(5), new Date(-5)}}},
             {AttributeType.Boolean, new Object[] {true, false},
                 new Object[] {new boolean[0], new boolean[] {true, false, false, true, true, false, true, true, true}}},
-            {AttributeType.Binary, new Object[] {new byte[0], new byte[] {-1}, allBytes()},
-                new Object[] {new byte[0][], new byte[][] {new byte[0], allBytes(), {0}}}},
+            {AttributeType.Binary, new Object[] {new byte[0], new byte[] {-1}, allBytes},
+                new Object[] {new byte[0][], new byte[][] {new byte[0], allBytes, {0}}}},
         };
         return Stream.of(Form.values()).flatMap(f -> Stream.of(rows).map(r -> Arguments.of(f, r[0], r[1], r[2])));
     }
