@@ -210,6 +210,13 @@ class BinaryHostileTest {
         return seal(o, false);
     }
 
+    /** A payload of that many classes, the rest written by the caller, sealed plain. */
+    private static byte[] sealed(int classes, Consumer<BinaryCodec.Out> build) {
+        BinaryCodec.Out o = start(classes);
+        build.accept(o);
+        return seal(o, false);
+    }
+
     private static byte[] changed(byte[] b, Consumer<byte[]> change) {
         byte[] c = b.clone();
         change.accept(c);
@@ -245,13 +252,11 @@ class BinaryHostileTest {
                 o.u8(4);
                 o.uvar(max - 1);
             }), false, "attribute count of class 'A' is 2147483646"),
-            row(sealed(o -> {
-                head(o, 1, null);
+            row(sealed(1, o -> {
                 cls(o, "A", "", INT);
                 o.uvar(max);
             }), false, "live instance count of class 'A' is 2147483647"),
-            row(sealed(o -> {
-                head(o, 1, null);
+            row(sealed(1, o -> {
                 cls(o, "A", "", INT);
                 o.uvar(0);
                 o.uvar(0);
@@ -289,48 +294,39 @@ class BinaryHostileTest {
             row(changed(plain, b -> b[7] = 1), false, "reserved header bytes"),
             row(changed(plain, b -> b[16] ^= 1), false, "checksum mismatch", "offset 16 of the buffer"),
             // classes
-            row(sealed(o -> {
-                head(o, 2, null);
+            row(sealed(2, o -> {
                 cls(o, "A", "");
                 cls(o, "A", "");
             }), false, "two classes are named 'A'"),
-            row(sealed(o -> {
-                head(o, 1, null);
+            row(sealed(1, o -> {
                 cls(o, "1A", "");
             }), false, "'1A' is not a valid name"),
-            row(sealed(o -> {
-                head(o, 1, null);
+            row(sealed(1, o -> {
                 cls(o, "A", "Zed");
             }), false, "class 'A' names super class 'Zed'"),
-            row(sealed(o -> {
-                head(o, 2, null);
+            row(sealed(2, o -> {
                 cls(o, "A", "B");
                 cls(o, "B", "A");
             }), false, "cyclic super class chain"),
-            row(sealed(o -> {
-                head(o, 1001, null);
+            row(sealed(1001, o -> {
                 for (int i = 0; i < 1001; i++) {
                     cls(o, "K" + i, i == 0 ? "" : "K" + (i - 1));
                 }
             }), false, "super class chain of class 'K1000' is longer than 1000"),
-            row(sealed(o -> {
-                head(o, 2, null);
+            row(sealed(2, o -> {
                 cls(o, "A", "", INT);
                 cls(o, "B", "A", STRING);
             }), false, "'B.a0' clashes with attribute 'A.a0'"),
-            Arguments.of("type code", sealed(o -> {
-                head(o, 1, null);
+            Arguments.of("type code", sealed(1, o -> {
                 cls(o, "A", "", INT);
                 o.b[at + 12] = 9; // the type code of a0
             }), false, at + 12, new String[] {"unknown type code 9 of attribute 'a0'"}),
-            row(sealed(o -> {
-                head(o, 1, null);
+            row(sealed(1, o -> {
                 cls(o, "A", "");
                 o.b[at + 7] = 0x40; // class flags
             }), false, "invalid flags 0x40 of class 'A'"),
             // instances and values
-            row(sealed(o -> {
-                head(o, 1, null);
+            row(sealed(1, o -> {
                 cls(o, "A", "");
                 o.uvar(2);
                 for (int i = 0; i < 2; i++) {
@@ -338,14 +334,12 @@ class BinaryHostileTest {
                     o.str("same");
                 }
             }), false, "already has a live instance with identifier \"same\""),
-            row(sealed(o -> {
-                head(o, 1, null);
+            row(sealed(1, o -> {
                 cls(o, "A", "");
                 o.uvar(1);
                 o.u8(4);
             }), false, "live instance of class 'A' has the state bits 0x4"),
-            row(sealed(o -> {
-                head(o, 1, null);
+            row(sealed(1, o -> {
                 cls(o, "A", "");
                 o.uvar(1);
                 o.u8(3 << 4);
@@ -361,8 +355,7 @@ class BinaryHostileTest {
                 x.zint(1);
                 x.u8(0);
             }), false, "1 bytes follow the last instance's values"),
-            row(sealed(o -> {
-                head(o, 1, null);
+            row(sealed(1, o -> {
                 cls(o, "A", "", INT);
                 o.raw(new byte[] {1, 0, 0, 0, 2});
             }), false, "presence bitmap of A[#0] marks attributes beyond its 1")));
