@@ -1,23 +1,29 @@
 package com.velmora.tessara.kdmreplica;
 
-import static com.velmora.tessara.kdmreplica.BinaryFx.allocated;
-import static com.velmora.tessara.kdmreplica.BinaryFx.dump;
-import static com.velmora.tessara.kdmreplica.BinaryFx.generate;
-import static com.velmora.tessara.kdmreplica.BinaryFx.payloadOf;
-import static com.velmora.tessara.kdmreplica.BinaryFx.refused;
-import static com.velmora.tessara.kdmreplica.BinaryFx.seal;
+import static com.velmora.tessara.kdmreplica.Fx.allocated;
+import static com.velmora.tessara.kdmreplica.Fx.dump;
+import static com.velmora.tessara.kdmreplica.Fx.generate;
+import static com.velmora.tessara.kdmreplica.Fx.payloadOf;
+import static com.velmora.tessara.kdmreplica.Fx.refused;
+import static com.velmora.tessara.kdmreplica.Fx.seal;
 import static org.junit.jupiter.api.Assertions.assertArrayEquals;
 import static org.junit.jupiter.api.Assertions.assertEquals;
 import static org.junit.jupiter.api.Assertions.assertTrue;
 
 import java.io.ByteArrayOutputStream;
+import java.util.ArrayList;
 import java.util.Arrays;
+import java.util.List;
 import java.util.Random;
 import java.util.function.Consumer;
+import java.util.stream.Stream;
 import java.util.zip.Deflater;
 import java.util.zip.DeflaterOutputStream;
 import org.junit.jupiter.api.Test;
 import org.junit.jupiter.api.Timeout;
+import org.junit.jupiter.params.ParameterizedTest;
+import org.junit.jupiter.params.provider.Arguments;
+import org.junit.jupiter.params.provider.MethodSource;
 
 /**
  * Truncated, corrupted and hostile binary replicas: each is refused with a
@@ -41,10 +47,21 @@ class BinaryHostileTest {
 
     private static BinaryCodec.Out start(int classes) {
         BinaryCodec.Out o = new BinaryCodec.Out(64);
+        head(o, classes, null);
+        return o;
+    }
+
+    /** The replica's name, location and class count; with a class name, that class up to its scope names. */
+    private static void head(BinaryCodec.Out o, int classes, String firstClass) {
         o.str("r");
         o.str("");
         o.uvar(classes);
-        return o;
+        if (firstClass != null) {
+            o.str(firstClass);
+            for (int i = 0; i < 4; i++) {
+                o.str("");
+            }
+        }
     }
 
     /** A class whose attributes are named a0, a1, ... with the given codes (type | MULTI). */
@@ -186,65 +203,177 @@ class BinaryHostileTest {
         return m;
     }
 
-    // ------------------------------------------------------------ impossible counts and lengths
+    /** Builds a payload and seals it, plain. */
+    private static byte[] sealed(Consumer<BinaryCodec.Out> build) {
+        BinaryCodec.Out o = new BinaryCodec.Out(64);
+        build.accept(o);
+        return seal(o, false);
+    }
 
-    @Test
-    void countsAndLengthsNearIntegerMaxValueAreRefusedWithoutAllocating() {
+    /** A payload of that many classes, the rest written by the caller, sealed plain. */
+    private static byte[] sealed(int classes, Consumer<BinaryCodec.Out> build) {
+        BinaryCodec.Out o = start(classes);
+        build.accept(o);
+        return seal(o, false);
+    }
+
+    private static byte[] changed(byte[] b, Consumer<byte[]> change) {
+        byte[] c = b.clone();
+        change.accept(c);
+        return c;
+    }
+
+    private static Arguments row(byte[] b, boolean compressed, String... fragments) {
+        return Arguments.of(fragments[0], b, compressed, -1, fragments);
+    }
+
+    /** Bad buffers: what the refusal must name (the first fragment labels the row), and at times where. */
+    static Stream<Arguments> refusals() {
         long max = Integer.MAX_VALUE;
-        BinaryCodec.Out o = start((int) max);
-        refused(seal(o, false), false, FACTOR, "class count is 2147483647");
-        refused(seal(o, true), true, FACTOR, "class count is 2147483647");
-
-        o = new BinaryCodec.Out(16);
-        o.uvar((max - 1) << 1);
-        refused(seal(o, false), false, FACTOR, "replica name announces 2147483646 bytes");
-
-        o = start(1);
-        o.str("A");
-        o.str("");
-        o.str("");
-        o.str("");
-        o.str("");
-        o.uvar(max);
-        refused(seal(o, false), false, FACTOR, "scope name of class 'A' count is 2147483647");
-        o.n -= 5;
-        o.uvar(0);
-        o.u8(4);
-        o.uvar(max - 1);
-        refused(seal(o, false), false, FACTOR, "attribute count of class 'A' is 2147483646");
-
-        o = start(1);
-        cls(o, "A", "", INT);
-        o.uvar(max);
-        refused(seal(o, false), false, FACTOR, "live instance count of class 'A' is 2147483647");
-
-        o = start(1);
-        cls(o, "A", "", INT);
-        o.uvar(0);
-        o.uvar(0);
-        o.uvar(max);
-        refused(seal(o, false), false, FACTOR, "count of instances outside the replica is 2147483647");
-
-        String[] array = {"an Integer", "a Double", "a String", "a Date", "a Boolean", "a Binary", "a Relationship"};
+        byte[] plain = Replica.getBinaryFromReplica(generate(5, 3), false);
+        byte[] packed = Replica.getBinaryFromReplica(generate(5, 3), true);
+        byte[] bomb = deflate(new byte[1 << 20], 256); // 256 MB of zeros in about 250 KB
+        byte[] payload = payloadOf(Replica.getBinaryFromReplica(generate(9, 3), false), false);
+        byte[] stream = deflate(payload, 1);
+        String[] arrays = {"an Integer", "a Double", "a String", "a Date", "a Boolean", "a Binary", "a Relationship"};
+        int at = start(1).n; // where the first class begins
+        List<Arguments> rows = new ArrayList<>(List.of(
+            // impossible counts and lengths, refused before anything of that size is made
+            row(seal(start((int) max), false), false, "class count is 2147483647"),
+            row(seal(start((int) max), true), true, "class count is 2147483647"),
+            row(sealed(o -> o.uvar((max - 1) << 1)), false, "replica name announces 2147483646 bytes"),
+            row(sealed(o -> {
+                head(o, 1, "A");
+                o.uvar(max);
+            }), false, "scope name of class 'A' count is 2147483647"),
+            row(sealed(o -> {
+                head(o, 1, "A");
+                o.uvar(0);
+                o.u8(4);
+                o.uvar(max - 1);
+            }), false, "attribute count of class 'A' is 2147483646"),
+            row(sealed(1, o -> {
+                cls(o, "A", "", INT);
+                o.uvar(max);
+            }), false, "live instance count of class 'A' is 2147483647"),
+            row(sealed(1, o -> {
+                cls(o, "A", "", INT);
+                o.uvar(0);
+                o.uvar(0);
+                o.uvar(max);
+            }), false, "count of instances outside the replica is 2147483647"),
+            row(oneValue(DOUBLE | MULTI, x -> {
+                x.uvar(2);
+                x.i64(0);
+                x.u8(0);
+            }), false, "Double array length is 2"),
+            row(oneValue(BINARY, x -> x.uvar(max)), false, "Binary value announces 2147483647 bytes"),
+            row(oneValue(STRING, x -> x.uvar(max << 1 | 1)), false, "String value announces 2147483647"),
+            row(oneValue(REL, x -> x.uvar(max)), false, "target is 2147483647, outside the 1 instances"),
+            row(oneValue(INT, x -> x.raw(new byte[] {-1, -1, -1, -1, 0x7F})), false,
+                    "malformed number in an Integer value"),
+            row(oneValue(DATE, x -> x.raw(new byte[] {-1, -1, -1, -1, -1, -1, -1, -1, -1, -1, -1})), false,
+                    "malformed number in a Date value"),
+            // header lengths that cannot be true
+            row(changed(plain, b -> Arrays.fill(b, 8, 12, (byte) 0xFF)), false, "announces a payload of 4294967295 bytes"),
+            row(changed(plain, b -> Arrays.fill(b, 12, 16, (byte) 0xFF)), false, "truncated", "4294967295 stored bytes"),
+            row(changed(packed, b -> Arrays.fill(b, 8, 12, (byte) 0xFF)), true, "more than the cap"),
+            row(Arrays.copyOf(plain, plain.length + 3), false, "stored bytes but " + (plain.length - 17) + " follow"),
+            // inflation
+            row(compressedBuffer(bomb, 1000), true, "inflates past the 1000 bytes"),
+            row(compressedBuffer(bomb, 0xFFFFFFFFL), true, "more than the cap"),
+            row(compressedBuffer(Arrays.copyOf(stream, stream.length + 4), payload.length), true,
+                    "4 bytes follow the end of the compressed stream"),
+            row(compressedBuffer(stream, payload.length + 1), true, "inflates to " + payload.length),
+            row(compressedBuffer(stream, payload.length), true, "checksum mismatch"),
+            row(compressedBuffer(changed(stream, b -> b[2] ^= 0x55), payload.length), true, "compressed stream"),
+            // header and checksum
+            Arguments.of("magic", changed(plain, b -> b[0] = 'X'), false, 0, new String[] {"not a binary replica"}),
+            row(changed(plain, b -> b[4] = 2), false, "unsupported version 2"),
+            row(changed(plain, b -> b[5] = 4), false, "unknown flags 0x4"),
+            row(changed(plain, b -> b[7] = 1), false, "reserved header bytes"),
+            row(changed(plain, b -> b[16] ^= 1), false, "checksum mismatch", "offset 16 of the buffer"),
+            // classes
+            row(sealed(2, o -> {
+                cls(o, "A", "");
+                cls(o, "A", "");
+            }), false, "two classes are named 'A'"),
+            row(sealed(1, o -> {
+                cls(o, "1A", "");
+            }), false, "'1A' is not a valid name"),
+            row(sealed(1, o -> {
+                cls(o, "A", "Zed");
+            }), false, "class 'A' names super class 'Zed'"),
+            row(sealed(2, o -> {
+                cls(o, "A", "B");
+                cls(o, "B", "A");
+            }), false, "cyclic super class chain"),
+            row(sealed(1001, o -> {
+                for (int i = 0; i < 1001; i++) {
+                    cls(o, "K" + i, i == 0 ? "" : "K" + (i - 1));
+                }
+            }), false, "super class chain of class 'K1000' is longer than 1000"),
+            row(sealed(2, o -> {
+                cls(o, "A", "", INT);
+                cls(o, "B", "A", STRING);
+            }), false, "'B.a0' clashes with attribute 'A.a0'"),
+            Arguments.of("type code", sealed(1, o -> {
+                cls(o, "A", "", INT);
+                o.b[at + 12] = 9; // the type code of a0
+            }), false, at + 12, new String[] {"unknown type code 9 of attribute 'a0'"}),
+            row(sealed(1, o -> {
+                cls(o, "A", "");
+                o.b[at + 7] = 0x40; // class flags
+            }), false, "invalid flags 0x40 of class 'A'"),
+            // instances and values
+            row(sealed(1, o -> {
+                cls(o, "A", "");
+                o.uvar(2);
+                for (int i = 0; i < 2; i++) {
+                    o.u8(1 << 4);
+                    o.str("same");
+                }
+            }), false, "already has a live instance with identifier \"same\""),
+            row(sealed(1, o -> {
+                cls(o, "A", "");
+                o.uvar(1);
+                o.u8(4);
+            }), false, "live instance of class 'A' has the state bits 0x4"),
+            row(sealed(1, o -> {
+                cls(o, "A", "");
+                o.uvar(1);
+                o.u8(3 << 4);
+            }), false, "unknown identifier kind 3"),
+            row(oneValue(BOOL, x -> x.u8(2)), false, "is the byte 2, not a Boolean"),
+            row(oneValue(BOOL | MULTI, x -> {
+                x.uvar(3);
+                x.u8(0x08);
+            }), false, "sets bits beyond its 3 elements"),
+            row(oneValue(STRING, x -> x.raw(new byte[] {4, (byte) 0xC3, 0x28})), false, "not valid UTF-8"),
+            row(oneValue(STRING, x -> x.raw(new byte[] {7, 0, 65, 0})), false, "odd number of bytes"),
+            row(oneValue(INT, x -> {
+                x.zint(1);
+                x.u8(0);
+            }), false, "1 bytes follow the last instance's values"),
+            row(sealed(1, o -> {
+                cls(o, "A", "", INT);
+                o.raw(new byte[] {1, 0, 0, 0, 2});
+            }), false, "presence bitmap of A[#0] marks attributes beyond its 1")));
         for (int type = INT; type <= REL; type++) {
-            String name = array[type];
-            refused(oneValue(type | MULTI, x -> x.uvar(max)), false, FACTOR, name + " array length is 2147483647");
+            rows.add(row(oneValue(type | MULTI, x -> x.uvar(max)), false, arrays[type] + " array length is 2147483647"));
         }
-        refused(oneValue(DOUBLE | MULTI, x -> {
-            x.uvar(2);
-            x.i64(0);
-            x.u8(0);
-        }), false, FACTOR, "Double array length is 2");
-        refused(oneValue(BINARY, x -> x.uvar(max)), false, FACTOR, "Binary value announces 2147483647 bytes");
-        refused(oneValue(STRING, x -> x.uvar(max << 1 | 1)), false, FACTOR, "String value announces 2147483647");
-        refused(oneValue(REL, x -> x.uvar(max)), false, FACTOR, "target is 2147483647, outside the 1 instances");
-        refused(oneValue(INT, x -> x.raw(new byte[] {(byte) 0xFF, (byte) 0xFF, (byte) 0xFF, (byte) 0xFF, 0x7F})),
-                false, FACTOR, "malformed number in an Integer value");
-        refused(oneValue(DATE, x -> {
-            for (int i = 0; i < 11; i++) {
-                x.u8(0xFF);
-            }
-        }), false, FACTOR, "malformed number in a Date value");
+        return rows.stream();
+    }
+
+    @ParameterizedTest(name = "{0}")
+    @MethodSource("refusals")
+    void badBuffersAreRefusedNamingWhatAndWhere(String label, byte[] bytes, boolean compressed, int offset,
+            String[] fragments) {
+        ReplicaBinaryException e = refused(bytes, compressed, FACTOR, fragments);
+        if (offset >= 0) {
+            assertEquals(offset, e.getOffset());
+            assertEquals(offset > 0, e.isPayloadOffset());
+        }
     }
 
     @Test
@@ -270,23 +399,6 @@ class BinaryHostileTest {
         }
         assertTrue(used[1] < used[0] + (1 << 20), "refusing the count allocated " + used[1] + " bytes, reading the"
                 + " schema alone " + used[0]);
-    }
-
-    @Test
-    void headerLengthsThatCannotBeTrueAreRefused() {
-        byte[] plain = Replica.getBinaryFromReplica(generate(5, 3), false);
-        byte[] packed = Replica.getBinaryFromReplica(generate(5, 3), true);
-        byte[] b = plain.clone();
-        Arrays.fill(b, 8, 12, (byte) 0xFF);
-        refused(b, false, FACTOR, "announces a payload of 4294967295 bytes");
-        b = plain.clone();
-        Arrays.fill(b, 12, 16, (byte) 0xFF);
-        refused(b, false, FACTOR, "truncated", "4294967295 stored bytes");
-        b = packed.clone();
-        Arrays.fill(b, 8, 12, (byte) 0xFF);
-        refused(b, true, FACTOR, "more than the cap");
-        b = Arrays.copyOf(plain, plain.length + 3);
-        refused(b, false, FACTOR, "stored bytes but " + (plain.length - 17) + " follow");
     }
 
     // ------------------------------------------------------------ inflation
@@ -318,125 +430,13 @@ class BinaryHostileTest {
 
     @Test
     @Timeout(120)
-    void compressedStreamsThatInflateTooFarAreStopped() {
-        byte[] bomb = deflate(new byte[1 << 20], 256); // 256 MB of zeros in about 250 KB
-        assertTrue(bomb.length < 1 << 20);
-        refused(compressedBuffer(bomb, 1000), true, FACTOR, "inflates past the 1000 bytes");
-        refused(compressedBuffer(bomb, 0xFFFFFFFFL), true, FACTOR, "more than the cap");
-        // An honest-looking length under the cap: inflation stops there, allocation stays near it.
+    void aBombUnderTheCapStopsInflatingAtTheDeclaredLength() {
+        byte[] bomb = deflate(new byte[1 << 20], 256);
         long declared = 64 << 20;
         assertTrue(declared < (long) bomb.length * BinaryCodec.MAX_INFLATE_RATIO);
         long before = allocated();
         refused(compressedBuffer(bomb, declared), true, 3L * BinaryCodec.MAX_INFLATE_RATIO, "inflates past the "
                 + declared + " bytes");
         assertTrue(allocated() - before < 3 * declared, "allocated " + (allocated() - before));
-
-        byte[] payload = payloadOf(Replica.getBinaryFromReplica(generate(9, 3), false), false);
-        byte[] stream = deflate(payload, 1);
-        byte[] tail = Arrays.copyOf(stream, stream.length + 4);
-        refused(compressedBuffer(tail, payload.length), true, FACTOR, "4 bytes follow the end of the compressed stream");
-        refused(compressedBuffer(stream, payload.length + 1), true, FACTOR, "inflates to " + payload.length);
-        refused(compressedBuffer(stream, payload.length), true, FACTOR, "checksum mismatch");
-        byte[] garbage = stream.clone();
-        garbage[2] ^= 0x55;
-        refused(compressedBuffer(garbage, payload.length), true, FACTOR, "compressed stream");
-    }
-
-    // ------------------------------------------------------------ invalid contents
-
-    @Test
-    void invalidContentIsRefusedNamingWhatAndWhere() {
-        byte[] valid = Replica.getBinaryFromReplica(generate(2, 2), false);
-        byte[] b = valid.clone();
-        b[0] = 'X';
-        assertEquals(0, refused(b, false, FACTOR, "not a binary replica").getOffset());
-        b = valid.clone();
-        b[4] = 2;
-        refused(b, false, FACTOR, "unsupported version 2");
-        b = valid.clone();
-        b[5] = 4;
-        refused(b, false, FACTOR, "unknown flags 0x4");
-        b = valid.clone();
-        b[7] = 1;
-        refused(b, false, FACTOR, "reserved header bytes");
-        b = valid.clone();
-        b[16] ^= 1;
-        refused(b, false, FACTOR, "checksum mismatch", "offset 16 of the buffer");
-
-        BinaryCodec.Out o = start(2);
-        cls(o, "A", "");
-        cls(o, "A", "");
-        refused(seal(o, false), false, FACTOR, "two classes are named 'A'");
-        o = start(1);
-        cls(o, "1A", "");
-        refused(seal(o, false), false, FACTOR, "'1A' is not a valid name");
-        o = start(1);
-        cls(o, "A", "Zed");
-        refused(seal(o, false), false, FACTOR, "class 'A' names super class 'Zed'");
-        o = start(2);
-        cls(o, "A", "B");
-        cls(o, "B", "A");
-        refused(seal(o, false), false, FACTOR, "cyclic super class chain");
-        o = start(1001);
-        for (int i = 0; i < 1001; i++) {
-            cls(o, "K" + i, i == 0 ? "" : "K" + (i - 1));
-        }
-        refused(seal(o, false), false, FACTOR, "super class chain of class 'K1000' is longer than 1000");
-        o = start(2);
-        cls(o, "A", "", INT);
-        cls(o, "B", "A", STRING);
-        refused(seal(o, false), false, FACTOR, "'B.a0' clashes with attribute 'A.a0'");
-
-        o = start(1);
-        int at = o.n;
-        cls(o, "A", "", INT);
-        o.b[at + 12] = 9; // the type code of a0
-        ReplicaBinaryException e = refused(seal(o, false), false, FACTOR, "unknown type code 9 of attribute 'a0'");
-        assertEquals(at + 12, e.getOffset());
-        assertTrue(e.isPayloadOffset());
-
-        o = start(1);
-        cls(o, "A", "");
-        o.b[at + 7] = 0x40; // class flags
-        refused(seal(o, false), false, FACTOR, "invalid flags 0x40 of class 'A'");
-
-        o = start(1);
-        cls(o, "A", "");
-        o.uvar(2);
-        for (int i = 0; i < 2; i++) {
-            o.u8(1 << 4);
-            o.str("same");
-        }
-        refused(seal(o, false), false, FACTOR, "already has a live instance with identifier \"same\"");
-        o = start(1);
-        cls(o, "A", "");
-        o.uvar(1);
-        o.u8(4);
-        refused(seal(o, false), false, FACTOR, "live instance of class 'A' has the state bits 0x4");
-        o = start(1);
-        cls(o, "A", "");
-        o.uvar(1);
-        o.u8(3 << 4);
-        refused(seal(o, false), false, FACTOR, "unknown identifier kind 3");
-
-        refused(oneValue(BOOL, x -> x.u8(2)), false, FACTOR, "is the byte 2, not a Boolean");
-        refused(oneValue(BOOL | MULTI, x -> {
-            x.uvar(3);
-            x.u8(0x08);
-        }), false, FACTOR, "sets bits beyond its 3 elements");
-        refused(oneValue(STRING, x -> x.raw(new byte[] {4, (byte) 0xC3, 0x28})), false, FACTOR, "not valid UTF-8");
-        refused(oneValue(STRING, x -> x.raw(new byte[] {7, 0, 65, 0})), false, FACTOR, "odd number of bytes");
-        refused(oneValue(INT, x -> {
-            x.zint(1);
-            x.u8(0);
-        }), false, FACTOR, "1 bytes follow the last instance's values");
-        o = start(1);
-        cls(o, "A", "", INT);
-        o.uvar(1);
-        o.u8(0);
-        o.uvar(0);
-        o.uvar(0);
-        o.u8(2);
-        refused(seal(o, false), false, FACTOR, "presence bitmap of A[#0] marks attributes beyond its 1");
     }
 }

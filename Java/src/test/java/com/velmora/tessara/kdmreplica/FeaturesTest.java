@@ -7,14 +7,13 @@ import static org.junit.jupiter.api.Assertions.assertArrayEquals;
 import static org.junit.jupiter.api.Assertions.assertEquals;
 import static org.junit.jupiter.api.Assertions.assertFalse;
 import static org.junit.jupiter.api.Assertions.assertNull;
-import static org.junit.jupiter.api.Assertions.assertSame;
 import static org.junit.jupiter.api.Assertions.assertTrue;
 
 import com.velmora.tessara.ReplicaHolder;
 import java.util.Date;
 import org.junit.jupiter.api.Test;
 
-/** Process-wide features and schema location, text forms, definition properties, the holder. */
+/** Process-wide features, text forms, definition properties. */
 class FeaturesTest {
 
     @Test
@@ -33,21 +32,6 @@ class FeaturesTest {
         throwsWith(IllegalArgumentException.class, () -> Replica.setFeature("Indent", true), "'Indent'",
                 "validate, indent");
         throwsWith(IllegalArgumentException.class, () -> Replica.setFeature(null, true), "null", "validate");
-    }
-
-    @Test
-    void schemaLocationIsTakenWhenAReplicaIsCreated() {
-        try {
-            Replica.setSchemaLocation("first.xsd");
-            Replica a = new Replica("a");
-            Replica.setSchemaLocation("second.xsd");
-            assertEquals("first.xsd", a.getSchemaLocation());
-            assertEquals("second.xsd", new Replica("b").getSchemaLocation());
-            Replica.setSchemaLocation(null);
-            assertEquals("", new Replica("c").getSchemaLocation());
-        } finally {
-            Replica.setSchemaLocation(null);
-        }
     }
 
     @Test
@@ -81,6 +65,7 @@ class FeaturesTest {
                 + "sizes=[1, 2], blob=0x0aff}", p.toString(true));
         assertEquals("Instance Bolt[#0] created {}", b.toString(true));
         assertEquals("ReplicaHolder[Replica 'shop' (2 classes, 2 instances)]", new ReplicaHolder(r).toString());
+        assertEquals("ReplicaHolder[empty]", new ReplicaHolder().toString());
     }
 
     @Test
@@ -105,16 +90,5 @@ class FeaturesTest {
         assertArrayEquals(new String[] {"r1"}, a.getTargetRefs());
         assertEquals(AggregationType.Shared, a.getAggregationType());
         assertNull(a.getClassDef());
-    }
-
-    @Test
-    void holderHoldsOneReplica() {
-        ReplicaHolder h = new ReplicaHolder();
-        assertNull(h.getValue());
-        Replica r = new Replica();
-        h.setValue(r);
-        assertSame(r, h.getValue());
-        h.setValue(null);
-        assertEquals("ReplicaHolder[empty]", h.toString());
     }
 }

@@ -3,20 +3,21 @@ package com.velmora.tessara.kdmreplica;
 import static com.velmora.tessara.kdmreplica.Fx.addAttr;
 import static com.velmora.tessara.kdmreplica.Fx.addClass;
 import static com.velmora.tessara.kdmreplica.Fx.throwsWith;
-import static com.velmora.tessara.kdmreplica.XmlFx.dump;
+import static com.velmora.tessara.kdmreplica.Fx.dump;
 import static org.junit.jupiter.api.Assertions.assertArrayEquals;
 import static org.junit.jupiter.api.Assertions.assertEquals;
 import static org.junit.jupiter.api.Assertions.assertFalse;
 import static org.junit.jupiter.api.Assertions.assertNull;
 import static org.junit.jupiter.api.Assertions.assertSame;
 import static org.junit.jupiter.api.Assertions.assertThrows;
+import static org.junit.jupiter.api.Assertions.assertTrue;
 
 import java.util.Arrays;
 import org.junit.jupiter.api.BeforeEach;
 import org.junit.jupiter.api.Test;
 import org.junit.jupiter.api.function.Executable;
 
-/** Inheritance, schema checks, lookups and what schema changes do to existing instances. */
+/** Inheritance, schema checks, live collections, lookups and what schema changes do to existing instances. */
 class SchemaTest {
     private Replica r;
     private Model part;
@@ -145,7 +146,7 @@ class SchemaTest {
     }
 
     @Test
-    void aClassNameIsTakenOnceAndRenamesCarrySubclassesAndTargets() {
+    void aClassNameIsTakenOnceAndRenamesCarrySubclassesAndTargets() throws Exception {
         throwsWith(IllegalArgumentException.class, () -> r.getModels().add(new Model(new ClassDef("Part"))),
                 "already has a class 'Part'");
         throwsWith(IllegalArgumentException.class, () -> part.getClassDef().setClassName("Bolt"), "taken");
@@ -158,13 +159,8 @@ class SchemaTest {
         assertArrayEquals(new String[] {"Nut", "Item"}, link.getTargetNames());
         part.createInstance().setValue("link", b);
         r.commit();
-        String expected = dump(r);
-        Replica viaXsd = new Replica("plant");
-        viaXsd.insertSchemaString(r.getXsd());
-        viaXsd.populatesFromXmlString(r.getXml(false));
-        for (Replica back : new Replica[] {viaXsd, Replica.readFromXmlString(r.getXml(true)),
-                Replica.getReplicaFromBinary(Replica.getBinaryFromReplica(r, false), false)}) {
-            assertEquals(expected, dump(back));
+        for (RoundTripTest.Form f : RoundTripTest.Form.values()) {
+            RoundTripTest.same(r, f);
         }
         assertSame(part, r.getModels().getItem("Item"));
         assertNull(r.getModels().getItem("Part"));
@@ -210,6 +206,7 @@ class SchemaTest {
         Instance b = bolt.createInstance();
         b.setValue("blobs", new byte[][] {{}, {1, 2, 3}});
         b.setValue("link", b); // dropped with Part.link when Bolt leaves Part: no obstacle to that
+        b.setValue("weight", 2.0);
         part.createInstance().setValue("link", b);
         Instance gone = part.createInstance();
         gone.setValue("name", "plate \ud83d\udd29");
@@ -223,6 +220,7 @@ class SchemaTest {
             {(Executable) () -> bolt.getClassDef().setSuperName(null), "class 'Bolt'", "'Part.link'", "Part[#0]"},
             {(Executable) () -> name.setLength(6), "'Part.name'", "Part[deleted]", "7 characters", " 6 "},
             {(Executable) () -> blobs.setLength(2), "'Bolt.blobs'", "Bolt[#0]", "3 bytes", " 2 "},
+            {(Executable) () -> r.getAttributeDef("Part.weight").setMultiValuation(true), "'Part.weight'", "1 instance"},
         };
         for (Object[] e : edits) {
             throwsWith(IllegalStateException.class, (Executable) e[0], Arrays.copyOfRange(e, 1, e.length, String[].class));
@@ -236,14 +234,89 @@ class SchemaTest {
     }
 
     @Test
-    void multiValuationCannotChangeUnderExistingValues() {
-        AttributeDef w = r.getAttributeDef("Part.weight");
-        Instance p = part.createInstance();
-        p.setValue("weight", 2.0);
-        throwsWith(IllegalStateException.class, () -> w.setMultiValuation(true), "'Part.weight'", "1 instance");
-        p.clearValue("weight");
-        w.setMultiValuation(true);
-        p.setValue("weight", new double[] {1, 2});
-        assertArrayEquals(new double[] {1, 2}, (double[]) p.getValue("weight"));
+    void positionsAreZeroBasedAbsentItemsAnswerNullOrMinusOneAndBadCallsChangeNothing() {
+        Instance x = part.createInstance();
+        Model other = addClass(r, "Other", null);
+        Instance y = other.createInstance();
+        ModelSet models = r.getModels();
+        AttributeDefList attrs = part.getClassDef().getAttributes();
+        InstanceSet set = part.getInstances();
+        assertSame(part, models.getItem(0));
+        assertSame(x, set.getItem(0));
+        assertEquals(0, set.indexOf(x));
+        assertEquals(-1, set.indexOf(y));
+        assertEquals(2, models.indexOf("Other"));
+        assertEquals(2, models.indexOf(other.getClassDef()));
+        assertEquals(1, attrs.indexOf(attrs.getItem("weight")));
+        assertTrue(attrs.includes("name"));
+        assertNull(models.getItem("Nope"));
+        assertEquals(-1, models.indexOf("Nope"));
+        assertEquals(-1, models.indexOf(new ClassDef("Part")));
+        assertFalse(models.includes("Nope"));
+        assertNull(attrs.getItem("b"));
+        assertEquals(-1, attrs.indexOf("b"));
+        assertEquals(-1, attrs.indexOf(new AttributeDef("name", AttributeType.String)));
+        Class<?> index = IndexOutOfBoundsException.class;
+        Class<?> arg = IllegalArgumentException.class;
+        Object[][] refusals = {
+            {index, (Executable) () -> models.getItem(3), "replica 'plant'", "position 3"},
+            {index, (Executable) () -> models.remove(-1), "position -1"},
+            {index, (Executable) () -> attrs.getItem(2), "class 'Part'", "position 2"},
+            {index, (Executable) () -> attrs.remove(5), "position 5"},
+            {index, (Executable) () -> set.getItem(-1), "class 'Part'", "position -1"},
+            {index, (Executable) () -> set.remove(1), "position 1", "count 1"},
+            {index, (Executable) () -> x.getValue(2), "Part[#0]", "position 2"},
+            {index, (Executable) () -> x.setValue(-1, 3), "position -1"},
+            {index, (Executable) () -> x.isValuated(2), "position 2"},
+            {index, (Executable) () -> x.clearValue(2), "position 2"},
+            {arg, (Executable) () -> models.remove("Nope"), "'Nope'"},
+            {arg, (Executable) () -> models.remove(new ClassDef("Part")), "'Part'"},
+            {arg, (Executable) () -> attrs.remove("b"), "'b'"},
+            {arg, (Executable) () -> attrs.remove(new AttributeDef("name", AttributeType.String)), "'name'",
+                "not in this list"},
+            {arg, (Executable) () -> set.remove(y), "Other[#0]", "not in this set"},
+            {arg, (Executable) () -> models.add(null), "model is null"},
+            {arg, (Executable) () -> models.add(part), "already in replica 'plant'"},
+            {arg, (Executable) () -> new Model(null), "null"},
+        };
+        String before = dump(r);
+        for (Object[] row : refusals) {
+            throwsWith(((Class<?>) row[0]).asSubclass(Throwable.class), (Executable) row[1],
+                    Arrays.copyOfRange(row, 2, row.length, String[].class));
+        }
+        assertEquals(before, dump(r));
+    }
+
+    @Test
+    void aRemovedModelLeavesWithItsInstancesAndMayJoinAgain() {
+        part.createInstance();
+        bolt.getClassDef().setSuperName(null);
+        r.getModels().remove(part.getClassDef());
+        assertNull(r.getClassDef("Part"));
+        assertNull(part.getReplica());
+        assertEquals(0, part.getInstances().getCount());
+        r.getModels().add(part);
+        assertEquals(2, part.createInstance().getClassDef().getAttributes().getCount());
+    }
+
+    @Test
+    void noArgumentConstructorsGiveUsableObjects() {
+        ModelSet ms = new ModelSet();
+        Model m = new Model();
+        ms.add(m);
+        assertTrue(m.getReplica().getName().startsWith("Replica"));
+        m.getClassDef().getAttributes().add(new AttributeDef());
+        m.createInstance().setValue(0, "a generated attribute is a String");
+        AttributeDefList list = new AttributeDefList();
+        list.add(new AttributeDef("a", AttributeType.Boolean));
+        assertTrue(list.getItem(0).getClassDef().getClassName().startsWith("Class"));
+        new InstanceSet().removeAll();
+        Instance detached = new Instance();
+        assertNull(detached.getClassDef());
+        detached.setID("free");
+        assertEquals("free", detached.getID());
+        throwsWith(IllegalArgumentException.class, () -> detached.getValue("x"), "'x'");
+        throwsWith(IllegalStateException.class, () -> new Model().createInstance(), "in no replica");
+        assertTrue(new Replica().getName().startsWith("Replica"));
     }
 }

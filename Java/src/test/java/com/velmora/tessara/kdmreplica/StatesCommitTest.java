@@ -59,16 +59,10 @@ class StatesCommitTest {
         r.commit();
         assertEquals("Replica 'garage' (3 classes, 0 instances)", r.toString());
         assertTrue(p.isDeleted());
-    }
-
-    @Test
-    void aNeverCommittedInstanceSimplyDisappears() {
-        Instance p = person.createInstance();
+        Instance never = person.createInstance(); // never committed: simply disappears
         person.getInstances().remove(0);
-        assertTrue(p.isDeleted());
-        assertFalse(p.isCreated());
+        assertEquals("D", states(never));
         assertEquals("Replica 'garage' (3 classes, 0 instances)", r.toString());
-        r.commit();
     }
 
     @Test
@@ -98,6 +92,17 @@ class StatesCommitTest {
         car.getInstances().removeAll();
         assertEquals(0, car.getInstances().getCount());
         assertTrue(a.isDeleted() && b.isDeleted());
+
+        // removing a model deletes its instances and leaves references to them dangling
+        Instance owned = car.createInstance();
+        Instance ann = person.createInstance();
+        owned.setValue("owner", ann);
+        r.commit();
+        r.getModels().remove("Person");
+        assertTrue(ann.isDeleted());
+        throwsWith(ReplicaCommitException.class, r::commit, "'Car.owner'", "which is deleted");
+        owned.clearValue("owner");
+        r.commit();
     }
 
     @Test
@@ -115,41 +120,37 @@ class StatesCommitTest {
         w2.setValue("size", 17);
         Instance goner = person.createInstance();
         goner.setValue("name", "Bob");
+        AttributeDef tags = addAttr(person, "tags", AttributeType.Binary, true);
+        tags.setUnicity(true); // arrays are compared by content
+        nameless.setValue("tags", new byte[][] {{1, 2}, {3}});
+        goner.setValue("tags", new byte[][] {{1, 2}, {3}});
+        Instance other = person.createInstance();
+        other.setValue("name", "Cy");
+        other.setValue("tags", new byte[][] {{1, 2}, {3}});
         Instance c = car.createInstance();
         c.setValue("owner", goner);
         r.getModels().getItem("Person").getInstances().remove(goner);
 
         ReplicaCommitException e = throwsWith(ReplicaCommitException.class, r::commit,
-                "replica 'garage'", "4 violations",
+                "replica 'garage'", "5 violations",
                 "Person[#0]: mandatory attribute 'Person.name' has no value",
                 "attribute 'Wheel.size' is unique but Wheel[#0] and BigWheel[#0] both hold 17",
                 "class 'Car' is abstract",
-                "Car[#0]: attribute 'Car.owner' refers to Person[deleted], which is deleted");
-        assertEquals(4, e.getViolationCount());
-        assertEquals(4, e.getViolations().size());
+                "Car[#0]: attribute 'Car.owner' refers to Person[deleted], which is deleted",
+                "attribute 'Person.tags' is unique but Person[#0] and Person[#1] both hold");
+        assertEquals(5, e.getViolationCount());
+        assertEquals(5, e.getViolations().size());
         assertEquals("C", states(nameless));
         assertEquals("C", states(c));
         assertTrue(goner.isDeleted());
 
         nameless.setValue("name", "Ann");
+        other.setValue("tags", new byte[][] {{1, 2}, {4}});
         w2.setValue("size", 18);
         c.clearValue("owner");
         car.getClassDef().setAbstract(false);
         r.commit();
         assertEquals("", states(nameless) + states(c) + states(w2));
-    }
-
-    @Test
-    void uniquenessComparesArraysByContent() {
-        AttributeDef tags = addAttr(person, "tags", AttributeType.Binary, true);
-        tags.setUnicity(true);
-        Instance a = person.createInstance();
-        Instance b = person.createInstance();
-        a.setValue("tags", new byte[][] {{1, 2}, {3}});
-        b.setValue("tags", new byte[][] {{1, 2}, {3}});
-        throwsWith(ReplicaCommitException.class, r::commit, "'Person.tags' is unique", "1 violation");
-        b.setValue("tags", new byte[][] {{1, 2}, {4}});
-        r.commit();
     }
 
     @Test
@@ -183,19 +184,5 @@ class StatesCommitTest {
         person.getInstances().remove(b);
         a.setID("x"); // freed by the removal
         assertEquals("x", b.getID());
-    }
-
-    @Test
-    void removingAModelDeletesItsInstancesAndLeavesDanglingReferences() {
-        Instance owner = person.createInstance();
-        owner.setValue("name", "Ann");
-        Instance c = car.createInstance();
-        c.setValue("owner", owner);
-        r.commit();
-        r.getModels().remove("Person");
-        assertTrue(owner.isDeleted());
-        throwsWith(ReplicaCommitException.class, r::commit, "'Car.owner'", "which is deleted");
-        c.clearValue("owner");
-        r.commit();
     }
 }

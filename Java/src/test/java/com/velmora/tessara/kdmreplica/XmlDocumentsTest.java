@@ -2,12 +2,14 @@ package com.velmora.tessara.kdmreplica;
 
 import static com.velmora.tessara.kdmreplica.Fx.addAttr;
 import static com.velmora.tessara.kdmreplica.Fx.addClass;
-import static com.velmora.tessara.kdmreplica.XmlFx.dump;
-import static com.velmora.tessara.kdmreplica.XmlFx.failsAt;
+import static com.velmora.tessara.kdmreplica.Fx.dump;
+import static com.velmora.tessara.kdmreplica.Fx.failsAt;
 import static org.junit.jupiter.api.Assertions.assertArrayEquals;
 import static org.junit.jupiter.api.Assertions.assertEquals;
+import static org.junit.jupiter.api.Assertions.assertFalse;
 import static org.junit.jupiter.api.Assertions.assertSame;
 
+import java.time.Instant;
 import java.util.Date;
 import java.util.Random;
 import org.junit.jupiter.api.BeforeEach;
@@ -43,8 +45,9 @@ class XmlDocumentsTest {
     }
 
     @Test
-    void valuesInPiecesAndInAnyOrderAreReadWhole() {
-        target.populatesFromXmlString(HEAD
+    void valuesInPiecesInAnyOrderAndWithAnyPrefixAreReadWhole() {
+        target.populatesFromXmlString("<?xml version='1.0'?>\n<!-- a note -->\n"
+                + HEAD.replace(">\n", " xmlns:r='urn:corvexa:replica:1'><?pi data?>\n")
                 + "<Piece id=\"a\">\n"
                 + "  <nums>1</nums>\n"
                 + "  <when>2024-03-01T12:00:<!-- a comment -->00.250Z</when>\n"
@@ -56,6 +59,10 @@ class XmlDocumentsTest {
                 + "  <nums>3</nums>\n"
                 + "</Piece>\n"
                 + "<Piece id=\"b\"><ok>0</ok><qty>-7</qty><price>-0</price><when>1969-12-31T23:59:59.999Z</when></Piece>\n"
+                + "<r:Piece id='c'><r:nums>4</r:nums><!-- c --><r:name><![CDATA[<a&b>]]>&#13;&amp;</r:name>"
+                + "<r:when> 2024-02-29T23:30:00+02:30 </r:when><r:nums>5</r:nums><r:price> +1E3 </r:price></r:Piece>\n"
+                + "<Piece><when>2024-03-01T00:00:00</when><price>-INF</price></Piece>\n"
+                + "<Piece><when>2024-03-01T24:00:00.000000Z</when><price>.5</price></Piece>\n"
                 + "</replica>");
         Instance a = piece(0);
         assertEquals(42, a.getValue("qty"));
@@ -69,6 +76,15 @@ class XmlDocumentsTest {
         assertEquals(Double.doubleToRawLongBits(-0.0), Double.doubleToRawLongBits((Double) b.getValue("price")));
         assertEquals(false, b.getValue("ok"));
         assertEquals(new Date(-1), b.getValue("when"));
+        Instance c = piece(2);
+        assertFalse(c.isCreated(), "loaded instances are unchanged");
+        assertEquals("<a&b>\r&", c.getValue("name"));
+        assertArrayEquals(new int[] {4, 5}, (int[]) c.getValue("nums"));
+        assertEquals(Date.from(Instant.parse("2024-02-29T21:00:00Z")), c.getValue("when"));
+        assertEquals(1000.0, c.getValue("price"));
+        assertEquals(Date.from(Instant.parse("2024-03-01T00:00:00Z")), piece(3).getValue("when"), "no zone: UTC");
+        assertEquals(Double.NEGATIVE_INFINITY, piece(3).getValue("price"));
+        assertEquals(Date.from(Instant.parse("2024-03-02T00:00:00Z")), piece(4).getValue("when"), "24:00 ends the day");
     }
 
     @Test

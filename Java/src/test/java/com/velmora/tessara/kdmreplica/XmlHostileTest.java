@@ -3,8 +3,8 @@ package com.velmora.tessara.kdmreplica;
 import static com.velmora.tessara.kdmreplica.Fx.addAttr;
 import static com.velmora.tessara.kdmreplica.Fx.addClass;
 import static com.velmora.tessara.kdmreplica.Fx.throwsWith;
-import static com.velmora.tessara.kdmreplica.XmlFx.dump;
-import static com.velmora.tessara.kdmreplica.XmlFx.failsAt;
+import static com.velmora.tessara.kdmreplica.Fx.dump;
+import static com.velmora.tessara.kdmreplica.Fx.failsAt;
 import static org.junit.jupiter.api.Assertions.assertEquals;
 import static org.junit.jupiter.api.Assertions.assertFalse;
 import static org.junit.jupiter.api.Assertions.assertThrows;
@@ -20,8 +20,12 @@ import java.nio.file.Paths;
 import java.util.List;
 import java.util.function.Consumer;
 import java.util.stream.Stream;
+import java.util.ArrayList;
+import org.junit.jupiter.api.AfterAll;
 import org.junit.jupiter.api.AfterEach;
+import org.junit.jupiter.api.BeforeAll;
 import org.junit.jupiter.api.BeforeEach;
+import org.junit.jupiter.api.TestInstance;
 import org.junit.jupiter.api.Test;
 import org.junit.jupiter.api.Timeout;
 import org.junit.jupiter.api.function.Executable;
@@ -34,21 +38,27 @@ import org.junit.jupiter.params.provider.MethodSource;
  * Hostile and bad inputs: refused with an exception that names the line, column and offending
  * name; nothing is read from disk or the network; the replica is unchanged.
  */
+@TestInstance(TestInstance.Lifecycle.PER_CLASS)
 class XmlHostileTest {
     private static final String SECRET = "TOP-SECRET-42";
+    private static final String ROOT = "<replica xmlns=\"urn:corvexa:replica:1\"";
 
     @TempDir
-    Path dir;
-    private XmlFx.Listener net;
+    static Path dir;
+    private Fx.Listener net;
     private Path secret;
     private Replica target;
     private String before;
 
-    @BeforeEach
-    void setUp() throws Exception {
-        net = new XmlFx.Listener();
+    @BeforeAll
+    void listen() throws Exception {
+        net = new Fx.Listener();
         secret = dir.resolve("secret.txt");
         Files.write(secret, SECRET.getBytes(StandardCharsets.US_ASCII));
+    }
+
+    @BeforeEach
+    void setUp() throws Exception {
         target = new Replica("target");
         Model part = addClass(target, "Part", null);
         addAttr(part, "qty", AttributeType.Integer, false);
@@ -67,152 +77,132 @@ class XmlHostileTest {
         Replica.setFeature("validate", false);
         Replica.setSchemaLocation(null);
         assertEquals(0, net.connections(), "nothing may be fetched from the network");
-        net.close();
         assertEquals(before, dump(target), "the replica is unchanged");
     }
 
-    /** Every way a document reaches the package, so each refusal is checked on each path. */
-    private List<Consumer<String>> readers() throws Exception {
-        Path file = dir.resolve("doc.xml");
-        return List.of(
-                target::populatesFromXmlString,
-                Replica::readFromXmlString,
-                xml -> {
-                    write(file, xml);
-                    target.populatesFromXmlFile(file.toString());
-                },
-                xml -> {
-                    write(file, xml);
-                    Replica.readFromXmlFile(file.toString());
-                },
-                target::insertSchemaString);
+    @AfterAll
+    void close() throws Exception {
+        net.close();
+    }
+
+    /** The ways a text reaches the package, by name: documents, schemas, from strings and from files. */
+    private Consumer<String> reader(String name) {
+        Path file = dir.resolve("sub").resolve(name.startsWith("schema") ? "s.xsd" : "doc.xml");
+        Consumer<String> toFile = text -> write(file, text);
+        switch (name) {
+            case "populate":
+                return target::populatesFromXmlString;
+            case "read":
+                return Replica::readFromXmlString;
+            case "populateFile":
+                return toFile.andThen(x -> target.populatesFromXmlFile(file.toString()));
+            case "readFile":
+                return toFile.andThen(x -> Replica.readFromXmlFile(file.toString()));
+            case "schema":
+                return target::insertSchemaString;
+            default:
+                return toFile.andThen(x -> target.insertSchemaFile(file.toString()));
+        }
     }
 
     private static void write(Path p, String text) {
         try {
+            Files.createDirectories(p.getParent());
             Files.write(p, text.getBytes(StandardCharsets.UTF_8));
         } catch (java.io.IOException e) {
             throw new IllegalStateException(e);
         }
     }
 
-    private void refusedEverywhere(String doc, int line, String... fragments) throws Exception {
-        refusedEverywhere(readers(), doc, line, fragments);
+    private static String schemaWith(String construct) {
+        return "<xs:schema xmlns:xs=\"http://www.w3.org/2001/XMLSchema\">\n" + construct
+                + "\n<xs:complexType name=\"New\"/></xs:schema>";
     }
 
-    private void refusedEverywhere(List<Consumer<String>> readers, String doc, int line, String... fragments)
-            throws Exception {
-        for (Consumer<String> read : readers) {
+    /** readers, document, line, message fragments. */
+    Stream<Arguments> refusedUnread() throws Exception {
+        String all = "populate read populateFile readFile schema";
+        String fileUrl = secret.toUri().toString();
+        Path xsd = dir.resolve("target.xsd");
+        write(xsd, target.getXsd());
+        List<Arguments> rows = new ArrayList<>();
+        for (String d : new String[] {
+            "<!DOCTYPE replica [<!ENTITY x SYSTEM \"" + fileUrl + "\">]>", // XXE by file and by http
+            "<!DOCTYPE replica [<!ENTITY x SYSTEM \"" + net.url("xxe") + "\">]>",
+            "<!DOCTYPE replica SYSTEM \"" + net.url("ext.dtd") + "\">", // external DTD, external parameter entity
+            "<!DOCTYPE replica PUBLIC \"-//X//Y\" \"" + fileUrl + "\">",
+            "<!DOCTYPE replica [<!ENTITY % p SYSTEM \"" + net.url("p") + "\"> %p;]>",
+            "<!DOCTYPE replica [<!ENTITY a \"ha\"><!ENTITY b \"&a;&a;&a;&a;&a;&a;&a;&a;&a;&a;\">" // billion laughs
+                + "<!ENTITY c \"&b;&b;&b;&b;&b;&b;&b;&b;&b;&b;\"><!ENTITY d \"&c;&c;&c;&c;&c;&c;&c;&c;&c;&c;\">"
+                + "<!ENTITY e \"&d;&d;&d;&d;&d;&d;&d;&d;&d;&d;\"><!ENTITY f \"&e;&e;&e;&e;&e;&e;&e;&e;&e;&e;\">"
+                + "<!ENTITY g \"&f;&f;&f;&f;&f;&f;&f;&f;&f;&f;\"><!ENTITY h \"&g;&g;&g;&g;&g;&g;&g;&g;&g;&g;\">"
+                + "<!ENTITY i \"&h;&h;&h;&h;&h;&h;&h;&h;&h;&h;\">]>",
+            "<!DOCTYPE replica>"}) {
+            rows.add(Arguments.of(all, "<?xml version=\"1.0\"?>\n" + d + "\n" + ROOT + "><Part><name>&x;&i;</name></Part>"
+                    + "</replica>", 2, new String[] {"DOCTYPE", "refused"}));
+        }
+        // entity references without a DOCTYPE; the document names a local schema to get past its root
+        rows.add(Arguments.of("populate read populateFile readFile", ROOT
+                + " xmlns:xsi=\"http://www.w3.org/2001/XMLSchema-instance\" xsi:schemaLocation=\"urn:corvexa:replica:1 "
+                + xsd.toUri() + "\">\n<Part><name>&x;</name></Part></replica>", 2,
+                new String[] {"not well-formed", "'&x;'", "undeclared"}));
+        rows.add(Arguments.of("schema", schemaWith("<xs:annotation><xs:documentation>&x;</xs:documentation>"
+                + "</xs:annotation>"), 2, new String[] {"not well-formed", "'&x;'"}));
+        // schemas importing from the network or from files elsewhere, given as text, embedded or as a file
+        for (String construct : new String[] {
+            "<xs:import namespace=\"urn:x\" schemaLocation=\"" + net.url("x.xsd") + "\"/>",
+            "<xs:include schemaLocation=\"" + net.url("y.xsd") + "\"/>",
+            "<xs:import namespace=\"urn:x\" schemaLocation=\"" + secret + "\"/>"}) {
+            rows.add(Arguments.of("schema", schemaWith(construct), 2, new String[] {"refused", "nothing was read"}));
+            rows.add(Arguments.of("read", ROOT + ">" + schemaWith(construct) + "</replica>", 2,
+                    new String[] {"refused"}));
+        }
+        rows.add(Arguments.of("schemaFile", schemaWith("<xs:include schemaLocation=\"" + net.url("y.xsd") + "\"/>"), 2,
+                new String[] {"refused", "nothing was fetched"}));
+        rows.add(Arguments.of("schemaFile", schemaWith("<xs:include schemaLocation=\"../secret.txt\"/>"), 2,
+                new String[] {"'../secret.txt'", "outside the directory", "nothing was read"}));
+        // without a schema, a URL is refused unread; a location for another namespace is no schema at all
+        String located = ROOT + " xmlns:xsi=\"http://www.w3.org/2001/XMLSchema-instance\"\n xsi:schemaLocation=\"";
+        rows.add(Arguments.of("read", located + "urn:corvexa:replica:1 " + net.url("a.xsd") + "\"/>", 2,
+                new String[] {"is not a local file", net.url("a.xsd"), "nothing was fetched"}));
+        rows.add(Arguments.of("read", located + "urn:other " + secret + "\"/>", 2, new String[] {"has no schema"}));
+        return rows.stream();
+    }
+
+    @ParameterizedTest(name = "[{index}] {0}: {3}")
+    @MethodSource("refusedUnread")
+    void hostileDocumentsAreRefusedUnread(String readers, String doc, int line, String[] fragments) {
+        for (String name : readers.split(" ")) {
             for (boolean validate : new boolean[] {false, true}) {
                 Replica.setFeature("validate", validate);
-                XmlDocumentException e = failsAt(line, () -> read.accept(doc), fragments);
+                XmlDocumentException e = failsAt(line, () -> reader(name).accept(doc), fragments);
                 assertFalse(e.getMessage().contains(SECRET) || e.getMessage().contains("FETCHED"), e.getMessage());
             }
         }
     }
 
     @Test
-    void doctypesAreRefusedOutrightWhateverTheyDeclare() throws Exception {
-        String fileUrl = secret.toUri().toString();
-        String[] doctypes = {
-            // XXE with a file URL and with an http URL
-            "<!DOCTYPE replica [<!ENTITY x SYSTEM \"" + fileUrl + "\">]>",
-            "<!DOCTYPE replica [<!ENTITY x SYSTEM \"" + net.url("xxe") + "\">]>",
-            // external DTD, and an external parameter entity
-            "<!DOCTYPE replica SYSTEM \"" + net.url("ext.dtd") + "\">",
-            "<!DOCTYPE replica PUBLIC \"-//X//Y\" \"" + fileUrl + "\">",
-            "<!DOCTYPE replica [<!ENTITY % p SYSTEM \"" + net.url("p") + "\"> %p;]>",
-            // billion laughs
-            "<!DOCTYPE replica [<!ENTITY a \"ha\"><!ENTITY b \"&a;&a;&a;&a;&a;&a;&a;&a;&a;&a;\">"
-                + "<!ENTITY c \"&b;&b;&b;&b;&b;&b;&b;&b;&b;&b;\"><!ENTITY d \"&c;&c;&c;&c;&c;&c;&c;&c;&c;&c;\">"
-                + "<!ENTITY e \"&d;&d;&d;&d;&d;&d;&d;&d;&d;&d;\"><!ENTITY f \"&e;&e;&e;&e;&e;&e;&e;&e;&e;&e;\">"
-                + "<!ENTITY g \"&f;&f;&f;&f;&f;&f;&f;&f;&f;&f;\"><!ENTITY h \"&g;&g;&g;&g;&g;&g;&g;&g;&g;&g;\">"
-                + "<!ENTITY i \"&h;&h;&h;&h;&h;&h;&h;&h;&h;&h;\">]>",
-            "<!DOCTYPE replica>",
-        };
-        for (String d : doctypes) {
-            refusedEverywhere("<?xml version=\"1.0\"?>\n" + d + "\n<replica xmlns=\"urn:corvexa:replica:1\">"
-                    + "<Part><name>&x;&i;</name></Part></replica>", 2, "DOCTYPE", "refused");
-        }
-    }
-
-    @Test
-    void entityReferencesWithoutADoctypeAreNotWellFormed() throws Exception {
-        // The document names a local schema, so that reading it as a new replica gets past its root.
-        Path xsd = dir.resolve("target.xsd");
-        write(xsd, target.getXsd());
-        List<Consumer<String>> documents = readers().subList(0, 4);
-        refusedEverywhere(documents, "<replica xmlns=\"urn:corvexa:replica:1\""
-                + " xmlns:xsi=\"http://www.w3.org/2001/XMLSchema-instance\""
-                + " xsi:schemaLocation=\"urn:corvexa:replica:1 " + xsd.toUri() + "\">\n"
-                + "<Part><name>&x;</name></Part></replica>", 2, "not well-formed", "'&x;'", "undeclared");
-        refusedEverywhere(List.of(target::insertSchemaString), "<xs:schema xmlns:xs=\"http://www.w3.org/2001/XMLSchema\">"
-                + "\n<xs:annotation><xs:documentation>&x;</xs:documentation></xs:annotation></xs:schema>", 2,
-                "not well-formed", "'&x;'");
-    }
-
-    @Test
-    void schemaLocationsElsewhereAreIgnoredOrRefusedButNeverRead() throws Exception {
-        String embedded = "<replica xmlns=\"urn:corvexa:replica:1\" xmlns:xsi=\"http://www.w3.org/2001/XMLSchema-instance\"\n"
+    void schemaLocationsElsewhereAreNotUsedWhenTheSchemaIsKnown() throws Exception {
+        String xsd = target.getXsd();
+        String embedded = ROOT + " xmlns:xsi=\"http://www.w3.org/2001/XMLSchema-instance\"\n"
                 + " xsi:schemaLocation=\"urn:corvexa:replica:1 " + net.url("a.xsd") + " urn:other " + secret.toUri()
                 + "\" xsi:noNamespaceSchemaLocation=\"" + net.url("b.xsd") + "\">\n";
         Replica.setFeature("validate", true);
-        // With an embedded schema (a new replica) or a known one (populating), the locations are not used.
-        Replica fresh = Replica.readFromXmlString(embedded.replace("\">\n", "\">\n" + schemaOf(target))
+        Replica fresh = Replica.readFromXmlString(embedded + xsd.substring(xsd.indexOf("<xs:schema"))
                 + "<Part><qty>2</qty></Part></replica>");
         assertEquals(2, fresh.getModels().getItem("Part").getInstances().getItem(0).getValue("qty"));
         assertEquals(net.url("a.xsd"), fresh.getSchemaLocation());
         Replica copy = new Replica("copy");
-        copy.insertSchemaString(target.getXsd());
+        copy.insertSchemaString(xsd);
         copy.populatesFromXmlString(embedded + "<Part><qty>3</qty></Part></replica>");
         assertEquals(1, copy.getModels().getItem("Part").getInstances().getCount());
-        Replica.setFeature("validate", false);
-        // Without a schema, a URL is refused unread; a location for another namespace is no schema at all.
-        failsAt(2, () -> Replica.readFromXmlString(embedded + "</replica>"), "is not a local file",
-                net.url("a.xsd"), "nothing was fetched");
-        failsAt(1, () -> Replica.readFromXmlString("<replica xmlns=\"urn:corvexa:replica:1\""
-                + " xmlns:xsi=\"http://www.w3.org/2001/XMLSchema-instance\" xsi:schemaLocation=\"urn:other "
-                + secret + "\"/>"), "has no schema");
-    }
-
-    private static String schemaOf(Replica r) {
-        String xsd = r.getXsd();
-        return xsd.substring(xsd.indexOf("<xs:schema"));
-    }
-
-    @Test
-    void schemasImportingFromTheNetworkAreRefusedUnread() throws Exception {
+        // from a schema file, a local file next to it is read as a schema: the fault is reported
+        // in that file without quoting it
         Path file = dir.resolve("s.xsd");
-        for (String construct : new String[] {
-            "<xs:import namespace=\"urn:x\" schemaLocation=\"" + net.url("x.xsd") + "\"/>",
-            "<xs:include schemaLocation=\"" + net.url("y.xsd") + "\"/>",
-            "<xs:import namespace=\"urn:x\" schemaLocation=\"" + secret + "\"/>"}) {
-            String xsd = schemaWith(construct);
-            failsAt(2, () -> target.insertSchemaString(xsd), "refused", "nothing was read");
-            // embedded in a document, the same schema is refused as well
-            failsAt(2, () -> Replica.readFromXmlString("<replica xmlns=\"urn:corvexa:replica:1\">"
-                    + xsd + "</replica>"), "refused");
-            if (construct.contains("http:")) {
-                write(file, xsd);
-                failsAt(2, () -> target.insertSchemaFile(file.toString()), "refused", "nothing was fetched");
-            }
-        }
-        // From a schema file, a local file next to it is read as a schema (here: it is not one, and
-        // the fault is reported in that file without quoting it); a file elsewhere is refused unread.
         write(file, schemaWith("<xs:import namespace=\"urn:x\" schemaLocation=\"" + secret + "\"/>"));
         XmlDocumentException e = failsAt(1, () -> target.insertSchemaFile(file.toString()), "not well-formed");
         assertEquals("XSD file '" + secret.toRealPath() + "'", e.getSource());
         assertFalse(e.getMessage().contains(SECRET), e.getMessage());
-        Path sub = Files.createDirectories(dir.resolve("sub"));
-        Path inner = sub.resolve("s.xsd");
-        write(inner, schemaWith("<xs:include schemaLocation=\"../secret.txt\"/>"));
-        failsAt(2, () -> target.insertSchemaFile(inner.toString()), "'../secret.txt'", "outside the directory",
-                "nothing was read");
-    }
-
-    private static String schemaWith(String construct) {
-        return "<xs:schema xmlns:xs=\"http://www.w3.org/2001/XMLSchema\">\n" + construct
-                + "\n<xs:complexType name=\"New\"/></xs:schema>";
     }
 
     private String goodDocument() {

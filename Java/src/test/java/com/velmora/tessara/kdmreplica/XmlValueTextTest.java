@@ -51,36 +51,52 @@ class XmlValueTextTest {
         assertEquals(m, refusal(byChars));
     }
 
-    @ParameterizedTest
-    @CsvSource(delimiter = '|', value = {"0|0", "+5|5", "-5|-5", "' 42 '|42", "2147483647|2147483647",
-        "-2147483648|-2147483648", "007|7"})
-    void integersAreRead(String text, int expected) {
-        assertEquals(expected, XmlSupport.parseInt(text));
-        assertEquals(expected, XmlSupport.parseInt(chars(text), text.length()));
+    /** Reads a text of the kind by the String path and by the character path: the same answer or the same refusal. */
+    private static Object read(String kind, String text) throws Throwable {
+        Executable byString;
+        Executable byChars;
+        Object[] got = new Object[2];
+        switch (kind) {
+            case "int":
+                byString = () -> got[0] = XmlSupport.parseInt(text);
+                byChars = () -> got[1] = XmlSupport.parseInt(chars(text), text.length());
+                break;
+            case "double":
+                byString = () -> got[0] = Double.doubleToRawLongBits(XmlSupport.parseDouble(text, null));
+                byChars = () -> got[1] = Double.doubleToRawLongBits(XmlSupport.parseDouble(chars(text), text.length(),
+                        null));
+                break;
+            default:
+                byString = () -> got[0] = XmlSupport.parseBoolean(text);
+                byChars = () -> got[1] = XmlSupport.parseBoolean(chars(text), text.length());
+        }
+        String refused = refusal(byString);
+        assertEquals(refused, refusal(byChars), "the character path answers otherwise");
+        assertEquals(got[0], got[1]);
+        return refused != null ? null : got[0];
     }
 
-    @ParameterizedTest
-    @ValueSource(strings = {"", "+", "-", "1 2", "1.0", "0x10", "\u0663", "1_000", "2147483648", "--1", "+-1",
-        "-2147483649", "9999999999", "12345678901", "4294967296", "+2147483648", "1-"})
-    void otherIntegerTextsAreRefused(String text) {
-        refusedAlike(() -> XmlSupport.parseInt(text), () -> XmlSupport.parseInt(chars(text), text.length()));
-    }
-
-    @ParameterizedTest
-    @CsvSource(delimiter = '|', value = {"1|1.0", "5.|5.0", ".5|0.5", "-.5|-0.5", "+1E3|1000.0", "1e-2|0.01",
-        "1.5E+2|150.0", "INF|Infinity", "-INF|-Infinity", "' 2.25 '|2.25", "-0|-0.0"})
-    void doublesAreRead(String text, double expected) {
-        assertEquals(Double.doubleToRawLongBits(expected), Double.doubleToRawLongBits(XmlSupport.parseDouble(text, null)));
-        assertEquals(Double.doubleToRawLongBits(expected),
-                Double.doubleToRawLongBits(XmlSupport.parseDouble(chars(text), text.length(), null)));
-    }
-
-    @ParameterizedTest
-    @ValueSource(strings = {"", ".", "e5", "1e", "1e+", "1.2.3", "0x1p3", "1d", "1f", "Infinity", "inf", "NAN",
-        "\u0661.5", "1 e5", "+.e1", "1e5.5", "1..2", "-", "+", "1e+-5", "1.5e", "--1", "1-"})
-    void otherDoubleTextsAreRefused(String text) {
-        refusedAlike(() -> XmlSupport.parseDouble(text, null),
-                () -> XmlSupport.parseDouble(chars(text), text.length(), null));
+    /** kind, text, value (empty: refused). */
+    @ParameterizedTest(name = "{0} \"{1}\"")
+    @CsvSource(delimiter = '|', value = {
+        "int|0|0", "int|+5|5", "int|-5|-5", "int|' 42 '|42", "int|2147483647|2147483647", "int|-2147483648|-2147483648",
+        "int|007|7", "int|''|", "int|+|", "int|-|", "int|1 2|", "int|1.0|", "int|0x10|", "int|\u0663|", "int|1_000|",
+        "int|2147483648|", "int|--1|", "int|+-1|", "int|-2147483649|", "int|9999999999|", "int|12345678901|",
+        "int|4294967296|", "int|+2147483648|", "int|1-|",
+        "double|1|1.0", "double|5.|5.0", "double|.5|0.5", "double|-.5|-0.5", "double|+1E3|1000.0", "double|1e-2|0.01",
+        "double|1.5E+2|150.0", "double|INF|Infinity", "double|-INF|-Infinity", "double|' 2.25 '|2.25", "double|-0|-0.0",
+        "double|''|", "double|.|", "double|e5|", "double|1e|", "double|1e+|", "double|1.2.3|", "double|0x1p3|",
+        "double|1d|", "double|1f|", "double|Infinity|", "double|inf|", "double|NAN|", "double|\u0661.5|",
+        "double|1 e5|", "double|+.e1|", "double|1e5.5|", "double|1..2|", "double|-|", "double|+|", "double|1e+-5|",
+        "double|1.5e|", "double|--1|", "double|1-|",
+        "boolean|true|true", "boolean|1|true", "boolean|false|false", "boolean|0|false", "boolean|' true'|true",
+        "boolean|'0 '|false", "boolean|''|", "boolean|True|", "boolean|TRUE|", "boolean|yes|", "boolean|2|",
+        "boolean|10|", "boolean|fals|", "boolean|truee|", "boolean|t|"})
+    void numbersAndBooleansAreReadOrRefusedAlikeByBothPaths(String kind, String text, String value) throws Throwable {
+        Object expected = value == null ? null : kind.equals("int") ? (Object) Integer.parseInt(value)
+                : kind.equals("double") ? (Object) Double.doubleToRawLongBits(Double.parseDouble(value))
+                : (Object) Boolean.parseBoolean(value);
+        assertEquals(expected, read(kind, text));
     }
 
     /** Reads a text both ways and checks the bits against the JDK's reading of the same text. */
@@ -189,32 +205,14 @@ class XmlValueTextTest {
     @ValueSource(strings = {"2023-02-29T00:00:00.000Z", "2024-13-01T00:00:00.000Z", "2024-00-10T00:00:00.000Z",
         "2024-01-32T00:00:00.000Z", "2024-01-01T25:00:00.000Z", "2024-01-01T00:60:00.000Z",
         "2024-01-01T00:00:60.000Z", "0000-01-01T00:00:00.000Z", "2024-01-01T24:00:01.000Z", "2024-01-0aT00:00:00.000Z",
-        "2024/01/01T00:00:00.000Z", "2024-01-01T00:00:00.000X"})
-    void impossibleDatesOfTheWrittenShapeAreRefused(String text) {
+        "2024/01/01T00:00:00.000Z", "2024-01-01T00:00:00.000X", "1900-02-29T00:00:00.000Z", "2100-02-29T00:00:00.000Z",
+        "2023-04-31T00:00:00.000Z", "2023-06-31T00:00:00.000Z", "2023-09-31T00:00:00.000Z", "2023-11-31T00:00:00.000Z",
+        "2023-12-32T00:00:00.000Z", "2023-01-00T00:00:00.000Z", "2023-01-01T00:00:00.00aZ", "2023-01-01T00:00:00.000z",
+        "2023-01-01t00:00:00.000Z"})
+    void impossibleDatesOfTheWrittenShapeAreRefusedByBothPaths(String text) {
         IllegalArgumentException e = assertThrows(IllegalArgumentException.class, () -> XmlSupport.parseDate(text));
         assertTrue(e.getMessage().contains("'" + text + "'"), e.getMessage());
         refusedAlike(() -> XmlSupport.parseDate(text), () -> XmlSupport.parseDate(chars(text), text.length()));
-    }
-
-    @ParameterizedTest
-    @ValueSource(strings = {"1900-02-29T00:00:00.000Z", "2100-02-29T00:00:00.000Z", "2023-04-31T00:00:00.000Z",
-        "2023-06-31T00:00:00.000Z", "2023-09-31T00:00:00.000Z", "2023-11-31T00:00:00.000Z", "2023-12-32T00:00:00.000Z",
-        "2023-01-00T00:00:00.000Z", "2023-01-01T00:00:00.00aZ", "2023-01-01T00:00:00.000z", "2023-01-01t00:00:00.000Z"})
-    void daysThatDoNotExistAreRefusedByBothPaths(String text) {
-        refusedAlike(() -> XmlSupport.parseDate(text), () -> XmlSupport.parseDate(chars(text), text.length()));
-    }
-
-    @ParameterizedTest
-    @CsvSource(delimiter = '|', value = {"true|true", "1|true", "false|false", "0|false", "' true'|true", "'0 '|false"})
-    void booleansAreRead(String text, boolean expected) {
-        assertEquals(expected, XmlSupport.parseBoolean(text));
-        assertEquals(expected, XmlSupport.parseBoolean(chars(text), text.length()));
-    }
-
-    @ParameterizedTest
-    @ValueSource(strings = {"", "True", "TRUE", "yes", "2", "10", "fals", "truee", "t"})
-    void otherBooleanTextsAreRefused(String text) {
-        refusedAlike(() -> XmlSupport.parseBoolean(text), () -> XmlSupport.parseBoolean(chars(text), text.length()));
     }
 
     @ParameterizedTest
