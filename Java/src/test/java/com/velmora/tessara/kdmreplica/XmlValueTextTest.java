@@ -55,40 +55,40 @@ class XmlValueTextTest {
     @CsvSource(delimiter = '|', value = {"0|0", "+5|5", "-5|-5", "' 42 '|42", "2147483647|2147483647",
         "-2147483648|-2147483648", "007|7"})
     void integersAreRead(String text, int expected) {
-        assertEquals(expected, XmlSupport.parseInt(text));
-        assertEquals(expected, XmlSupport.parseInt(chars(text), text.length()));
+        assertEquals(expected, ValueTexts.parseInt(text));
+        assertEquals(expected, ValueTexts.parseInt(chars(text), text.length()));
     }
 
     @ParameterizedTest
     @ValueSource(strings = {"", "+", "-", "1 2", "1.0", "0x10", "\u0663", "1_000", "2147483648", "--1", "+-1",
         "-2147483649", "9999999999", "12345678901", "4294967296", "+2147483648", "1-"})
     void otherIntegerTextsAreRefused(String text) {
-        refusedAlike(() -> XmlSupport.parseInt(text), () -> XmlSupport.parseInt(chars(text), text.length()));
+        refusedAlike(() -> ValueTexts.parseInt(text), () -> ValueTexts.parseInt(chars(text), text.length()));
     }
 
     @ParameterizedTest
     @CsvSource(delimiter = '|', value = {"1|1.0", "5.|5.0", ".5|0.5", "-.5|-0.5", "+1E3|1000.0", "1e-2|0.01",
         "1.5E+2|150.0", "INF|Infinity", "-INF|-Infinity", "' 2.25 '|2.25", "-0|-0.0"})
     void doublesAreRead(String text, double expected) {
-        assertEquals(Double.doubleToRawLongBits(expected), Double.doubleToRawLongBits(XmlSupport.parseDouble(text, null)));
+        assertEquals(Double.doubleToRawLongBits(expected), Double.doubleToRawLongBits(ValueTexts.parseDouble(text, null)));
         assertEquals(Double.doubleToRawLongBits(expected),
-                Double.doubleToRawLongBits(XmlSupport.parseDouble(chars(text), text.length(), null)));
+                Double.doubleToRawLongBits(ValueTexts.parseDouble(chars(text), text.length(), null)));
     }
 
     @ParameterizedTest
     @ValueSource(strings = {"", ".", "e5", "1e", "1e+", "1.2.3", "0x1p3", "1d", "1f", "Infinity", "inf", "NAN",
         "\u0661.5", "1 e5", "+.e1", "1e5.5", "1..2", "-", "+", "1e+-5", "1.5e", "--1", "1-"})
     void otherDoubleTextsAreRefused(String text) {
-        refusedAlike(() -> XmlSupport.parseDouble(text, null),
-                () -> XmlSupport.parseDouble(chars(text), text.length(), null));
+        refusedAlike(() -> ValueTexts.parseDouble(text, null),
+                () -> ValueTexts.parseDouble(chars(text), text.length(), null));
     }
 
     /** Reads a text both ways and checks the bits against the JDK's reading of the same text. */
     private static void readLikeTheJdk(String text) {
         long expected = Double.doubleToRawLongBits(Double.parseDouble(text));
-        assertEquals(expected, Double.doubleToRawLongBits(XmlSupport.parseDouble(chars(text), text.length(), null)),
+        assertEquals(expected, Double.doubleToRawLongBits(ValueTexts.parseDouble(chars(text), text.length(), null)),
                 text);
-        assertEquals(expected, Double.doubleToRawLongBits(XmlSupport.parseDouble(text, null)), text);
+        assertEquals(expected, Double.doubleToRawLongBits(ValueTexts.parseDouble(text, null)), text);
     }
 
     @ParameterizedTest
@@ -115,10 +115,10 @@ class XmlValueTextTest {
         for (int i = 0; i < 200_000; i++) {
             double d = Double.longBitsToDouble(rnd.nextLong());
             if (d == d && !Double.isInfinite(d)) {
-                readLikeTheJdk(XmlSupport.formatDouble(d));
+                readLikeTheJdk(ValueTexts.formatDouble(d));
             }
             // and the common magnitudes, as the benchmark's prices and weights
-            readLikeTheJdk(XmlSupport.formatDouble(rnd.nextDouble() * Math.pow(10, rnd.nextInt(40) - 20)));
+            readLikeTheJdk(ValueTexts.formatDouble(rnd.nextDouble() * Math.pow(10, rnd.nextInt(40) - 20)));
         }
     }
 
@@ -156,9 +156,9 @@ class XmlValueTextTest {
     @ValueSource(strings = {"2024-03-01T12:00:00.250Z", "0001-01-01T00:00:00.000Z", "9999-12-31T23:59:59.999Z",
         "2024-02-29T23:59:59.000Z", "1970-01-01T00:00:00.001Z", "1969-12-31T23:59:59.999Z"})
     void datesAsWrittenAreRead(String text) {
-        assertEquals(Instant.parse(text).toEpochMilli(), XmlSupport.parseDate(text));
-        assertEquals(Instant.parse(text).toEpochMilli(), XmlSupport.parseDate(chars(text), text.length()));
-        assertEquals(text, XmlSupport.formatDate(XmlSupport.parseDate(text)));
+        assertEquals(Instant.parse(text).toEpochMilli(), ValueTexts.parseDate(text));
+        assertEquals(Instant.parse(text).toEpochMilli(), ValueTexts.parseDate(chars(text), text.length()));
+        assertEquals(text, ValueTexts.formatDate(ValueTexts.parseDate(text)));
     }
 
     @Test
@@ -180,9 +180,9 @@ class XmlValueTextTest {
     }
 
     private static void checkDate(long millis) {
-        String text = XmlSupport.formatDate(millis);
-        assertEquals(millis, XmlSupport.parseDate(chars(text), text.length()), text);
-        assertEquals(millis, XmlSupport.parseDate(text), text);
+        String text = ValueTexts.formatDate(millis);
+        assertEquals(millis, ValueTexts.parseDate(chars(text), text.length()), text);
+        assertEquals(millis, ValueTexts.parseDate(text), text);
     }
 
     @ParameterizedTest
@@ -191,9 +191,9 @@ class XmlValueTextTest {
         "2024-01-01T00:00:60.000Z", "0000-01-01T00:00:00.000Z", "2024-01-01T24:00:01.000Z", "2024-01-0aT00:00:00.000Z",
         "2024/01/01T00:00:00.000Z", "2024-01-01T00:00:00.000X"})
     void impossibleDatesOfTheWrittenShapeAreRefused(String text) {
-        IllegalArgumentException e = assertThrows(IllegalArgumentException.class, () -> XmlSupport.parseDate(text));
+        IllegalArgumentException e = assertThrows(IllegalArgumentException.class, () -> ValueTexts.parseDate(text));
         assertTrue(e.getMessage().contains("'" + text + "'"), e.getMessage());
-        refusedAlike(() -> XmlSupport.parseDate(text), () -> XmlSupport.parseDate(chars(text), text.length()));
+        refusedAlike(() -> ValueTexts.parseDate(text), () -> ValueTexts.parseDate(chars(text), text.length()));
     }
 
     @ParameterizedTest
@@ -201,20 +201,20 @@ class XmlValueTextTest {
         "2023-06-31T00:00:00.000Z", "2023-09-31T00:00:00.000Z", "2023-11-31T00:00:00.000Z", "2023-12-32T00:00:00.000Z",
         "2023-01-00T00:00:00.000Z", "2023-01-01T00:00:00.00aZ", "2023-01-01T00:00:00.000z", "2023-01-01t00:00:00.000Z"})
     void daysThatDoNotExistAreRefusedByBothPaths(String text) {
-        refusedAlike(() -> XmlSupport.parseDate(text), () -> XmlSupport.parseDate(chars(text), text.length()));
+        refusedAlike(() -> ValueTexts.parseDate(text), () -> ValueTexts.parseDate(chars(text), text.length()));
     }
 
     @ParameterizedTest
     @CsvSource(delimiter = '|', value = {"true|true", "1|true", "false|false", "0|false", "' true'|true", "'0 '|false"})
     void booleansAreRead(String text, boolean expected) {
-        assertEquals(expected, XmlSupport.parseBoolean(text));
-        assertEquals(expected, XmlSupport.parseBoolean(chars(text), text.length()));
+        assertEquals(expected, ValueTexts.parseBoolean(text));
+        assertEquals(expected, ValueTexts.parseBoolean(chars(text), text.length()));
     }
 
     @ParameterizedTest
     @ValueSource(strings = {"", "True", "TRUE", "yes", "2", "10", "fals", "truee", "t"})
     void otherBooleanTextsAreRefused(String text) {
-        refusedAlike(() -> XmlSupport.parseBoolean(text), () -> XmlSupport.parseBoolean(chars(text), text.length()));
+        refusedAlike(() -> ValueTexts.parseBoolean(text), () -> ValueTexts.parseBoolean(chars(text), text.length()));
     }
 
     @ParameterizedTest
@@ -222,7 +222,7 @@ class XmlValueTextTest {
         "2024-01-01T00:00:00.000+01:00|2023-12-31T23:00:00Z", "2024-01-01T00:00:00Z|2024-01-01T00:00:00Z",
         "12024-01-01T00:00:00.000Z|+12024-01-01T00:00:00Z", "' 2024-01-01T00:00:00.000Z'|2024-01-01T00:00:00Z"})
     void otherDateFormsTakeTheGeneralPath(String text, String instant) {
-        assertEquals(Instant.parse(instant).toEpochMilli(), XmlSupport.parseDate(text));
-        assertEquals(Instant.parse(instant).toEpochMilli(), XmlSupport.parseDate(chars(text), text.length()));
+        assertEquals(Instant.parse(instant).toEpochMilli(), ValueTexts.parseDate(text));
+        assertEquals(Instant.parse(instant).toEpochMilli(), ValueTexts.parseDate(chars(text), text.length()));
     }
 }
