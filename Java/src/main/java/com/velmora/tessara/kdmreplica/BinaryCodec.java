@@ -2,9 +2,6 @@ package com.velmora.tessara.kdmreplica;
 
 import com.velmora.tessara.kdmreplica.vrattributes.AccessMode;
 import com.velmora.tessara.kdmreplica.vrattributes.Visibility;
-import java.nio.ByteBuffer;
-import java.nio.charset.CharacterCodingException;
-import java.nio.charset.StandardCharsets;
 import java.util.ArrayList;
 import java.util.Arrays;
 import java.util.HashMap;
@@ -77,8 +74,6 @@ final class BinaryCodec {
     static final int MAX_INFLATE_RATIO = 1100;
     /** Longest super class chain (classes from a root to the deepest subclass). */
     static final int MAX_SUPER_DEPTH = 1000;
-    /** Largest array the writer makes. */
-    private static final int MAX_ARRAY = Integer.MAX_VALUE - 16;
 
     private static final AttributeType[] TYPES = {AttributeType.Integer, AttributeType.Double,
         AttributeType.String, AttributeType.Date, AttributeType.Boolean, AttributeType.Binary,
@@ -140,7 +135,7 @@ final class BinaryCodec {
 
     /** The binary form of a replica (holds the replica's read lock while encoding). */
     static byte[] write(Replica r, boolean compressed) {
-        Out payload;
+        ByteOut payload;
         Lock l = r.rw.readLock();
         l.lock();
         try {
@@ -158,7 +153,7 @@ final class BinaryCodec {
         byte[] out;
         int stored;
         if (!compressed) {
-            if (length > MAX_ARRAY - HEADER_SIZE) {
+            if (length > ByteOut.MAX_ARRAY - HEADER_SIZE) {
                 throw new IllegalArgumentException("binary replica: a payload of " + length
                         + " bytes does not fit in one byte array with its header");
             }
@@ -179,7 +174,7 @@ final class BinaryCodec {
                 int n = HEADER_SIZE;
                 while (!d.finished()) {
                     if (n == out.length) {
-                        out = Arrays.copyOf(out, (int) Math.min(MAX_ARRAY, out.length * 2L));
+                        out = Arrays.copyOf(out, (int) Math.min(ByteOut.MAX_ARRAY, out.length * 2L));
                     }
                     n += d.deflate(out, n, out.length - n);
                 }
@@ -213,109 +208,10 @@ final class BinaryCodec {
         return ((b[at] & 0xFFL) << 24) | ((b[at + 1] & 0xFFL) << 16) | ((b[at + 2] & 0xFFL) << 8) | (b[at + 3] & 0xFFL);
     }
 
-    /** A growable byte buffer with the payload's primitive encodings. */
-    static final class Out {
-        byte[] b;
-        int n;
-
-        Out(int capacity) {
-            b = new byte[Math.max(16, capacity)];
-        }
-
-        void ensure(int k) {
-            if (b.length - n < k) {
-                long need = (long) n + k;
-                if (need > MAX_ARRAY) {
-                    throw new IllegalArgumentException("binary replica: the payload would exceed " + MAX_ARRAY
-                            + " bytes, more than one byte array holds");
-                }
-                b = Arrays.copyOf(b, (int) Math.max(need, Math.min(MAX_ARRAY, b.length * 2L)));
-            }
-        }
-
-        void u8(int v) {
-            ensure(1);
-            b[n++] = (byte) v;
-        }
-
-        /** Unsigned LEB128 of all 64 bits. */
-        void uvar(long v) {
-            ensure(10);
-            while ((v & ~0x7FL) != 0) {
-                b[n++] = (byte) ((v & 0x7F) | 0x80);
-                v >>>= 7;
-            }
-            b[n++] = (byte) v;
-        }
-
-        void zint(int v) {
-            uvar(((v << 1) ^ (v >> 31)) & 0xFFFFFFFFL);
-        }
-
-        void zlong(long v) {
-            uvar((v << 1) ^ (v >> 63));
-        }
-
-        void i64(long v) {
-            ensure(8);
-            for (int s = 56; s >= 0; s -= 8) {
-                b[n++] = (byte) (v >>> s);
-            }
-        }
-
-        void raw(byte[] a) {
-            ensure(a.length);
-            System.arraycopy(a, 0, b, n, a.length);
-            n += a.length;
-        }
-
-        void bin(byte[] a) {
-            uvar(a.length);
-            raw(a);
-        }
-
-        void str(String s) {
-            if (s.isEmpty()) {
-                u8(0);
-            } else if (!hasUnpairedSurrogate(s)) {
-                byte[] u = s.getBytes(StandardCharsets.UTF_8);
-                uvar((long) u.length << 1);
-                raw(u);
-            } else {
-                long len = 2L * s.length();
-                uvar(len << 1 | 1);
-                ensure((int) Math.min(Integer.MAX_VALUE, len));
-                ByteBuffer.wrap(b, n, (int) len).asCharBuffer().put(s);
-                n += (int) len;
-            }
-        }
-
-        void strs(String[] a) {
-            uvar(a.length);
-            for (String s : a) {
-                str(s);
-            }
-        }
-    }
-
-    static boolean hasUnpairedSurrogate(String s) {
-        for (int i = 0, len = s.length(); i < len; i++) {
-            char c = s.charAt(i);
-            if (Character.isSurrogate(c)) {
-                if (Character.isHighSurrogate(c) && i + 1 < len && Character.isLowSurrogate(s.charAt(i + 1))) {
-                    i++;
-                } else {
-                    return true;
-                }
-            }
-        }
-        return false;
-    }
-
     private static final class Encoder {
         private final Replica r;
         private final List<Model> models;
-        private final Out out = new Out(1 << 16);
+        private final ByteOut out = new ByteOut(1 << 16);
         private final IdentityHashMap<Model, Integer> modelIndex = new IdentityHashMap<>();
         private final int[] base;
         /** Table index of deleted instances and of the outside ones. */
@@ -329,7 +225,7 @@ final class BinaryCodec {
             this.base = new int[models.size()];
         }
 
-        Out encode() {
+        ByteOut encode() {
             out.str(r.name);
             out.str(r.schemaLocation == null ? "" : r.schemaLocation);
             out.uvar(models.size());
@@ -653,7 +549,7 @@ final class BinaryCodec {
     }
 
     /** Checks the header and returns a reader over the payload (inflated when compressed). */
-    static In unframe(byte[] bytes, boolean compressed) {
+    static ByteIn unframe(byte[] bytes, boolean compressed) {
         if (bytes.length < HEADER_SIZE) {
             throw header("truncated: " + bytes.length + " bytes, fewer than the " + HEADER_SIZE
                     + " bytes of a header", bytes.length);
@@ -711,7 +607,7 @@ final class BinaryCodec {
             throw header("checksum mismatch: the payload's CRC-32 is " + Long.toHexString(c.getValue())
                     + ", the header says " + Integer.toHexString(crc), 16);
         }
-        return new In(payload, start, start + (int) payloadLength);
+        return new ByteIn(payload, start, start + (int) payloadLength);
     }
 
     /** Inflates exactly {@code declared} bytes, growing the output step by step, never past it. */
@@ -767,193 +663,13 @@ final class BinaryCodec {
         }
     }
 
-    /** A bounds-checked reader of the payload's primitive encodings. */
-    static final class In {
-        final byte[] b;
-        final int base;
-        final int end;
-        int pos;
-
-        In(byte[] b, int base, int end) {
-            this.b = b;
-            this.base = base;
-            this.end = end;
-            this.pos = base;
-        }
-
-        /**
-         * What is being read, for the {@code {class}} and {@code {attr}} in descriptions: kept as
-         * parts and joined only when a message is made, so reading a schema builds no texts.
-         */
-        String className = "";
-        String attrName = "";
-        int index;
-
-        private String expand(String what) {
-            if (what.indexOf('{') < 0) {
-                return what;
-            }
-            return what.replace("{class}", "class '" + className + "'")
-                    .replace("{attr}", "attribute '" + className + "." + attrName + "'")
-                    .replace("{k}", Integer.toString(index));
-        }
-
-        int remaining() {
-            return end - pos;
-        }
-
-        int offset() {
-            return pos - base;
-        }
-
-        ReplicaBinaryException failAt(String what, int at, Throwable cause) {
-            return new ReplicaBinaryException(what, at - base, true, cause);
-        }
-
-        ReplicaBinaryException fail(String what) {
-            return failAt(what, pos, null);
-        }
-
-        int u8(String what) {
-            if (pos >= end) {
-                throw fail("truncated: " + expand(what) + " is missing");
-            }
-            return b[pos++] & 0xFF;
-        }
-
-        /** Unsigned LEB128 of at most {@code maxBytes} bytes; the last byte may hold {@code lastMax} at most. */
-        private long uvar(String what, int maxBytes, int lastMax) {
-            int start = pos;
-            long v = 0;
-            for (int i = 0;; i++) {
-                if (pos >= end) {
-                    throw failAt("truncated: " + expand(what) + " is cut short", start, null);
-                }
-                int c = b[pos++] & 0xFF;
-                if (i == maxBytes - 1) {
-                    if (c > lastMax) {
-                        throw failAt("malformed number in " + expand(what) + ": too many bytes", start, null);
-                    }
-                    return v | (long) c << (7 * i);
-                }
-                v |= (long) (c & 0x7F) << (7 * i);
-                if (c < 0x80) {
-                    return v;
-                }
-            }
-        }
-
-        long u32(String what) {
-            return uvar(what, 5, 0x0F);
-        }
-
-        /** A count of items of at least {@code minBytes} bytes each that must still follow. */
-        int count(String what, long minBytes, long owed) {
-            int start = pos;
-            long v = u32(what);
-            long room = Math.max(0, remaining() - owed);
-            if (v > room / minBytes) {
-                throw failAt(expand(what) + " is " + v + ", more than the " + remaining() + " remaining bytes can hold",
-                        start, null);
-            }
-            return (int) v;
-        }
-
-        int count(String what, long minBytes) {
-            return count(what, minBytes, 0);
-        }
-
-        int index(String what, int size) {
-            int start = pos;
-            long v = u32(what);
-            if (v >= size) {
-                throw failAt(expand(what) + " is " + v + ", outside the " + size + " instances of the table", start, null);
-            }
-            return (int) v;
-        }
-
-        int zint(String what) {
-            int u = (int) u32(what);
-            return (u >>> 1) ^ -(u & 1);
-        }
-
-        long zlong(String what) {
-            long u = uvar(what, 10, 1);
-            return (u >>> 1) ^ -(u & 1);
-        }
-
-        long i64(String what) {
-            if (remaining() < 8) {
-                throw fail("truncated: " + expand(what) + " needs 8 bytes, " + remaining() + " remain");
-            }
-            long v = 0;
-            for (int i = 0; i < 8; i++) {
-                v = v << 8 | (b[pos++] & 0xFF);
-            }
-            return v;
-        }
-
-        byte[] bin(String what) {
-            int start = pos;
-            long len = u32(what);
-            if (len > remaining()) {
-                throw failAt("truncated: " + expand(what) + " announces " + len + " bytes, " + remaining() + " remain", start,
-                        null);
-            }
-            byte[] a = Arrays.copyOfRange(b, pos, pos + (int) len);
-            pos += (int) len;
-            return a;
-        }
-
-        String str(String what) {
-            int start = pos;
-            long tag = u32(what);
-            long len = tag >>> 1;
-            if (len > remaining()) {
-                throw failAt("truncated: " + expand(what) + " announces " + len + " bytes, " + remaining() + " remain", start,
-                        null);
-            }
-            int n = (int) len;
-            if (n == 0) {
-                return "";
-            }
-            String s;
-            if ((tag & 1) == 0) {
-                s = new String(b, pos, n, StandardCharsets.UTF_8);
-                if (s.indexOf('\uFFFD') >= 0) {
-                    try {
-                        StandardCharsets.UTF_8.newDecoder().decode(ByteBuffer.wrap(b, pos, n));
-                    } catch (CharacterCodingException e) {
-                        throw failAt(expand(what) + " is not valid UTF-8", start, e);
-                    }
-                }
-            } else {
-                if ((n & 1) != 0) {
-                    throw failAt(expand(what) + " holds an odd number of bytes (" + n + ") of UTF-16", start, null);
-                }
-                s = ByteBuffer.wrap(b, pos, n).asCharBuffer().toString();
-            }
-            pos += n;
-            return s;
-        }
-
-        String[] strs(String what, String countWhat) {
-            int n = count(countWhat, 1);
-            String[] a = new String[n];
-            for (int i = 0; i < n; i++) {
-                a[i] = str(what);
-            }
-            return a;
-        }
-    }
-
     private static final class Decoder {
-        private final In in;
+        private final ByteIn in;
         private ClassDef[] classes;
         private int[] classAt;
         private Instance[] table;
 
-        Decoder(In in) {
+        Decoder(ByteIn in) {
             this.in = in;
         }
 

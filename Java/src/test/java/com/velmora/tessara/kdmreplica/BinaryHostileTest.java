@@ -39,8 +39,8 @@ class BinaryHostileTest {
 
     // ------------------------------------------------------------ payload building
 
-    private static BinaryCodec.Out start(int classes) {
-        BinaryCodec.Out o = new BinaryCodec.Out(64);
+    private static ByteOut start(int classes) {
+        ByteOut o = new ByteOut(64);
         o.str("r");
         o.str("");
         o.uvar(classes);
@@ -48,7 +48,7 @@ class BinaryHostileTest {
     }
 
     /** A class whose attributes are named a0, a1, ... with the given codes (type | MULTI). */
-    private static void cls(BinaryCodec.Out o, String name, String sup, int... attrs) {
+    private static void cls(ByteOut o, String name, String sup, int... attrs) {
         o.str(name);
         o.str(sup);
         o.str("");
@@ -70,8 +70,8 @@ class BinaryHostileTest {
     }
 
     /** One class of one attribute, one live instance without identifier whose value the caller writes. */
-    private static byte[] oneValue(int code, Consumer<BinaryCodec.Out> value) {
-        BinaryCodec.Out o = start(1);
+    private static byte[] oneValue(int code, Consumer<ByteOut> value) {
+        ByteOut o = start(1);
         cls(o, "A", "", code);
         o.uvar(1);
         o.u8(0);
@@ -191,11 +191,11 @@ class BinaryHostileTest {
     @Test
     void countsAndLengthsNearIntegerMaxValueAreRefusedWithoutAllocating() {
         long max = Integer.MAX_VALUE;
-        BinaryCodec.Out o = start((int) max);
+        ByteOut o = start((int) max);
         refused(seal(o, false), false, FACTOR, "class count is 2147483647");
         refused(seal(o, true), true, FACTOR, "class count is 2147483647");
 
-        o = new BinaryCodec.Out(16);
+        o = new ByteOut(16);
         o.uvar((max - 1) << 1);
         refused(seal(o, false), false, FACTOR, "replica name announces 2147483646 bytes");
 
@@ -255,7 +255,7 @@ class BinaryHostileTest {
         long[] used = new long[2];
         for (int round = 0; round < 3; round++) { // the first rounds warm up
             for (int count : new int[] {0, 1000}) {
-                BinaryCodec.Out o = start(1);
+                ByteOut o = start(1);
                 cls(o, "Wide", "", new int[2000]);
                 o.uvar(count);
                 for (int i = 0; i < 1100; i++) {
@@ -363,7 +363,7 @@ class BinaryHostileTest {
         b[16] ^= 1;
         refused(b, false, FACTOR, "checksum mismatch", "offset 16 of the buffer");
 
-        BinaryCodec.Out o = start(2);
+        ByteOut o = start(2);
         cls(o, "A", "");
         cls(o, "A", "");
         refused(seal(o, false), false, FACTOR, "two classes are named 'A'");
