@@ -459,7 +459,7 @@ public class Replica {
      * @throws IllegalArgumentException for null
      */
     public void insertSchemaString(String xsd) {
-        XsdReader.insert(this, XmlSupport.Src.ofString("XSD", xsd, "insertSchemaString"));
+        XsdReader.insert(this, XmlInput.Src.ofString("XSD", xsd, "insertSchemaString"));
     }
 
     /**
@@ -467,7 +467,7 @@ public class Replica {
      * local files in the file's directory (or below it), nothing else.
      */
     public void insertSchemaFile(String path) {
-        XsdReader.insert(this, XmlSupport.Src.ofFile("XSD", path, "insertSchemaFile"));
+        XsdReader.insert(this, XmlInput.Src.ofFile("XSD", path, "insertSchemaFile"));
     }
 
     /**
@@ -480,12 +480,12 @@ public class Replica {
      * @throws IllegalArgumentException for null
      */
     public void populatesFromXmlString(String xml) {
-        XmlReader.populate(this, XmlSupport.Src.ofString("XML", xml, "populatesFromXmlString"));
+        XmlReader.populate(this, XmlInput.Src.ofString("XML", xml, "populatesFromXmlString"));
     }
 
     /** As {@link #populatesFromXmlString}, from a file. */
     public void populatesFromXmlFile(String path) {
-        XmlReader.populate(this, XmlSupport.Src.ofFile("XML", path, "populatesFromXmlFile"));
+        XmlReader.populate(this, XmlInput.Src.ofFile("XML", path, "populatesFromXmlFile"));
     }
 
     /**
@@ -498,12 +498,12 @@ public class Replica {
      * @throws IllegalArgumentException for null
      */
     public static Replica readFromXmlString(String xml) {
-        return XmlReader.read(XmlSupport.Src.ofString("XML", xml, "readFromXmlString"));
+        return XmlReader.read(XmlInput.Src.ofString("XML", xml, "readFromXmlString"));
     }
 
     /** As {@link #readFromXmlString}, from a file; a relative schema location is taken from the file's directory. */
     public static Replica readFromXmlFile(String path) {
-        return XmlReader.read(XmlSupport.Src.ofFile("XML", path, "readFromXmlFile"));
+        return XmlReader.read(XmlInput.Src.ofFile("XML", path, "readFromXmlFile"));
     }
 
     /**

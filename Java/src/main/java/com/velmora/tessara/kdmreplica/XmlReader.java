@@ -1,8 +1,8 @@
 package com.velmora.tessara.kdmreplica;
 
-import static com.velmora.tessara.kdmreplica.XmlSupport.NS;
-import static com.velmora.tessara.kdmreplica.XmlSupport.XS;
-import static com.velmora.tessara.kdmreplica.XmlSupport.XSI;
+import static com.velmora.tessara.kdmreplica.XmlNames.NS;
+import static com.velmora.tessara.kdmreplica.XmlNames.XS;
+import static com.velmora.tessara.kdmreplica.XmlNames.XSI;
 
 import java.nio.file.Path;
 import java.util.ArrayList;
@@ -29,7 +29,7 @@ import javax.xml.stream.XMLStreamConstants;
 final class XmlReader {
     private final Staging st;
     private final Replica target;
-    private final XmlSupport.In in;
+    private final XmlInput.In in;
     private final Keys keys = new Keys();
     private final List<PendingRef> refs = new ArrayList<>();
 
@@ -120,7 +120,7 @@ final class XmlReader {
         int column;
     }
 
-    private XmlReader(Staging st, XmlSupport.In in) {
+    private XmlReader(Staging st, XmlInput.In in) {
         this.st = st;
         this.target = st.replica();
         this.in = in;
@@ -129,24 +129,24 @@ final class XmlReader {
     // ---------------------------------------------------------------- entry points
 
     /** {@code Replica.readFromXmlString} / {@code readFromXmlFile}. */
-    static Replica read(XmlSupport.Src src) {
+    static Replica read(XmlInput.Src src) {
         Replica r = new Replica(Names.generate("Replica"));
         load(r, src, true);
         return r;
     }
 
     /** {@code Replica.populatesFromXmlString} / {@code populatesFromXmlFile}. */
-    static void populate(Replica r, XmlSupport.Src src) {
+    static void populate(Replica r, XmlInput.Src src) {
         load(r, src, false);
     }
 
-    private static void load(Replica r, XmlSupport.Src src, boolean fresh) {
+    private static void load(Replica r, XmlInput.Src src, boolean fresh) {
         try (Staging st = new Staging(r)) {
-            try (XmlSupport.In in = src.open()) {
+            try (XmlInput.In in = src.open()) {
                 new XmlReader(st, in).document(src, fresh);
             }
             if (Replica.getFeature("validate")) {
-                XmlSupport.validate(src, XmlSupport.compileSchema(XsdWriter.text(r)));
+                XmlValidation.validate(src, XmlValidation.compileSchema(XsdWriter.text(r)));
             }
             st.finish();
         }
@@ -154,7 +154,7 @@ final class XmlReader {
 
     // ---------------------------------------------------------------- document
 
-    private void document(XmlSupport.Src src, boolean fresh) {
+    private void document(XmlInput.Src src, boolean fresh) {
         int e = in.nextTag("the prolog");
         if (e != XMLStreamConstants.START_ELEMENT || !in.is(NS, "replica")) {
             throw in.fail("the document element is " + (e == XMLStreamConstants.START_ELEMENT ? in.qname()
@@ -182,9 +182,9 @@ final class XmlReader {
             } else if (n.equals("nameEsc")) {
                 name = unescape(n, v);
             } else if (n.equals("format")) {
-                if (!v.strip().equals(XmlSupport.FORMAT)) {
-                    throw in.fail("the document is in format '" + XmlSupport.clip(v) + "'; this reader knows format "
-                            + XmlSupport.FORMAT);
+                if (!v.strip().equals(XmlNames.FORMAT)) {
+                    throw in.fail("the document is in format '" + XmlNames.clip(v) + "'; this reader knows format "
+                            + XmlNames.FORMAT);
                 }
             } else {
                 throw in.fail("attribute '" + n + "' is not expected on the document element");
@@ -212,12 +212,12 @@ final class XmlReader {
                 }
                 Path file;
                 try {
-                    file = XmlSupport.localFile(location, src.baseDir());
+                    file = SchemaLocations.localFile(location, src.baseDir());
                 } catch (IllegalArgumentException x) {
                     throw new XmlDocumentException(in.source, locLine, locColumn, x.getMessage(), x);
                 }
                 XsdReader x = XsdReader.forFile(file);
-                x.parseDocument(XmlSupport.Src.ofFile("XSD", file.toString(), "readFromXml"));
+                x.parseDocument(XmlInput.Src.ofFile("XSD", file.toString(), "readFromXml"));
                 x.apply(st);
             }
             st.schemaDone();
@@ -236,11 +236,11 @@ final class XmlReader {
 
     /** The location named for the replica namespace in an {@code xsi:schemaLocation}, decoded; or null. */
     private String schemaLocation(String v) {
-        List<String> t = XmlSupport.tokens(v);
+        List<String> t = XmlNames.tokens(v);
         for (int i = 0; i + 1 < t.size(); i += 2) {
             if (NS.equals(t.get(i))) {
                 try {
-                    return XmlSupport.decodeLocation(t.get(i + 1));
+                    return SchemaLocations.decodeLocation(t.get(i + 1));
                 } catch (IllegalArgumentException x) {
                     throw in.fail(x.getMessage(), x);
                 }
@@ -251,7 +251,7 @@ final class XmlReader {
 
     private String unescape(String attr, String v) {
         try {
-            return XmlSupport.unescape(v);
+            return XmlNames.unescape(v);
         } catch (IllegalArgumentException x) {
             throw in.fail("attribute '" + attr + "': " + x.getMessage(), x);
         }
@@ -289,19 +289,19 @@ final class XmlReader {
                 case "idEsc": id = unescape(n, v); break;
                 case "idBin":
                     try {
-                        id = XmlSupport.parseBinary(v);
+                        id = ValueTexts.parseBinary(v);
                     } catch (IllegalArgumentException x) {
                         throw in.fail("instance of '" + cls + "': identifier idBin " + x.getMessage(), x);
                     }
                     break;
                 case "state":
-                    for (String s : XmlSupport.tokens(v)) {
+                    for (String s : XmlNames.tokens(v)) {
                         switch (s) {
                             case "created": created = true; break;
                             case "modified": modified = true; break;
                             case "deleted": deleted = true; break;
                             default:
-                                throw in.fail("instance of '" + cls + "': state '" + XmlSupport.clip(s) + "' is not"
+                                throw in.fail("instance of '" + cls + "': state '" + XmlNames.clip(s) + "' is not"
                                         + " created, modified or deleted");
                         }
                     }
@@ -319,7 +319,7 @@ final class XmlReader {
         }
         if (key != null && !keys.add(key, x)) {
             throw new XmlDocumentException(in.source, line, column, "instance of '" + cls + "': key '"
-                    + XmlSupport.clip(key) + "' is used twice in the document", null);
+                    + XmlNames.clip(key) + "' is used twice in the document", null);
         }
         values(x, m, cls);
     }
@@ -396,7 +396,7 @@ final class XmlReader {
             String v = in.r.getAttributeValue(i);
             if (XSI.equals(ns) && n.equals("nil")) {
                 try {
-                    nil = XmlSupport.parseBoolean(v);
+                    nil = ValueTexts.parseBoolean(v);
                 } catch (IllegalArgumentException x2) {
                     throw in.fail("xsi:nil of '" + def.qualifiedName() + "': " + x2.getMessage(), x2);
                 }
@@ -441,11 +441,11 @@ final class XmlReader {
         }
         try {
             switch (def.type) {
-                case Integer: return XmlSupport.parseInt(in.chars, in.charCount);
-                case Double: return XmlSupport.parseDouble(in.chars, in.charCount, bits);
-                case Boolean: return XmlSupport.parseBoolean(in.chars, in.charCount);
-                case Date: return XmlSupport.parseDate(in.chars, in.charCount);
-                case Binary: return XmlSupport.parseBinary(text);
+                case Integer: return ValueTexts.parseInt(in.chars, in.charCount);
+                case Double: return ValueTexts.parseDouble(in.chars, in.charCount, bits);
+                case Boolean: return ValueTexts.parseBoolean(in.chars, in.charCount);
+                case Date: return ValueTexts.parseDate(in.chars, in.charCount);
+                case Binary: return ValueTexts.parseBinary(text);
                 case String:
                     if (esc == null) {
                         return text;
@@ -453,7 +453,7 @@ final class XmlReader {
                     if (!text.isEmpty()) {
                         throw new IllegalArgumentException("a value given in 'esc' has no content");
                     }
-                    return XmlSupport.unescape(esc);
+                    return XmlNames.unescape(esc);
                 default:
                     if (ref == null || !text.isBlank()) {
                         throw new IllegalArgumentException("a relationship value is an empty element with a 'ref'"
@@ -537,12 +537,12 @@ final class XmlReader {
                 if (t == null) {
                     throw new XmlDocumentException(in.source, k.line, k.column, "instance "
                             + r.from.describe() + ": attribute '" + def.qualifiedName() + "' refers to key '"
-                            + XmlSupport.clip(k.key) + "', which no instance of the document has", null);
+                            + XmlNames.clip(k.key) + "', which no instance of the document has", null);
                 }
                 if (!Values.isTarget(def.targetNames, t.model.classDef, target.models)) {
                     throw new XmlDocumentException(in.source, k.line, k.column, "instance "
                             + r.from.describe() + ": attribute '" + def.qualifiedName() + "' refers to key '"
-                            + XmlSupport.clip(k.key) + "', an instance of class '" + t.model.classDef.name
+                            + XmlNames.clip(k.key) + "', an instance of class '" + t.model.classDef.name
                             + "', not of a target class " + Arrays.toString(def.targetNames), null);
                 }
                 targets[i] = t;

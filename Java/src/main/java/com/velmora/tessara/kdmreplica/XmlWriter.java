@@ -1,7 +1,7 @@
 package com.velmora.tessara.kdmreplica;
 
-import static com.velmora.tessara.kdmreplica.XmlSupport.NS;
-import static com.velmora.tessara.kdmreplica.XmlSupport.XSI;
+import static com.velmora.tessara.kdmreplica.XmlNames.NS;
+import static com.velmora.tessara.kdmreplica.XmlNames.XSI;
 
 import java.util.IdentityHashMap;
 import java.util.concurrent.locks.Lock;
@@ -29,14 +29,14 @@ import java.util.concurrent.locks.Lock;
 final class XmlWriter {
     private final Replica replica;
     private final boolean withState;
-    private final XmlSupport.Out out;
+    private final XmlOutput out;
     private final IdentityHashMap<Model, Integer> firstKey = new IdentityHashMap<>();
     private final IdentityHashMap<Instance, Integer> deletedKeys = new IdentityHashMap<>();
 
     private XmlWriter(Replica replica, boolean withState) {
         this.replica = replica;
         this.withState = withState;
-        this.out = new XmlSupport.Out(Replica.getFeature("indent"));
+        this.out = new XmlOutput(Replica.getFeature("indent"));
     }
 
     /** {@code Replica.getXml}: takes the replica's read lock for the whole pass. */
@@ -53,9 +53,9 @@ final class XmlWriter {
     private String run(boolean withSchema) {
         int next = 1;
         for (Model m : replica.models.items) {
-            XmlSupport.checkXmlName("class", m.classDef.name);
+            XmlNames.checkXmlName("class", m.classDef.name);
             for (AttributeDef a : m.alignedTo) {
-                XmlSupport.checkXmlName("class '" + m.classDef.name + "': attribute", a.name);
+                XmlNames.checkXmlName("class '" + m.classDef.name + "': attribute", a.name);
             }
             firstKey.put(m, next);
             next += m.instances.count;
@@ -70,10 +70,10 @@ final class XmlWriter {
         out.start("", "replica", NS);
         out.namespace("", NS);
         out.namespace("xsi", XSI);
-        out.attr("format", XmlSupport.FORMAT);
+        out.attr("format", XmlNames.FORMAT);
         out.textAttr("name", replica.name);
         if (!location.isEmpty()) {
-            out.attr("xsi", XSI, "schemaLocation", NS + " " + XmlSupport.encodeLocation(location));
+            out.attr("xsi", XSI, "schemaLocation", NS + " " + SchemaLocations.encodeLocation(location));
         }
         if (withSchema) {
             XsdWriter.writeSchema(out, replica);
@@ -138,7 +138,7 @@ final class XmlWriter {
         if (id instanceof String) {
             out.textAttr("id", (String) id);
         } else if (id instanceof byte[]) {
-            out.attr("idBin", XmlSupport.formatBinary((byte[]) id));
+            out.attr("idBin", ValueTexts.formatBinary((byte[]) id));
         }
         if (withState && x.state != 0) {
             StringBuilder b = new StringBuilder();
@@ -173,18 +173,18 @@ final class XmlWriter {
     }
 
     private void string(String name, String s) {
-        if (XmlSupport.needsEscape(s, false)) {
+        if (XmlNames.needsEscape(s, false)) {
             out.empty("", name, NS);
-            out.attr("esc", XmlSupport.escape(s));
+            out.attr("esc", XmlNames.escape(s));
         } else {
             out.element("", name, NS, s);
         }
     }
 
     private void dbl(String name, double d) {
-        String bits = XmlSupport.nanBits(d);
+        String bits = ValueTexts.nanBits(d);
         if (bits == null) {
-            out.element("", name, NS, XmlSupport.formatDouble(d));
+            out.element("", name, NS, ValueTexts.formatDouble(d));
         } else {
             out.start("", name, NS);
             out.attr("bits", bits);
@@ -205,8 +205,8 @@ final class XmlWriter {
             switch (def.type) {
                 case String: string(n, (String) v); break;
                 case Double: dbl(n, (Double) v); break;
-                case Date: out.element("", n, NS, XmlSupport.formatDate((Long) v)); break;
-                case Binary: out.element("", n, NS, XmlSupport.formatBinary((byte[]) v)); break;
+                case Date: out.element("", n, NS, ValueTexts.formatDate((Long) v)); break;
+                case Binary: out.element("", n, NS, ValueTexts.formatBinary((byte[]) v)); break;
                 case Relationship: ref(x, def, (Instance) v); break;
                 default: out.element("", n, NS, v.toString()); break;
             }
@@ -242,12 +242,12 @@ final class XmlWriter {
                 break;
             case Date:
                 for (long ms : (long[]) v) {
-                    out.element("", n, NS, XmlSupport.formatDate(ms));
+                    out.element("", n, NS, ValueTexts.formatDate(ms));
                 }
                 break;
             case Binary:
                 for (byte[] b : (byte[][]) v) {
-                    out.element("", n, NS, XmlSupport.formatBinary(b));
+                    out.element("", n, NS, ValueTexts.formatBinary(b));
                 }
                 break;
             default:

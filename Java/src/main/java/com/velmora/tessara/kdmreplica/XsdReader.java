@@ -1,7 +1,7 @@
 package com.velmora.tessara.kdmreplica;
 
-import static com.velmora.tessara.kdmreplica.XmlSupport.NS;
-import static com.velmora.tessara.kdmreplica.XmlSupport.XS;
+import static com.velmora.tessara.kdmreplica.XmlNames.NS;
+import static com.velmora.tessara.kdmreplica.XmlNames.XS;
 
 import com.velmora.tessara.kdmreplica.vrattributes.AccessMode;
 import com.velmora.tessara.kdmreplica.vrattributes.Visibility;
@@ -92,7 +92,7 @@ final class XsdReader {
                 real = schemaFile.toRealPath();
             } catch (IOException e) {
                 throw new IllegalArgumentException("cannot read XSD file '" + schemaFile + "': "
-                        + XmlSupport.describe(e), e);
+                        + XmlInput.describe(e), e);
             }
             this.rootDir = real.getParent();
             this.currentDir = rootDir;
@@ -105,7 +105,7 @@ final class XsdReader {
     // ---------------------------------------------------------------- entry points
 
     /** {@code Replica.insertSchemaString} / {@code insertSchemaFile}. */
-    static void insert(Replica r, XmlSupport.Src src) {
+    static void insert(Replica r, XmlInput.Src src) {
         XsdReader rd = new XsdReader(src.file, src.file == null
                 ? "a schema given as a string may not include or import other schemas" : null);
         rd.parseDocument(src);
@@ -126,8 +126,8 @@ final class XsdReader {
     }
 
     /** Reads a whole schema document. */
-    void parseDocument(XmlSupport.Src src) {
-        try (XmlSupport.In in = src.open()) {
+    void parseDocument(XmlInput.Src src) {
+        try (XmlInput.In in = src.open()) {
             int e = in.nextTag("the prolog");
             if (e != XMLStreamConstants.START_ELEMENT || !in.is(XS, "schema")) {
                 throw in.fail("the document element is " + (e == XMLStreamConstants.START_ELEMENT ? in.qname()
@@ -142,22 +142,22 @@ final class XsdReader {
 
     // ---------------------------------------------------------------- parsing
 
-    private static XmlDocumentException unsupported(XmlSupport.In in, String where) {
+    private static XmlDocumentException unsupported(XmlInput.In in, String where) {
         return in.fail("the construct " + in.qname() + " is not supported " + where + " (" + SUPPORTED + ")");
     }
 
-    private static XmlDocumentException unsupportedAttr(XmlSupport.In in, int i) {
+    private static XmlDocumentException unsupportedAttr(XmlInput.In in, int i) {
         return in.fail("attribute '" + in.attrName(i) + "' of " + in.qname() + " is not supported (" + SUPPORTED
                 + ")");
     }
 
-    private static boolean plain(XmlSupport.In in, int i) {
+    private static boolean plain(XmlInput.In in, int i) {
         String ns = in.r.getAttributeNamespace(i);
         return ns == null || ns.isEmpty();
     }
 
     /** Parses an {@code xs:schema} element; the reader is on its start tag and ends on its end tag. */
-    void parseSchema(XmlSupport.In in) {
+    void parseSchema(XmlInput.In in) {
         String tns = null;
         for (int i = 0; i < in.r.getAttributeCount(); i++) {
             String n = in.r.getAttributeLocalName(i);
@@ -214,7 +214,7 @@ final class XsdReader {
         }
     }
 
-    private void include(XmlSupport.In in) {
+    private void include(XmlInput.In in) {
         String what = in.qname();
         String loc = in.attr("schemaLocation");
         if (refusal != null) {
@@ -225,32 +225,32 @@ final class XsdReader {
         }
         String decoded;
         try {
-            decoded = XmlSupport.decodeLocation(loc.strip());
+            decoded = SchemaLocations.decodeLocation(loc.strip());
         } catch (IllegalArgumentException e) {
             throw in.fail(what + ": " + e.getMessage(), e);
         }
         if (SCHEME.matcher(decoded).matches()) {
-            throw in.fail(what + " of '" + XmlSupport.clip(decoded) + "' is refused: only local files next to the"
+            throw in.fail(what + " of '" + XmlNames.clip(decoded) + "' is refused: only local files next to the"
                     + " inserted schema are read, never URLs (nothing was fetched)");
         }
         Path p;
         try {
             p = currentDir.resolve(decoded).normalize();
         } catch (java.nio.file.InvalidPathException e) {
-            throw in.fail(what + ": '" + XmlSupport.clip(decoded) + "' is not a valid path", e);
+            throw in.fail(what + ": '" + XmlNames.clip(decoded) + "' is not a valid path", e);
         }
         if (!p.startsWith(rootDir)) {
-            throw in.fail(what + " of '" + XmlSupport.clip(decoded) + "' is refused: it is outside the directory of"
+            throw in.fail(what + " of '" + XmlNames.clip(decoded) + "' is refused: it is outside the directory of"
                     + " the inserted schema, " + rootDir + " (nothing was read)");
         }
         Path real;
         try {
             real = p.toRealPath();
         } catch (IOException e) {
-            throw in.fail(what + ": cannot read '" + p + "': " + XmlSupport.describe(e), e);
+            throw in.fail(what + ": cannot read '" + p + "': " + XmlInput.describe(e), e);
         }
         if (!real.startsWith(rootDir) || !Files.isRegularFile(real)) {
-            throw in.fail(what + " of '" + XmlSupport.clip(decoded) + "' is refused: it is not a file inside the"
+            throw in.fail(what + " of '" + XmlNames.clip(decoded) + "' is refused: it is not a file inside the"
                     + " directory of the inserted schema, " + rootDir + " (nothing was read)");
         }
         in.skip();
@@ -258,14 +258,14 @@ final class XsdReader {
             Path saved = currentDir;
             currentDir = real.getParent();
             try {
-                parseDocument(XmlSupport.Src.ofFile("XSD", real.toString(), "insertSchemaFile"));
+                parseDocument(XmlInput.Src.ofFile("XSD", real.toString(), "insertSchemaFile"));
             } finally {
                 currentDir = saved;
             }
         }
     }
 
-    private static void globalElement(XmlSupport.In in) {
+    private static void globalElement(XmlInput.In in) {
         boolean typed = false;
         for (int i = 0; i < in.r.getAttributeCount(); i++) {
             String n = in.r.getAttributeLocalName(i);
@@ -289,7 +289,7 @@ final class XsdReader {
         }
     }
 
-    private DeclaredType complexType(XmlSupport.In in) {
+    private DeclaredType complexType(XmlInput.In in) {
         DeclaredType t = new DeclaredType();
         t.source = in.source;
         t.line = in.line();
@@ -338,14 +338,14 @@ final class XsdReader {
         return t;
     }
 
-    private static void content(XmlSupport.In in, DeclaredType t) {
+    private static void content(XmlInput.In in, DeclaredType t) {
         if (t.hasContent) {
             throw in.fail("xs:complexType '" + t.name + "' has a second content model " + in.qname());
         }
         t.hasContent = true;
     }
 
-    private static boolean bool(XmlSupport.In in, String what, String v) {
+    private static boolean bool(XmlInput.In in, String what, String v) {
         switch (v.strip()) {
             case "true":
             case "1":
@@ -354,12 +354,12 @@ final class XsdReader {
             case "0":
                 return false;
             default:
-                throw in.fail("'" + what + "' of " + in.qname() + " is '" + XmlSupport.clip(v) + "', not a boolean");
+                throw in.fail("'" + what + "' of " + in.qname() + " is '" + XmlNames.clip(v) + "', not a boolean");
         }
     }
 
     /** The namespace URI and local name of a QName in an attribute value, resolved at the current element. */
-    private static String[] qname(XmlSupport.In in, String what, String text) {
+    private static String[] qname(XmlInput.In in, String what, String text) {
         String t = text.strip();
         int colon = t.indexOf(':');
         String prefix = colon < 0 ? "" : t.substring(0, colon);
@@ -371,7 +371,7 @@ final class XsdReader {
         return new String[] {ns == null ? "" : ns, local};
     }
 
-    private void complexContent(XmlSupport.In in, DeclaredType t) {
+    private void complexContent(XmlInput.In in, DeclaredType t) {
         for (int i = 0; i < in.r.getAttributeCount(); i++) {
             String n = in.r.getAttributeLocalName(i);
             if (!plain(in, i) || !n.equals("id") && !(n.equals("mixed") && !bool(in, n, in.r.getAttributeValue(i)))) {
@@ -426,7 +426,7 @@ final class XsdReader {
         }
     }
 
-    private static void attributeGroupRef(XmlSupport.In in) {
+    private static void attributeGroupRef(XmlInput.In in) {
         String ref = in.attr("ref");
         String[] q = ref == null ? null : qname(in, "ref", ref);
         if (q == null || !NS.equals(q[0]) || !XsdWriter.INSTANCE_ATTRIBUTES.equals(q[1])
@@ -437,7 +437,7 @@ final class XsdReader {
         in.skip();
     }
 
-    private void sequence(XmlSupport.In in, DeclaredType t) {
+    private void sequence(XmlInput.In in, DeclaredType t) {
         for (int i = 0; i < in.r.getAttributeCount(); i++) {
             String n = in.r.getAttributeLocalName(i);
             String v = in.r.getAttributeValue(i).strip();
@@ -456,7 +456,7 @@ final class XsdReader {
         }
     }
 
-    private static int occurs(XmlSupport.In in, String what, String v) {
+    private static int occurs(XmlInput.In in, String what, String v) {
         String s = v.strip();
         if (what.equals("maxOccurs") && s.equals("unbounded")) {
             return Integer.MAX_VALUE;
@@ -469,10 +469,10 @@ final class XsdReader {
         } catch (NumberFormatException e) {
             // reported below
         }
-        throw in.fail(what + " '" + XmlSupport.clip(v) + "' of " + in.qname() + " is not a count");
+        throw in.fail(what + " '" + XmlNames.clip(v) + "' of " + in.qname() + " is not a count");
     }
 
-    private DeclaredElement localElement(XmlSupport.In in, DeclaredType t) {
+    private DeclaredElement localElement(XmlInput.In in, DeclaredType t) {
         DeclaredElement e = new DeclaredElement();
         e.line = in.line();
         e.column = in.column();
@@ -530,7 +530,7 @@ final class XsdReader {
         return e;
     }
 
-    private static void resolveType(XmlSupport.In in, DeclaredElement e, String type) {
+    private static void resolveType(XmlInput.In in, DeclaredElement e, String type) {
         String[] q = qname(in, "type", type);
         if (XS.equals(q[0])) {
             switch (q[1]) {
@@ -562,7 +562,7 @@ final class XsdReader {
     }
 
     /** An anonymous simple or complex type: a restriction of a string or binary type by xs:maxLength. */
-    private static void anonymousType(XmlSupport.In in, DeclaredElement e) {
+    private static void anonymousType(XmlInput.In in, DeclaredElement e) {
         boolean complex = in.is(XS, "complexType");
         if (in.r.getAttributeCount() > 0) {
             throw unsupportedAttr(in, 0);
@@ -603,7 +603,7 @@ final class XsdReader {
         }
     }
 
-    private static void restriction(XmlSupport.In in, DeclaredElement e, boolean complex) {
+    private static void restriction(XmlInput.In in, DeclaredElement e, boolean complex) {
         String base = in.attr("base");
         if (base == null || in.r.getAttributeCount() != 1) {
             throw in.fail("xs:restriction in element '" + e.name + "' needs exactly a base");
@@ -638,7 +638,7 @@ final class XsdReader {
         }
     }
 
-    private static void annotation(XmlSupport.In in, DeclaredType t, DeclaredElement e) {
+    private static void annotation(XmlInput.In in, DeclaredType t, DeclaredElement e) {
         while (in.nextTag("xs:annotation") == XMLStreamConstants.START_ELEMENT) {
             if (in.is(XS, "documentation")) {
                 in.skip();
@@ -659,13 +659,13 @@ final class XsdReader {
     }
 
     /** A text property: {@code name} as it stands, or {@code nameEsc} unescaped; null when neither is. */
-    private static String text(XmlSupport.In in, int i, String local) {
+    private static String text(XmlInput.In in, int i, String local) {
         String v = in.r.getAttributeValue(i);
         if (!local.endsWith("Esc")) {
             return v;
         }
         try {
-            return XmlSupport.unescape(v);
+            return XmlNames.unescape(v);
         } catch (IllegalArgumentException x) {
             throw in.fail("attribute '" + local + "' of " + in.qname() + ": " + x.getMessage(), x);
         }
@@ -675,7 +675,7 @@ final class XsdReader {
         return local.endsWith("Esc") ? local.substring(0, local.length() - 3) : local;
     }
 
-    private static <E extends Enum<E>> E enumValue(XmlSupport.In in, Class<E> type, String what, String v) {
+    private static <E extends Enum<E>> E enumValue(XmlInput.In in, Class<E> type, String what, String v) {
         try {
             return Enum.valueOf(type, v.strip());
         } catch (IllegalArgumentException x) {
@@ -683,12 +683,12 @@ final class XsdReader {
             for (E k : type.getEnumConstants()) {
                 known.append(known.length() == 0 ? "" : ", ").append(k.name());
             }
-            throw in.fail(what + " '" + XmlSupport.clip(v) + "' of " + in.qname() + " is not one of " + known, x);
+            throw in.fail(what + " '" + XmlNames.clip(v) + "' of " + in.qname() + " is not one of " + known, x);
         }
     }
 
     /** Names from {@code <c:x name=".."/>} children, in order. */
-    private static void names(XmlSupport.In in, String what, List<String> a, List<String> b, String childA,
+    private static void names(XmlInput.In in, String what, List<String> a, List<String> b, String childA,
             String childB) {
         while (in.nextTag(what) == XMLStreamConstants.START_ELEMENT) {
             List<String> into = in.is(NS, childA) ? a : childB != null && in.is(NS, childB) ? b : null;
@@ -711,7 +711,7 @@ final class XsdReader {
         }
     }
 
-    private static ClassDef classProps(XmlSupport.In in, String cls) {
+    private static ClassDef classProps(XmlInput.In in, String cls) {
         ClassDef c = new ClassDef("props");
         for (int i = 0; i < in.r.getAttributeCount(); i++) {
             String n = in.r.getAttributeLocalName(i);
@@ -739,7 +739,7 @@ final class XsdReader {
         return c;
     }
 
-    private static AttributeDef attrProps(XmlSupport.In in, String attr) {
+    private static AttributeDef attrProps(XmlInput.In in, String attr) {
         AttributeDef a = new AttributeDef("props", AttributeType.String);
         for (int i = 0; i < in.r.getAttributeCount(); i++) {
             String n = in.r.getAttributeLocalName(i);
@@ -754,7 +754,7 @@ final class XsdReader {
                     try {
                         a.length = Integer.parseInt(v.strip());
                     } catch (NumberFormatException x) {
-                        throw in.fail("length '" + XmlSupport.clip(v) + "' of attribute '" + attr + "' is not an"
+                        throw in.fail("length '" + XmlNames.clip(v) + "' of attribute '" + attr + "' is not an"
                                 + " integer", x);
                     }
                     break;

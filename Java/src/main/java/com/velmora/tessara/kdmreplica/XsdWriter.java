@@ -1,7 +1,7 @@
 package com.velmora.tessara.kdmreplica;
 
-import static com.velmora.tessara.kdmreplica.XmlSupport.NS;
-import static com.velmora.tessara.kdmreplica.XmlSupport.XS;
+import static com.velmora.tessara.kdmreplica.XmlNames.NS;
+import static com.velmora.tessara.kdmreplica.XmlNames.XS;
 
 import com.velmora.tessara.kdmreplica.vrattributes.AccessMode;
 import com.velmora.tessara.kdmreplica.vrattributes.Visibility;
@@ -10,7 +10,7 @@ import java.util.concurrent.locks.Lock;
 /**
  * Writes a replica's schema as a W3C XML Schema that validates the replica's own documents.
  *
- * <p>Shape: the target namespace is {@link XmlSupport#NS}. The document element {@code replica}
+ * <p>Shape: the target namespace is {@link XmlNames#NS}. The document element {@code replica}
  * holds an optional embedded {@code xs:schema}, then instance elements named after their class.
  * Each class is a named complex type (a subclass extends its super class's type) with one
  * optional element per own attribute, in layout order; a multi-valued attribute repeats its
@@ -52,26 +52,26 @@ final class XsdWriter {
 
     /** The schema as a standalone document (caller holds a lock of the replica). */
     static String text(Replica r) {
-        XmlSupport.Out out = new XmlSupport.Out(Replica.getFeature("indent"));
+        XmlOutput out = new XmlOutput(Replica.getFeature("indent"));
         out.startDocument();
         writeSchema(out, r);
         return out.finish();
     }
 
-    private static void xs(XmlSupport.Out out, String local) {
+    private static void xs(XmlOutput out, String local) {
         out.start("xs", local, XS);
     }
 
-    private static void xsEmpty(XmlSupport.Out out, String local) {
+    private static void xsEmpty(XmlOutput out, String local) {
         out.empty("xs", local, XS);
     }
 
     /** Writes the {@code xs:schema} element (caller holds a lock of the replica). */
-    static void writeSchema(XmlSupport.Out out, Replica r) {
+    static void writeSchema(XmlOutput out, Replica r) {
         for (Model m : r.models.items) {
-            XmlSupport.checkXmlName("class", m.classDef.name);
+            XmlNames.checkXmlName("class", m.classDef.name);
             for (AttributeDef a : m.classDef.attributes.items) {
-                XmlSupport.checkXmlName("class '" + m.classDef.name + "': attribute", a.name);
+                XmlNames.checkXmlName("class '" + m.classDef.name + "': attribute", a.name);
             }
         }
         xs(out, "schema");
@@ -79,7 +79,7 @@ final class XsdWriter {
         out.namespace("c", NS);
         out.attr("targetNamespace", NS);
         out.attr("elementFormDefault", "qualified");
-        out.attr("version", XmlSupport.FORMAT);
+        out.attr("version", XmlNames.FORMAT);
 
         xsEmpty(out, "element");
         out.attr("name", "replica");
@@ -146,13 +146,13 @@ final class XsdWriter {
         out.end();
     }
 
-    private static void attribute(XmlSupport.Out out, String name, String type) {
+    private static void attribute(XmlOutput out, String name, String type) {
         xsEmpty(out, "attribute");
         out.attr("name", name);
         out.attr("type", type);
     }
 
-    private static void simpleContent(XmlSupport.Out out, String name, String base, String attr, String type) {
+    private static void simpleContent(XmlOutput out, String name, String base, String attr, String type) {
         xs(out, "complexType");
         out.attr("name", name);
         xs(out, "simpleContent");
@@ -164,7 +164,7 @@ final class XsdWriter {
         out.end();
     }
 
-    private static void classType(XmlSupport.Out out, ClassDef c) {
+    private static void classType(XmlOutput out, ClassDef c) {
         xs(out, "complexType");
         out.attr("name", c.name);
         xs(out, "annotation");
@@ -222,7 +222,7 @@ final class XsdWriter {
         out.end();
     }
 
-    private static void sequence(XmlSupport.Out out, ClassDef c) {
+    private static void sequence(XmlOutput out, ClassDef c) {
         if (c.attributes.items.isEmpty()) {
             xsEmpty(out, "sequence");
             return;
@@ -246,7 +246,7 @@ final class XsdWriter {
         }
     }
 
-    private static void element(XmlSupport.Out out, AttributeDef a) {
+    private static void element(XmlOutput out, AttributeDef a) {
         xs(out, "element");
         out.attr("name", a.name);
         boolean restricted = a.length > 0 && (a.type == AttributeType.String || a.type == AttributeType.Binary);

@@ -45,14 +45,14 @@ class BinaryHostileTest {
 
     // ------------------------------------------------------------ payload building
 
-    private static BinaryCodec.Out start(int classes) {
-        BinaryCodec.Out o = new BinaryCodec.Out(64);
+    private static ByteOut start(int classes) {
+        ByteOut o = new ByteOut(64);
         head(o, classes, null);
         return o;
     }
 
     /** The replica's name, location and class count; with a class name, that class up to its scope names. */
-    private static void head(BinaryCodec.Out o, int classes, String firstClass) {
+    private static void head(ByteOut o, int classes, String firstClass) {
         o.str("r");
         o.str("");
         o.uvar(classes);
@@ -65,7 +65,7 @@ class BinaryHostileTest {
     }
 
     /** A class whose attributes are named a0, a1, ... with the given codes (type | MULTI). */
-    private static void cls(BinaryCodec.Out o, String name, String sup, int... attrs) {
+    private static void cls(ByteOut o, String name, String sup, int... attrs) {
         o.str(name);
         o.str(sup);
         o.str("");
@@ -87,8 +87,8 @@ class BinaryHostileTest {
     }
 
     /** One class of one attribute, one live instance without identifier whose value the caller writes. */
-    private static byte[] oneValue(int code, Consumer<BinaryCodec.Out> value) {
-        BinaryCodec.Out o = start(1);
+    private static byte[] oneValue(int code, Consumer<ByteOut> value) {
+        ByteOut o = start(1);
         cls(o, "A", "", code);
         o.uvar(1);
         o.u8(0);
@@ -204,15 +204,15 @@ class BinaryHostileTest {
     }
 
     /** Builds a payload and seals it, plain. */
-    private static byte[] sealed(Consumer<BinaryCodec.Out> build) {
-        BinaryCodec.Out o = new BinaryCodec.Out(64);
+    private static byte[] sealed(Consumer<ByteOut> build) {
+        ByteOut o = new ByteOut(64);
         build.accept(o);
         return seal(o, false);
     }
 
     /** A payload of that many classes, the rest written by the caller, sealed plain. */
-    private static byte[] sealed(int classes, Consumer<BinaryCodec.Out> build) {
-        BinaryCodec.Out o = start(classes);
+    private static byte[] sealed(int classes, Consumer<ByteOut> build) {
+        ByteOut o = start(classes);
         build.accept(o);
         return seal(o, false);
     }
@@ -384,7 +384,7 @@ class BinaryHostileTest {
         long[] used = new long[2];
         for (int round = 0; round < 3; round++) { // the first rounds warm up
             for (int count : new int[] {0, 1000}) {
-                BinaryCodec.Out o = start(1);
+                ByteOut o = start(1);
                 cls(o, "Wide", "", new int[2000]);
                 o.uvar(count);
                 for (int i = 0; i < 1100; i++) {

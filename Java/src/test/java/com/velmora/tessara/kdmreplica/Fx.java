@@ -536,7 +536,7 @@ final class Fx {
 
     /** The payload of a buffer written by the codec (inflated when compressed). */
     static byte[] payloadOf(byte[] bytes, boolean compressed) {
-        BinaryCodec.In in = BinaryCodec.unframe(bytes, compressed);
+        ByteIn in = BinaryCodec.unframe(bytes, compressed);
         return Arrays.copyOfRange(in.b, in.base, in.end);
     }
 
@@ -545,7 +545,7 @@ final class Fx {
         return BinaryCodec.frame(payload, payload.length, compressed);
     }
 
-    static byte[] seal(BinaryCodec.Out o, boolean compressed) {
+    static byte[] seal(ByteOut o, boolean compressed) {
         return BinaryCodec.frame(o.b, o.n, compressed);
     }
 

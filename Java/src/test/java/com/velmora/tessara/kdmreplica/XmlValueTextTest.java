@@ -58,17 +58,17 @@ class XmlValueTextTest {
         Object[] got = new Object[2];
         switch (kind) {
             case "int":
-                byString = () -> got[0] = XmlSupport.parseInt(text);
-                byChars = () -> got[1] = XmlSupport.parseInt(chars(text), text.length());
+                byString = () -> got[0] = ValueTexts.parseInt(text);
+                byChars = () -> got[1] = ValueTexts.parseInt(chars(text), text.length());
                 break;
             case "double":
-                byString = () -> got[0] = Double.doubleToRawLongBits(XmlSupport.parseDouble(text, null));
-                byChars = () -> got[1] = Double.doubleToRawLongBits(XmlSupport.parseDouble(chars(text), text.length(),
+                byString = () -> got[0] = Double.doubleToRawLongBits(ValueTexts.parseDouble(text, null));
+                byChars = () -> got[1] = Double.doubleToRawLongBits(ValueTexts.parseDouble(chars(text), text.length(),
                         null));
                 break;
             default:
-                byString = () -> got[0] = XmlSupport.parseBoolean(text);
-                byChars = () -> got[1] = XmlSupport.parseBoolean(chars(text), text.length());
+                byString = () -> got[0] = ValueTexts.parseBoolean(text);
+                byChars = () -> got[1] = ValueTexts.parseBoolean(chars(text), text.length());
         }
         String refused = refusal(byString);
         assertEquals(refused, refusal(byChars), "the character path answers otherwise");
@@ -102,9 +102,9 @@ class XmlValueTextTest {
     /** Reads a text both ways and checks the bits against the JDK's reading of the same text. */
     private static void readLikeTheJdk(String text) {
         long expected = Double.doubleToRawLongBits(Double.parseDouble(text));
-        assertEquals(expected, Double.doubleToRawLongBits(XmlSupport.parseDouble(chars(text), text.length(), null)),
+        assertEquals(expected, Double.doubleToRawLongBits(ValueTexts.parseDouble(chars(text), text.length(), null)),
                 text);
-        assertEquals(expected, Double.doubleToRawLongBits(XmlSupport.parseDouble(text, null)), text);
+        assertEquals(expected, Double.doubleToRawLongBits(ValueTexts.parseDouble(text, null)), text);
     }
 
     @ParameterizedTest
@@ -131,10 +131,10 @@ class XmlValueTextTest {
         for (int i = 0; i < 200_000; i++) {
             double d = Double.longBitsToDouble(rnd.nextLong());
             if (d == d && !Double.isInfinite(d)) {
-                readLikeTheJdk(XmlSupport.formatDouble(d));
+                readLikeTheJdk(ValueTexts.formatDouble(d));
             }
             // and the common magnitudes, as the benchmark's prices and weights
-            readLikeTheJdk(XmlSupport.formatDouble(rnd.nextDouble() * Math.pow(10, rnd.nextInt(40) - 20)));
+            readLikeTheJdk(ValueTexts.formatDouble(rnd.nextDouble() * Math.pow(10, rnd.nextInt(40) - 20)));
         }
     }
 
@@ -172,9 +172,9 @@ class XmlValueTextTest {
     @ValueSource(strings = {"2024-03-01T12:00:00.250Z", "0001-01-01T00:00:00.000Z", "9999-12-31T23:59:59.999Z",
         "2024-02-29T23:59:59.000Z", "1970-01-01T00:00:00.001Z", "1969-12-31T23:59:59.999Z"})
     void datesAsWrittenAreRead(String text) {
-        assertEquals(Instant.parse(text).toEpochMilli(), XmlSupport.parseDate(text));
-        assertEquals(Instant.parse(text).toEpochMilli(), XmlSupport.parseDate(chars(text), text.length()));
-        assertEquals(text, XmlSupport.formatDate(XmlSupport.parseDate(text)));
+        assertEquals(Instant.parse(text).toEpochMilli(), ValueTexts.parseDate(text));
+        assertEquals(Instant.parse(text).toEpochMilli(), ValueTexts.parseDate(chars(text), text.length()));
+        assertEquals(text, ValueTexts.formatDate(ValueTexts.parseDate(text)));
     }
 
     @Test
@@ -196,9 +196,9 @@ class XmlValueTextTest {
     }
 
     private static void checkDate(long millis) {
-        String text = XmlSupport.formatDate(millis);
-        assertEquals(millis, XmlSupport.parseDate(chars(text), text.length()), text);
-        assertEquals(millis, XmlSupport.parseDate(text), text);
+        String text = ValueTexts.formatDate(millis);
+        assertEquals(millis, ValueTexts.parseDate(chars(text), text.length()), text);
+        assertEquals(millis, ValueTexts.parseDate(text), text);
     }
 
     @ParameterizedTest
@@ -210,9 +210,9 @@ class XmlValueTextTest {
         "2023-12-32T00:00:00.000Z", "2023-01-00T00:00:00.000Z", "2023-01-01T00:00:00.00aZ", "2023-01-01T00:00:00.000z",
         "2023-01-01t00:00:00.000Z"})
     void impossibleDatesOfTheWrittenShapeAreRefusedByBothPaths(String text) {
-        IllegalArgumentException e = assertThrows(IllegalArgumentException.class, () -> XmlSupport.parseDate(text));
+        IllegalArgumentException e = assertThrows(IllegalArgumentException.class, () -> ValueTexts.parseDate(text));
         assertTrue(e.getMessage().contains("'" + text + "'"), e.getMessage());
-        refusedAlike(() -> XmlSupport.parseDate(text), () -> XmlSupport.parseDate(chars(text), text.length()));
+        refusedAlike(() -> ValueTexts.parseDate(text), () -> ValueTexts.parseDate(chars(text), text.length()));
     }
 
     @ParameterizedTest
@@ -220,7 +220,7 @@ class XmlValueTextTest {
         "2024-01-01T00:00:00.000+01:00|2023-12-31T23:00:00Z", "2024-01-01T00:00:00Z|2024-01-01T00:00:00Z",
         "12024-01-01T00:00:00.000Z|+12024-01-01T00:00:00Z", "' 2024-01-01T00:00:00.000Z'|2024-01-01T00:00:00Z"})
     void otherDateFormsTakeTheGeneralPath(String text, String instant) {
-        assertEquals(Instant.parse(instant).toEpochMilli(), XmlSupport.parseDate(text));
-        assertEquals(Instant.parse(instant).toEpochMilli(), XmlSupport.parseDate(chars(text), text.length()));
+        assertEquals(Instant.parse(instant).toEpochMilli(), ValueTexts.parseDate(text));
+        assertEquals(Instant.parse(instant).toEpochMilli(), ValueTexts.parseDate(chars(text), text.length()));
     }
 }
