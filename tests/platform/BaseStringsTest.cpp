@@ -9,7 +9,10 @@
 namespace
 {
 
-std::string Bytes(const VLXUnicodeString& s) { return std::string(s.c_str(), static_cast<size_t>(s.GetLengthInByte())); }
+std::string Bytes(const VLXUnicodeString& s)
+{
+  return std::string(s.c_str(), static_cast<size_t>(s.GetLengthInByte()));
+}
 
 TEST(UnicodeString, NullInputsEmbeddedNulAndIndependentCopies)
 {

@@ -28,16 +28,15 @@ std::string TakeText(std::string* id = nullptr)
 TEST(StartFailure, EveryCallFailsWithTheReasonAndTheEnvironmentNull)
 {
   JNIEnv* env = reinterpret_cast<JNIEnv*>(0x1);
-  const long first = VLXJBXJNIUtilities::GetJNIEnv(env, VLXListValVLXUnicodeString());
-  EXPECT_LT(first, 0);
+  EXPECT_LT(VLXJBXJNIUtilities::GetJNIEnv(env, VLXListValVLXUnicodeString()), 0);
   EXPECT_EQ(env, nullptr);
   EXPECT_EQ(VLXJBXJNIUtilities::GetJavaVM(), nullptr);
   std::string id;
   const std::string why = TakeText(&id);
   EXPECT_EQ(id, VLXJBXMessages::JvmCreationFailed);
-  EXPECT_NE(why.find("the Java virtual machine could not be created"), std::string::npos) << why;
-  EXPECT_NE(why.find("-XX:+ThisOptionDoesNotExist"), std::string::npos) << why;
-  EXPECT_NE(why.find("JNI_CreateJavaVM returned"), std::string::npos) << why;
+  for (const char* part : {"the Java virtual machine could not be created", "-XX:+ThisOptionDoesNotExist",
+                           "JNI_CreateJavaVM returned"})
+    EXPECT_NE(why.find(part), std::string::npos) << why;
 
   // A later call, even with other options, does not try again.
   VLXListValVLXUnicodeString options;
@@ -48,7 +47,7 @@ TEST(StartFailure, EveryCallFailsWithTheReasonAndTheEnvironmentNull)
   EXPECT_EQ(TakeText(), why);
 }
 
-TEST(StartFailure, ObjectsWithoutAHandleNeedNoJvm)
+TEST(StartFailure, ObjectsWithoutAHandleAndErrorTranslationNeedNoJvm)
 {
   const long base = VLXJBXJNIUtilities::GetGlobalRefCount();
   VLXJBXJavaObject a;
@@ -58,10 +57,7 @@ TEST(StartFailure, ObjectsWithoutAHandleNeedNoJvm)
   EXPECT_EQ(a.SetGlobalRef(nullptr, nullptr), 0);
   EXPECT_EQ(VLXJBXJNIUtilities::GetGlobalRefCount(), base);
   EXPECT_EQ(TakeText(), "");
-}
 
-TEST(StartFailure, ErrorTranslationWorksWithoutAnEnvironment)
-{
   EXPECT_EQ(VLXJBXJNIUtilities::HandleJavaError(nullptr, 0, "op", nullptr, 0), 0);
   EXPECT_LT(VLXJBXJNIUtilities::HandleJavaError(nullptr, -1, "VLXKDMReplica::Commit()", nullptr, 0), 0);
   EXPECT_EQ(TakeText(), "VLXKDMReplica::Commit() failed: it returned the failure code -1 and recorded no cause");
