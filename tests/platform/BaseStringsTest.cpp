@@ -36,12 +36,7 @@ TEST(UnicodeString, NullInputsEmbeddedNulAndIndependentCopies)
 
 TEST(UnicodeString, FirstMalformedOffsetNamesTheFirstIllFormedSequenceAndWhy)
 {
-  const struct
-  {
-    std::string bytes;
-    int offset; // -1: well-formed
-    const char* reason;
-  } cases[] = {
+  const struct { std::string bytes; int offset /* -1: well-formed */; const char* reason; } cases[] = {
       {"", -1, ""}, {std::string("a\0b", 3), -1, ""}, {"\xC2\x80\xDF\xBF", -1, ""},
       {"\xE0\xA0\x80\xE2\x82\xAC\xEF\xBF\xBF", -1, ""}, {"\xED\x9F\xBF\xEE\x80\x80", -1, ""},
       {"\xF0\x90\x80\x80\xF0\x9F\x98\x80", -1, ""}, {"\xF4\x8F\xBF\xBF", -1, ""},

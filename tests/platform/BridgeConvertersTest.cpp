@@ -17,6 +17,14 @@ using ConverterTest = BridgeTest;
 
 VLXUnicodeString U(const std::string& s) { return VLXUnicodeString(s.data(), static_cast<int>(s.size())); }
 
+template <class List, class V>
+List One(V v)
+{
+  List list;
+  list.Append(v);
+  return list;
+}
+
 const int kLarge = 100000;
 const std::u16string kPiece(8191, u'a'); // one unit short of the converter's 8192-unit piece
 
@@ -30,11 +38,7 @@ TEST_F(ConverterTest, StringsCrossExactlyInBothDirections)
     longUtf8 += i % 3 == 0 ? "\xF0\x9F\x98\x80" : (i % 3 == 1 ? "\xC3\xA9" : "z");
     longUtf16 += i % 3 == 0 ? u"\U0001F600" : (i % 3 == 1 ? u"\u00E9" : u"z");
   }
-  const struct
-  {
-    std::string utf8;
-    std::u16string utf16;
-  } cases[] = {
+  const struct { std::string utf8; std::u16string utf16; } cases[] = {
       {"", u""},
       {"plain", u"plain"},
       {"caf\xC3\xA9 \xE2\x82\xAC", u"caf\u00E9 \u20AC"},
@@ -64,11 +68,7 @@ TEST_F(ConverterTest, StringsCrossExactlyInBothDirections)
 TEST_F(ConverterTest, UnpairedSurrogatesFromJavaAreRefusedNamingTheirIndex)
 {
   const std::u16string high(1, char16_t(0xD83D)), low(1, char16_t(0xDE00));
-  const struct
-  {
-    std::u16string text;
-    const char* where;
-  } cases[] = {
+  const struct { std::u16string text; const char* where; } cases[] = {
       {high, "(U+D83D) at index 0"},
       {low + u"x", "(U+DE00) at index 0"},
       {low + high, "(U+DE00) at index 0"},
@@ -90,12 +90,7 @@ TEST_F(ConverterTest, UnpairedSurrogatesFromJavaAreRefusedNamingTheirIndex)
 
 TEST_F(ConverterTest, MalformedUtf8IsRefusedWithItsByteOffsetAndTheOutputUntouched)
 {
-  const struct
-  {
-    std::string bytes;
-    int offset;
-    const char* reason;
-  } cases[] = {
+  const struct { std::string bytes; int offset; const char* reason; } cases[] = {
       {"ab\xC0\x80", 2, "overlong"},    {"x\xE0\x80\xAF", 1, "overlong"},  {"\xED\xA0\x80", 0, "surrogate"},
       {"okay\xF4\x90\x80\x80", 4, "above U+10FFFF"}, {"abc\xE2\x82", 3, "truncated"},
       {"a\x80z", 1, "continuation"},    {"\xFF", 0, "never occurs"},
@@ -115,40 +110,27 @@ TEST_F(ConverterTest, MalformedUtf8IsRefusedWithItsByteOffsetAndTheOutputUntouch
 
 TEST_F(ConverterTest, NullJavaValuesGiveEmptyValuesWrongClassesAndPendingExceptionsAreRefused)
 {
-  VLXUnicodeString text("was here");
-  VLXListValVLXUnicodeString strings;
-  VLXListValVLXBoolean booleans;
-  VLXBinary bytes(3);
-  VLXRawCollint ints;
-  VLXRawColldouble doubles;
-  strings.Append("x");
-  booleans.Append(1);
-  ints.Append(1);
-  doubles.Append(1.5);
-  EXPECT_EQ(Conv::BuildFromJavaType(env, nullptr, text), VLX_S_OK);
-  EXPECT_EQ(Conv::BuildFromJavaType(env, nullptr, strings), VLX_S_OK);
-  EXPECT_EQ(Conv::BuildFromJavaType(env, nullptr, booleans), VLX_S_OK);
-  EXPECT_EQ(Conv::BuildFromJavaType(env, nullptr, bytes), VLX_S_OK);
-  EXPECT_EQ(Conv::BuildFromJavaType(env, nullptr, ints), VLX_S_OK);
-  EXPECT_EQ(Conv::BuildFromJavaType(env, nullptr, doubles), VLX_S_OK);
-  EXPECT_EQ(text.GetLengthInByte() + strings.Size() + booleans.Size() + bytes.getLength() + ints.Size() +
-                doubles.Size(),
-            0);
+  // Each output, starting non-empty: an array of another type is refused and leaves it alone; a
+  // null Java value empties it.
+  jintArray intArray = env->NewIntArray(2);
+  jbooleanArray booleanArray = env->NewBooleanArray(2);
+  auto check = [&](auto out, jobject wrong) {
+    const auto before = out;
+    EXPECT_EQ(Conv::BuildFromJavaType(env, wrong, out), VLX_E_INVALIDARG);
+    EXPECT_TRUE(out == before);
+    EXPECT_EQ(TakeLastError().id, VLXJBXMessages::InvalidArgument);
+    EXPECT_EQ(Conv::BuildFromJavaType(env, nullptr, out), VLX_S_OK);
+    EXPECT_TRUE(out == decltype(out)());
+    EXPECT_FALSE(out == before);
+  };
+  check(VLXUnicodeString("kept"), intArray);
+  check(One<VLXListValVLXUnicodeString>("kept"), intArray);
+  check(One<VLXListValVLXBoolean>(1), intArray);
+  check(VLXBinary(3), intArray);
+  check(One<VLXRawCollint>(1), booleanArray);
+  check(One<VLXRawColldouble>(1.5), intArray);
 
-  // An int[] is neither a String, a String[], a boolean[] nor a double[]: refused, outputs kept.
-  jintArray notIt = env->NewIntArray(2);
-  text = "kept";
-  strings.Append("kept");
-  booleans.Append(1);
-  doubles.Append(2.5);
-  EXPECT_EQ(Conv::BuildFromJavaType(env, notIt, text), VLX_E_INVALIDARG);
-  EXPECT_EQ(Conv::BuildFromJavaType(env, notIt, strings), VLX_E_INVALIDARG);
-  EXPECT_EQ(Conv::BuildFromJavaType(env, notIt, booleans), VLX_E_INVALIDARG);
-  EXPECT_EQ(Conv::BuildFromJavaType(env, notIt, doubles), VLX_E_INVALIDARG);
-  EXPECT_EQ(Str(text), "kept");
-  EXPECT_EQ(strings.Size() + booleans.Size() + doubles.Size(), 3);
-  EXPECT_EQ(TakeLastError().id, VLXJBXMessages::InvalidArgument);
-
+  VLXUnicodeString text("kept");
   env->ThrowNew(Find("java/lang/IllegalStateException"), "pending");
   jstring js = nullptr;
   EXPECT_EQ(Conv::ConvertToJavaType(env, VLXUnicodeString("x"), js), VLX_E_FAIL);

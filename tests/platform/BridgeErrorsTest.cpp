@@ -38,11 +38,7 @@ TEST_F(LookupTest, MemberLookupsNameTheMemberTheSignatureAndTheClass)
 {
   jclass string = Find("java/lang/String");
   enum Kind { Method, StaticMethod, StaticField };
-  const struct
-  {
-    Kind kind;
-    const char *name, *signature, *failure; // failure null: found
-  } cases[] = {
+  const struct { Kind kind; const char *name, *signature, *failure /* null: found */; } cases[] = {
       {Method, "noSuchMethod", "()V", "method 'noSuchMethod' with signature '()V' of class 'java.lang.String'"},
       {Method, "valueOf", "(I)Ljava/lang/String;", "NoSuchMethodError"}, // exists, but static
       {StaticMethod, "valueOf", "(I)Ljava/lang/String;", nullptr},
@@ -107,12 +103,8 @@ TEST_F(JavaErrorTest, PendingExceptionsAreClearedAndRecordedWithClassMessageAndC
   jthrowable inner = NewThrowable(env, "java/lang/IllegalStateException", env->NewStringUTF("inner reason"), nullptr);
   // A message outside the BMP, with an embedded NUL, crosses exactly (not as modified UTF-8).
   jstring unicode = JavaString(env, u"bad \U0001F600 value" + std::u16string(1, u'\0') + u"end");
-  const struct
-  {
-    jthrowable thrown; // null: a real call throws
-    int flag;          // 1: printed to standard error first
-    std::vector<std::string> parameters;
-  } cases[] = {
+  // thrown null: a real call throws; flag 1: printed to standard error first.
+  const struct { jthrowable thrown; int flag; std::vector<std::string> parameters; } cases[] = {
       {NewThrowable(env, "java/lang/RuntimeException", env->NewStringUTF("outer text"), inner), 0,
        {"ctx", "java.lang.RuntimeException", "outer text", "; caused by java.lang.IllegalStateException: inner reason"}},
       {nullptr, 1, {"ctx", "java.lang.NumberFormatException", "For input string: \"x1\"", ""}},
