@@ -202,12 +202,22 @@ TEST_F(ConverterTest, LargeStringListsReleaseEachElementReferenceAtOnce)
 
 // ---- primitive arrays, 100,000 elements ----
 
+// `in` to a Java array (kept in `java`) and back into `back`.
+template <class In, class Array, class Out>
+Out RoundTrip(JNIEnv* env, const In& in, Array& java, Out back)
+{
+  EXPECT_EQ(Conv::ConvertToJavaType(env, in, java), VLX_S_OK);
+  EXPECT_EQ(env->GetArrayLength(java), kLarge);
+  EXPECT_EQ(Conv::BuildFromJavaType(env, java, back), VLX_S_OK);
+  return back;
+}
+
 TEST_F(ConverterTest, PrimitiveArraysCrossInBulkAndBooleansAreNormalised)
 {
-  VLXRawCollint ints(kLarge), intsBack;
-  VLXRawColldouble doubles(kLarge), doublesBack;
-  VLXListValVLXBoolean booleans, booleansBack;
-  VLXBinary bytes(kLarge), bytesBack;
+  VLXRawCollint ints(kLarge);
+  VLXRawColldouble doubles(kLarge);
+  VLXListValVLXBoolean booleans;
+  VLXBinary bytes(kLarge);
   for (int i = 0; i < kLarge; ++i) {
     ints.Append(i * 7919 - 3);
     doubles.Append(i * 0.25 - 7.0);
@@ -219,36 +229,26 @@ TEST_F(ConverterTest, PrimitiveArraysCrossInBulkAndBooleansAreNormalised)
   doubles[1] = -0.0;
   doubles[2] = std::numeric_limits<double>::infinity();
   doubles[3] = std::numeric_limits<double>::denorm_min();
-  doublesBack.Append(99);
-
   jintArray ja = nullptr;
   jdoubleArray jd = nullptr;
   jbooleanArray jz = nullptr;
   jbyteArray jb = nullptr;
-  ASSERT_EQ(Conv::ConvertToJavaType(env, ints, ja), VLX_S_OK);
-  ASSERT_EQ(Conv::ConvertToJavaType(env, doubles, jd), VLX_S_OK);
-  ASSERT_EQ(Conv::ConvertToJavaType(env, booleans, jz), VLX_S_OK);
-  ASSERT_EQ(Conv::ConvertToJavaType(env, bytes, jb), VLX_S_OK);
-  jint lastInts[2];
-  env->GetIntArrayRegion(ja, kLarge - 2, 2, lastInts);
-  EXPECT_EQ(lastInts[0], (kLarge - 2) * 7919 - 3);
-  EXPECT_EQ(lastInts[1], INT_MAX);
-  jboolean z[4];
-  env->GetBooleanArrayRegion(jz, 0, 4, z);
-  EXPECT_EQ(std::vector<int>(z, z + 4), (std::vector<int>{0, 1, 1, 1})) << "any non-zero byte is true";
-
-  ASSERT_EQ(Conv::BuildFromJavaType(env, ja, intsBack), VLX_S_OK);
-  ASSERT_EQ(Conv::BuildFromJavaType(env, jd, doublesBack), VLX_S_OK);
-  ASSERT_EQ(Conv::BuildFromJavaType(env, jz, booleansBack), VLX_S_OK);
-  ASSERT_EQ(Conv::BuildFromJavaType(env, jb, bytesBack), VLX_S_OK);
-  EXPECT_TRUE(intsBack == ints);
+  EXPECT_TRUE(RoundTrip(env, ints, ja, VLXRawCollint()) == ints);
+  EXPECT_TRUE(RoundTrip(env, bytes, jb, VLXBinary()) == bytes);
+  const VLXRawColldouble doublesBack = RoundTrip(env, doubles, jd, One<VLXRawColldouble>(99.0));
   ASSERT_EQ(doublesBack.Size(), kLarge);
   EXPECT_TRUE(std::signbit(doublesBack[1]));
   EXPECT_EQ(std::memcmp(doublesBack.Data(), doubles.Data(), sizeof(double) * kLarge), 0);
+  const VLXListValVLXBoolean booleansBack = RoundTrip(env, booleans, jz, VLXListValVLXBoolean());
   ASSERT_EQ(booleansBack.Size(), kLarge);
   for (int i = 1; i <= kLarge; ++i)
     ASSERT_EQ(booleansBack[i], booleans[i] != 0 ? 1 : 0) << i;
-  EXPECT_TRUE(bytesBack == bytes);
+  jint lastInts[2];
+  jboolean z[4];
+  env->GetIntArrayRegion(ja, kLarge - 2, 2, lastInts);
+  env->GetBooleanArrayRegion(jz, 0, 4, z);
+  EXPECT_EQ(std::vector<int>(lastInts, lastInts + 2), (std::vector<int>{(kLarge - 2) * 7919 - 3, INT_MAX}));
+  EXPECT_EQ(std::vector<int>(z, z + 4), (std::vector<int>{0, 1, 1, 1})) << "any non-zero byte is true";
   jbyteArray empty = nullptr;
   ASSERT_EQ(Conv::ConvertToJavaType(env, VLXBinary(), empty), VLX_S_OK);
   EXPECT_EQ(env->GetArrayLength(empty), 0);
