@@ -49,24 +49,17 @@ TEST_F(LookupTest, MemberLookupsNameTheMemberTheSignatureAndTheClass)
   };
   for (const auto& c : cases) {
     SCOPED_TRACE(c.name + std::string(c.signature));
-    static int marker;
-    void* const sentinel = &marker;
-    jmethodID method = static_cast<jmethodID>(sentinel);
-    jfieldID field = static_cast<jfieldID>(sentinel);
+    jmethodID method = nullptr;
+    jfieldID field = nullptr;
     const long rc = c.kind == Method         ? Util::GetMethodID(env, string, c.name, c.signature, method)
                     : c.kind == StaticMethod ? Util::GetStaticMethodID(env, string, c.name, c.signature, method)
                                              : Util::GetStaticFieldID(env, string, c.name, c.signature, field);
     EXPECT_FALSE(env->ExceptionCheck());
     const ErrorView e = TakeLastError();
-    const void* got = c.kind == StaticField ? static_cast<void*>(field) : static_cast<void*>(method);
-    if (c.failure == nullptr) {
-      EXPECT_EQ(rc, VLX_S_OK);
-      EXPECT_NE(got, sentinel);
-      EXPECT_NE(got, nullptr);
-      EXPECT_FALSE(e.present);
-    } else {
-      EXPECT_LT(rc, 0);
-      EXPECT_TRUE(got == sentinel || got == nullptr) << "no usable id on failure";
+    EXPECT_EQ(VLX_SUCCEEDED(rc), c.failure == nullptr);
+    EXPECT_EQ(method != nullptr || field != nullptr, c.failure == nullptr) << "an id exactly when found";
+    EXPECT_EQ(e.present, c.failure != nullptr);
+    if (c.failure != nullptr) {
       EXPECT_EQ(e.id, VLXJBXMessages::LookupFailed);
       EXPECT_TRUE(Contains(e.text, c.failure)) << e.text;
     }
