@@ -99,7 +99,8 @@ TEST_F(JavaErrorTest, PendingExceptionsAreClearedAndRecordedWithClassMessageAndC
   // thrown null: a real call throws; flag 1: printed to standard error first.
   const struct { jthrowable thrown; int flag; std::vector<std::string> parameters; } cases[] = {
       {NewThrowable(env, "java/lang/RuntimeException", env->NewStringUTF("outer text"), inner), 0,
-       {"ctx", "java.lang.RuntimeException", "outer text", "; caused by java.lang.IllegalStateException: inner reason"}},
+       {"ctx", "java.lang.RuntimeException", "outer text",
+        "; caused by java.lang.IllegalStateException: inner reason"}},
       {nullptr, 1, {"ctx", "java.lang.NumberFormatException", "For input string: \"x1\"", ""}},
       {NewThrowable(env, "java/lang/UnsupportedOperationException", nullptr, nullptr), 0,
        {"ctx", "java.lang.UnsupportedOperationException", "(no message)", ""}},

@@ -42,7 +42,8 @@ TEST(StartFailure, ObjectsWithoutAHandleAndErrorTranslationNeedNoJvm)
 
   EXPECT_EQ(VLXJBXJNIUtilities::HandleJavaError(nullptr, 0, "op", nullptr, 0), 0);
   EXPECT_LT(VLXJBXJNIUtilities::HandleJavaError(nullptr, -1, "VLXKDMReplica::Commit()", nullptr, 0), 0);
-  EXPECT_EQ(TakeLastError().text, "VLXKDMReplica::Commit() failed: it returned the failure code -1 and recorded no cause");
+  EXPECT_EQ(TakeLastError().text,
+            "VLXKDMReplica::Commit() failed: it returned the failure code -1 and recorded no cause");
 }
 
 } // namespace
