@@ -1,4 +1,4 @@
-// VLXUnicodeString: bytes, embedded NUL, and the UTF-8 well-formedness check.
+// VLXUnicodeString: bytes, embedded NUL, copies, and the UTF-8 well-formedness check.
 #include "VLXUnicodeString.h"
 
 #include <gtest/gtest.h>
@@ -9,99 +9,56 @@
 namespace
 {
 
-TEST(UnicodeString, NullAndEmptyInputsGiveTheEmptyString)
+std::string Bytes(const VLXUnicodeString& s)
 {
-  EXPECT_EQ(VLXUnicodeString(static_cast<const char*>(nullptr)).GetLengthInByte(), 0);
-  EXPECT_EQ(VLXUnicodeString(nullptr, 5).GetLengthInByte(), 0);
-  EXPECT_EQ(VLXUnicodeString("abc", 0).GetLengthInByte(), 0);
-  EXPECT_EQ(VLXUnicodeString("abc", -1).GetLengthInByte(), 0);
-  VLXUnicodeString s("text");
-  s = static_cast<const char*>(nullptr);
-  EXPECT_EQ(s.GetLengthInByte(), 0);
-  EXPECT_STREQ(s.c_str(), "");
+  return std::string(s.c_str(), static_cast<size_t>(s.GetLengthInByte()));
 }
 
-TEST(UnicodeString, EmbeddedNulIsKeptCountedAndCompared)
+TEST(UnicodeString, NullInputsEmbeddedNulAndIndependentCopies)
 {
+  for (const VLXUnicodeString& s : {VLXUnicodeString(static_cast<const char*>(nullptr)), VLXUnicodeString(nullptr, 5),
+                                    VLXUnicodeString("abc", 0), VLXUnicodeString("abc", -1)})
+    EXPECT_EQ(s.GetLengthInByte(), 0);
   const VLXUnicodeString a("a\0b", 3);
-  EXPECT_EQ(a.GetLengthInByte(), 3);
   EXPECT_EQ(std::memcmp(a.c_str(), "a\0b\0", 4), 0) << "bytes followed by one NUL";
+  EXPECT_TRUE(a == VLXUnicodeString("a\0b", 3));
   EXPECT_TRUE(a != VLXUnicodeString("a\0c", 3));
   EXPECT_TRUE(a != VLXUnicodeString("a"));
-  EXPECT_TRUE(a == VLXUnicodeString("a\0b", 3));
-  EXPECT_EQ(a.IsWellFormed(), 1);
-}
 
-TEST(UnicodeString, CopiesAreIndependentAndSelfAssignmentFromOwnBytesWorks)
-{
-  VLXUnicodeString original("h\xC3\xA9llo");
-  VLXUnicodeString copy(original);
+  VLXUnicodeString original("h\xC3\xA9llo"), copy(original);
   original = "other";
-  EXPECT_STREQ(copy.c_str(), "h\xC3\xA9llo");
-  EXPECT_EQ(copy.GetLengthInByte(), 6);
-  // Assigning a suffix of its own bytes.
-  copy = copy.c_str() + 1;
-  EXPECT_STREQ(copy.c_str(), "\xC3\xA9llo");
-  VLXUnicodeString moved(std::move(copy));
-  EXPECT_STREQ(moved.c_str(), "\xC3\xA9llo");
+  EXPECT_EQ(Bytes(copy), "h\xC3\xA9llo");
+  copy = copy.c_str() + 1; // a suffix of its own bytes
+  EXPECT_EQ(Bytes(copy), "\xC3\xA9llo");
+  copy = static_cast<const char*>(nullptr);
+  EXPECT_STREQ(copy.c_str(), "");
 }
 
-struct Utf8Case
+TEST(UnicodeString, FirstMalformedOffsetNamesTheFirstIllFormedSequenceAndWhy)
 {
-  const char* name;
-  std::string bytes;
-  int offset;         // -1: well-formed
-  const char* reason; // substring of the reported reason
-};
-
-class Utf8Check : public ::testing::TestWithParam<Utf8Case>
-{
-};
-
-TEST_P(Utf8Check, ReportsTheFirstIllFormedSequenceAndWhy)
-{
-  const Utf8Case& c = GetParam();
-  const VLXUnicodeString s(c.bytes.data(), static_cast<int>(c.bytes.size()));
-  const char* reason = "unset";
-  EXPECT_EQ(s.FirstMalformedOffset(&reason), c.offset);
-  EXPECT_EQ(s.IsWellFormed(), c.offset < 0 ? 1 : 0);
-  if (c.offset < 0) {
-    EXPECT_EQ(reason, nullptr);
-  } else {
-    ASSERT_NE(reason, nullptr);
-    EXPECT_NE(std::string(reason).find(c.reason), std::string::npos) << reason;
+  const struct { std::string bytes; int offset /* -1: well-formed */; const char* reason; } cases[] = {
+      {"", -1, ""}, {std::string("a\0b", 3), -1, ""}, {"\xC2\x80\xDF\xBF", -1, ""},
+      {"\xE0\xA0\x80\xE2\x82\xAC\xEF\xBF\xBF", -1, ""}, {"\xED\x9F\xBF\xEE\x80\x80", -1, ""},
+      {"\xF0\x90\x80\x80\xF0\x9F\x98\x80", -1, ""}, {"\xF4\x8F\xBF\xBF", -1, ""},
+      {"ab\xC0\x80", 2, "overlong"}, {"\xC1\xBF", 0, "overlong"}, {"x\xE0\x9F\xBF", 1, "overlong"},
+      {"\xF0\x8F\xBF\xBF", 0, "overlong"}, {"\xED\xA0\x80", 0, "surrogate"}, {"ok\xED\xBF\xBF", 2, "surrogate"},
+      {"\xF4\x90\x80\x80", 0, "above U+10FFFF"}, {"\xF5\x80\x80\x80", 0, "above U+10FFFF"},
+      {"abc\xE2\x82", 3, "truncated"}, {"\xF0\x9F\x98", 0, "truncated"}, {"\xC3", 0, "truncated"},
+      {"\xE2\x28\xA1", 0, "truncated"}, {std::string("\xC3\0", 2), 0, "truncated"},
+      {"a\x80", 1, "continuation"}, {"\xC3\xA9\xA9", 2, "continuation"}, {"abc\xFF", 3, "never occurs"},
+      {"\xF8\x88\x80\x80\x80", 0, "never occurs"}, {"\xC3\xA9\x80\xFF", 2, "continuation"},
+  };
+  for (const auto& c : cases) {
+    SCOPED_TRACE(::testing::PrintToString(c.bytes));
+    const VLXUnicodeString s(c.bytes.data(), static_cast<int>(c.bytes.size()));
+    const char* reason = "unset";
+    EXPECT_EQ(s.FirstMalformedOffset(&reason), c.offset);
+    EXPECT_EQ(s.IsWellFormed(), c.offset < 0 ? 1 : 0);
+    if (c.offset < 0)
+      EXPECT_EQ(reason, nullptr);
+    else
+      EXPECT_NE(std::string(reason ? reason : "").find(c.reason), std::string::npos) << reason;
   }
 }
-
-std::string B(const char* s, size_t n) { return std::string(s, n); }
-
-INSTANTIATE_TEST_SUITE_P(
-    Table, Utf8Check,
-    ::testing::Values(
-        Utf8Case{"empty", "", -1, ""}, Utf8Case{"ascii", "plain text", -1, ""},
-        Utf8Case{"nul", B("a\0b", 3), -1, ""}, Utf8Case{"twoByte", "\xC2\x80\xDF\xBF", -1, ""},
-        Utf8Case{"threeByte", "\xE0\xA0\x80\xE2\x82\xAC\xEF\xBF\xBF", -1, ""},
-        Utf8Case{"beforeSurrogates", "\xED\x9F\xBF", -1, ""}, Utf8Case{"afterSurrogates", "\xEE\x80\x80", -1, ""},
-        Utf8Case{"fourByte", "\xF0\x90\x80\x80\xF0\x9F\x98\x80", -1, ""},
-        Utf8Case{"lastCodePoint", "\xF4\x8F\xBF\xBF", -1, ""},
-        Utf8Case{"overlongTwoByteC0", "ab\xC0\x80", 2, "overlong"},
-        Utf8Case{"overlongTwoByteC1", "\xC1\xBF", 0, "overlong"},
-        Utf8Case{"overlongThreeByte", "x\xE0\x9F\xBF", 1, "overlong"},
-        Utf8Case{"overlongFourByte", "\xF0\x8F\xBF\xBF", 0, "overlong"},
-        Utf8Case{"highSurrogate", "\xED\xA0\x80", 0, "surrogate"},
-        Utf8Case{"lowSurrogateAfterText", "ok\xED\xBF\xBF", 2, "surrogate"},
-        Utf8Case{"aboveMaxF4", "\xF4\x90\x80\x80", 0, "above U+10FFFF"},
-        Utf8Case{"aboveMaxF5", "\xF5\x80\x80\x80", 0, "above U+10FFFF"},
-        Utf8Case{"truncatedAtEnd", "abc\xE2\x82", 3, "truncated"},
-        Utf8Case{"truncatedFourByte", "\xF0\x9F\x98", 0, "truncated"},
-        Utf8Case{"loneLead", "\xC3", 0, "truncated"},
-        Utf8Case{"cutByAscii", "\xE2\x28\xA1", 0, "truncated"},
-        Utf8Case{"cutByNul", B("\xC3\0", 2), 0, "truncated"},
-        Utf8Case{"strayContinuation", "a\x80", 1, "continuation"},
-        Utf8Case{"extraContinuation", "\xC3\xA9\xA9", 2, "continuation"},
-        Utf8Case{"invalidByteFF", "abc\xFF", 3, "never occurs"},
-        Utf8Case{"fiveByteForm", "\xF8\x88\x80\x80\x80", 0, "never occurs"},
-        Utf8Case{"firstFaultWins", "\xC3\xA9\x80\xFF", 2, "continuation"}),
-    [](const ::testing::TestParamInfo<Utf8Case>& info) { return std::string(info.param.name); });
 
 } // namespace

@@ -12,8 +12,7 @@ public:
     options.Append("-Dcorvexa.platform.test=from-options");
     options.Append(""); // empty entries are skipped
     JNIEnv* env = nullptr;
-    const long rc = VLXJBXJNIUtilities::GetJNIEnv(env, options);
-    ASSERT_EQ(rc, VLX_S_OK) << TakeLastError().text;
+    ASSERT_EQ(VLXJBXJNIUtilities::GetJNIEnv(env, options), VLX_S_OK) << TakeLastError().text;
     ASSERT_NE(env, nullptr);
   }
 };

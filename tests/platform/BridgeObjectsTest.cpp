@@ -8,12 +8,6 @@
 namespace
 {
 
-class Proxy : public VLXJBXJavaObject
-{
-public:
-  using VLXJBXJavaObject::_handle;
-};
-
 class JavaObjectTest : public BridgeTest
 {
 protected:
@@ -22,21 +16,14 @@ protected:
   jobject NewStringBuilder(const char* text)
   {
     jclass cls = Find("java/lang/StringBuilder");
-    jobject sb = VLXJBXJNIHelper::NewObject(env, cls, env->GetMethodID(cls, "<init>", "(Ljava/lang/String;)V"),
-                                            env->NewStringUTF(text));
-    EXPECT_FALSE(env->ExceptionCheck());
-    return sb;
+    return Checked(env, VLXJBXJNIHelper::NewObject(env, cls, env->GetMethodID(cls, "<init>", "(Ljava/lang/String;)V"),
+                                                   env->NewStringUTF(text)));
   }
 
   std::u16string ToString(jobject object)
   {
-    jclass cls = Find("java/lang/Object");
-    jstring s = static_cast<jstring>(VLXJBXJNIHelper::CallObjectMethod(
-        env, object, env->GetMethodID(cls, "toString", "()Ljava/lang/String;")));
-    EXPECT_FALSE(env->ExceptionCheck());
-    std::u16string units = Units(env, s);
-    env->DeleteLocalRef(s);
-    return units;
+    jmethodID toString = env->GetMethodID(Find("java/lang/Object"), "toString", "()Ljava/lang/String;");
+    return Units(env, Checked(env, static_cast<jstring>(VLXJBXJNIHelper::CallObjectMethod(env, object, toString))));
   }
 };
 
@@ -45,89 +32,62 @@ TEST_F(JavaObjectTest, EveryCopyHoldsItsOwnReferenceAndDestructionReleasesIt)
   const long base = Refs();
   jobject local = NewStringBuilder("kept alive");
   {
-    Proxy a;
+    VLXJBXJavaObject a;
     EXPECT_EQ(a.GetGlobalRef(), nullptr);
-    EXPECT_EQ(a.exchangedWithJava, 0);
     ASSERT_EQ(a.SetGlobalRef(env, local), VLX_S_OK);
     EXPECT_EQ(env->GetObjectRefType(a.GetGlobalRef()), JNIGlobalRefType);
     EXPECT_EQ(Refs(), base + 1);
     a.exchangedWithJava = 1;
     env->DeleteLocalRef(local);
     {
-      Proxy b(a);
+      VLXJBXJavaObject b(a), c;
       EXPECT_EQ(Refs(), base + 2);
       EXPECT_NE(b.GetGlobalRef(), a.GetGlobalRef()) << "a reference of its own";
       EXPECT_EQ(b.exchangedWithJava, 1);
-      EXPECT_TRUE(b == a);
-      Proxy c;
       c = b;
       EXPECT_EQ(Refs(), base + 3);
       c = c; // self-assignment keeps the reference
       EXPECT_EQ(Refs(), base + 3);
       EXPECT_TRUE(c == a);
-      c = Proxy(); // assigning an empty object releases
+      c = VLXJBXJavaObject(); // assigning an empty object releases
       EXPECT_EQ(Refs(), base + 2);
       EXPECT_EQ(c.GetGlobalRef(), nullptr);
       a = b; // same Java object: one reference replaced by another
       EXPECT_EQ(Refs(), base + 2);
     }
     EXPECT_EQ(Refs(), base + 1);
-    // The Java object outlived every local reference and the copies.
-    EXPECT_EQ(ToString(a.GetGlobalRef()), u"kept alive");
+    EXPECT_TRUE(ToString(a.GetGlobalRef()) == u"kept alive") << "the Java object outlived its local references";
+    VLXJBXJavaObject* heap = new VLXJBXJavaObject(a);
+    std::thread([heap] { VLXJBXJavaObject copy(*heap); }).join(); // on a thread the bridge attaches
+    EXPECT_EQ(Refs(), base + 2);
+    heap->Release();
+    EXPECT_EQ(Refs(), base + 1);
   }
   EXPECT_EQ(Refs(), base);
 }
 
-TEST_F(JavaObjectTest, SetGlobalRefReplacesOrReleases)
+TEST_F(JavaObjectTest, SetGlobalRefReplacesOrReleasesAndEqualityIsJavaIdentity)
 {
   const long base = Refs();
-  jobject first = NewStringBuilder("first");
-  jobject second = NewStringBuilder("second");
-  Proxy p;
+  jobject first = NewStringBuilder("same text"), second = NewStringBuilder("same text");
+  VLXJBXJavaObject p, q, none1, none2;
   ASSERT_EQ(p.SetGlobalRef(env, first), VLX_S_OK);
+  ASSERT_EQ(q.SetGlobalRef(env, first), VLX_S_OK);
+  EXPECT_TRUE(p == q);
+  EXPECT_FALSE(p != q);
   ASSERT_EQ(p.SetGlobalRef(nullptr, second), VLX_S_OK) << "a null env means the thread's own";
-  EXPECT_EQ(Refs(), base + 1);
-  EXPECT_EQ(ToString(p.GetGlobalRef()), u"second");
-  // Re-attaching to the object it already holds (through its own handle) works.
-  ASSERT_EQ(p.SetGlobalRef(env, p.GetGlobalRef()), VLX_S_OK);
-  EXPECT_EQ(Refs(), base + 1);
-  EXPECT_EQ(ToString(p.GetGlobalRef()), u"second");
+  EXPECT_EQ(Refs(), base + 2);
+  EXPECT_TRUE(p != q) << "equal contents, different objects";
+  EXPECT_TRUE(env->IsSameObject(p.GetGlobalRef(), second));
+  ASSERT_EQ(p.SetGlobalRef(env, p.GetGlobalRef()), VLX_S_OK) << "re-attaching through its own handle";
+  EXPECT_EQ(Refs(), base + 2);
+  EXPECT_TRUE(env->IsSameObject(p.GetGlobalRef(), second));
   EXPECT_EQ(p.SetGlobalRef(env, nullptr), VLX_S_OK);
   EXPECT_EQ(p.GetGlobalRef(), nullptr);
-  EXPECT_EQ(Refs(), base);
+  EXPECT_EQ(Refs(), base + 1);
   EXPECT_EQ(p.SetGlobalRef(env, nullptr), VLX_S_OK) << "releasing nothing is fine";
-}
-
-TEST_F(JavaObjectTest, EqualityIsJavaIdentity)
-{
-  jobject x = NewStringBuilder("same text");
-  jobject y = NewStringBuilder("same text");
-  Proxy a, b, c, none1, none2;
-  a.SetGlobalRef(env, x);
-  b.SetGlobalRef(env, x);
-  c.SetGlobalRef(env, y);
-  EXPECT_TRUE(a == b);
-  EXPECT_FALSE(a != b);
-  EXPECT_TRUE(a != c) << "equal contents, different objects";
-  EXPECT_TRUE(none1 == none2);
-  EXPECT_TRUE(a != none1);
-  EXPECT_TRUE(none1 != a);
-}
-
-TEST_F(JavaObjectTest, HeapObjectsAndOtherThreadsBalanceTheCount)
-{
-  const long base = Refs();
-  Proxy* heap = new Proxy;
-  heap->SetGlobalRef(env, NewStringBuilder("heap"));
-  EXPECT_EQ(Refs(), base + 1);
-  std::thread t([heap] {
-    Proxy copy(*heap); // made and destroyed on a thread the bridge attaches
-    copy.exchangedWithJava = 2;
-  });
-  t.join();
-  EXPECT_EQ(Refs(), base + 1);
-  heap->Release();
-  EXPECT_EQ(Refs(), base);
+  EXPECT_TRUE(none1 == none2 && none1 == p);
+  EXPECT_TRUE(q != none1 && none1 != q);
 }
 
 } // namespace

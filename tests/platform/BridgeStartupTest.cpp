@@ -6,6 +6,7 @@
 #include <unistd.h>
 
 #include <cstdlib>
+#include <filesystem>
 #include <fstream>
 
 namespace
@@ -13,10 +14,22 @@ namespace
 
 using StartupTest = BridgeTest;
 
-TEST_F(StartupTest, TheJvmWasCreatedWithTheOptionsListAndTheClassPath)
+// System.getProperty(name), ASCII only.
+std::string SystemProperty(JNIEnv* env, const char* name)
 {
-  EXPECT_EQ(Ascii(SystemProperty(env, "corvexa.platform.test")), "from-options");
-  const std::string classPath = Ascii(SystemProperty(env, "java.class.path"));
+  jclass system = env->FindClass("java/lang/System");
+  jmethodID get = env->GetStaticMethodID(system, "getProperty", "(Ljava/lang/String;)Ljava/lang/String;");
+  jstring value = Checked(env, static_cast<jstring>(env->CallStaticObjectMethod(system, get, env->NewStringUTF(name))));
+  std::string out;
+  for (char16_t c : value != nullptr ? Units(env, value) : std::u16string())
+    out += c < 0x80 ? static_cast<char>(c) : '?';
+  return out;
+}
+
+TEST_F(StartupTest, TheProcessJvmWasCreatedOnceWithTheOptionsListAndTheClassPath)
+{
+  EXPECT_EQ(SystemProperty(env, "corvexa.platform.test"), "from-options");
+  const std::string classPath = SystemProperty(env, "java.class.path");
   // VLXJBX_CLASSPATH is "/nonexistent/first.jar::/nonexistent/second" for this test: the empty
   // entry is dropped and the entries come first.
   EXPECT_EQ(classPath.rfind("/nonexistent/first.jar:/nonexistent/second", 0), 0u) << classPath;
@@ -25,10 +38,7 @@ TEST_F(StartupTest, TheJvmWasCreatedWithTheOptionsListAndTheClassPath)
   struct stat st;
   const bool jarBuilt = stat((libraryDirectory + "/../share/corvexa/corvexa-replica.jar").c_str(), &st) == 0;
   EXPECT_EQ(classPath.find("corvexa-replica.jar") != std::string::npos, jarBuilt) << classPath;
-}
 
-TEST_F(StartupTest, TheEnvironmentIsCachedAndTheJvmIsTheProcessOne)
-{
   JNIEnv* again = nullptr;
   VLXListValVLXUnicodeString ignored;
   ignored.Append("-XX:+ThisOptionDoesNotExist"); // options matter only when the JVM is created
@@ -42,55 +52,27 @@ TEST_F(StartupTest, TheEnvironmentIsCachedAndTheJvmIsTheProcessOne)
   EXPECT_FALSE(TakeLastError().present);
 }
 
-// ---- configuration, without a JVM ----
-
-class ClassPathLayout : public ::testing::Test
+TEST(StartupConfig, ClassPathPrefersTheSharedJarAndPutsTheVariableFirst)
 {
-protected:
-  std::string root;
-
-  void SetUp() override
-  {
-    char pattern[] = "/tmp/corvexa-classpath-XXXXXX";
-    ASSERT_NE(mkdtemp(pattern), nullptr);
-    root = pattern;
-    mkdir((root + "/lib").c_str(), 0700);
-    mkdir((root + "/share").c_str(), 0700);
-    mkdir((root + "/share/corvexa").c_str(), 0700);
-  }
-  void TearDown() override
-  {
-    unlink((root + "/lib/corvexa-replica.jar").c_str());
-    unlink((root + "/share/corvexa/corvexa-replica.jar").c_str());
-    rmdir((root + "/share/corvexa").c_str());
-    rmdir((root + "/share").c_str());
-    rmdir((root + "/lib").c_str());
-    rmdir(root.c_str());
-  }
-  void Touch(const std::string& path) { std::ofstream(path) << "jar"; }
-};
-
-TEST_F(ClassPathLayout, SharedDirectoryJarIsPreferredAndTheVariableComesFirst)
-{
-  const std::string lib = root + "/lib";
+  char pattern[] = "/tmp/corvexa-classpath-XXXXXX";
+  ASSERT_NE(mkdtemp(pattern), nullptr);
+  const std::string root = pattern, lib = root + "/lib";
+  std::filesystem::create_directories(root + "/share/corvexa");
+  std::filesystem::create_directories(lib);
   EXPECT_EQ(VLXJBXDetail::BuildClassPath(nullptr, lib), "") << "no jar anywhere";
   EXPECT_EQ(VLXJBXDetail::BuildClassPath("a.jar::b:", lib), "a.jar:b");
-
-  Touch(lib + "/corvexa-replica.jar");
+  std::ofstream(lib + "/corvexa-replica.jar") << "jar";
   EXPECT_EQ(VLXJBXDetail::BuildClassPath(nullptr, lib), lib + "/corvexa-replica.jar") << "beside the library";
-
-  Touch(root + "/share/corvexa/corvexa-replica.jar");
+  std::ofstream(root + "/share/corvexa/corvexa-replica.jar") << "jar";
   EXPECT_EQ(VLXJBXDetail::BuildClassPath("x", lib), "x:" + lib + "/../share/corvexa/corvexa-replica.jar")
       << "installed and build-tree layout first";
   EXPECT_EQ(VLXJBXDetail::BuildClassPath("x", ""), "x") << "unknown library directory";
-}
+  std::filesystem::remove_all(root);
 
-TEST(StartupConfig, OptionsAreSplitOnAnyWhitespace)
-{
   EXPECT_TRUE(VLXJBXDetail::SplitOptions(nullptr).empty());
   EXPECT_TRUE(VLXJBXDetail::SplitOptions(" \t\n").empty());
-  const std::vector<std::string> words = VLXJBXDetail::SplitOptions("  -Xcheck:jni\t-Xmx64m\n -Dk=v ");
-  EXPECT_EQ(words, (std::vector<std::string>{"-Xcheck:jni", "-Xmx64m", "-Dk=v"}));
+  EXPECT_EQ(VLXJBXDetail::SplitOptions("  -Xcheck:jni\t-Xmx64m\n -Dk=v "),
+            (std::vector<std::string>{"-Xcheck:jni", "-Xmx64m", "-Dk=v"}));
 }
 
 } // namespace

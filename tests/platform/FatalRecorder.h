@@ -1,4 +1,4 @@
-// Installs a fatal-error handler that records the reports and returns, for the scope of a test.
+// Installs a fatal-error handler that records the reports (per thread) and returns, for its scope.
 #ifndef FatalRecorder_h
 #define FatalRecorder_h
 
@@ -9,8 +9,7 @@
 
 struct FatalReport
 {
-  std::string message;
-  std::string file;
+  std::string message, file;
   int line;
 };
 
