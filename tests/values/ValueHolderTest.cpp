@@ -7,7 +7,7 @@
 
 #include <gtest/gtest.h>
 
-#include "ValuesSupport.h"
+#include "TestSupport.h"
 
 using namespace corvexa_test;
 using Type = VLXKDMInstanceValue::Type;
@@ -322,8 +322,8 @@ TEST(ValueStates, AnInstanceValueSharesTheInstancesObjectWithoutTakingItsReferen
 // it is attached, naming its class, and the value stays as it was.
 TEST(ValuePreconditions, AJavaObjectOfAnotherClassIsRefused)
 {
-  Local boxedLong(NewLong(7));
-  Local subclass(NewJavaObject("com/velmora/tessara/testdoubles/InstanceSubclass"));
+  Local boxedLong(New("java/lang/Long", "(J)V", jlong(7)));
+  Local subclass(New("com/velmora/tessara/testdoubles/InstanceSubclass"));
   Local objects(NewArray("java/lang/Object", {}));
   for (jobject object : {boxedLong.get(), subclass.get(), objects.get()}) {
     VLXKDMInstanceValue value;
