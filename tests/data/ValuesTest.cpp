@@ -138,127 +138,75 @@ TEST(Values, EveryTypeWrittenEachWayReadsBackByNameAndPosition)
   EXPECT_EQ(VLX_S_OK, target.ToString(text));
 }
 
-// A variadic setter called with three values and a count, and the list its count should give.
-struct VariadicCase {
-  const char* operation;
-  int position;
-  std::function<long(VLXKDMInstance&, const VLXUnicodeString&, int)> byName;
-  std::function<long(VLXKDMInstance&, int, int)> byPosition;
-  std::function<long(VLXKDMInstance&, const VLXUnicodeString&, int)> listTwin;  // the first count values
-};
-
+// Each variadic setter, by name and by position, with three values and with none, sends the list
+// that the list setter sends; a negative count is refused and leaves the attribute as it was.
 TEST(VariadicSetters, SendWhatTheListSettersSendAndRefuseANegativeCount)
 {
   SampleReplica s;
-  VLXKDMInstance instance = s.Create(), t1 = s.Create(), t2 = s.Create();
+  VLXKDMInstance in = s.Create(), t1 = s.Create(), t2 = s.Create();
   const VLXBinary b1("ab", 2), b2, b3("\0c", 2);
   const VLXTime d1 = Time(5), d2 = Time(0), d3 = Time(1700000000);
-  auto first = [](auto list, int count) {
+  const VLXUnicodeString e(""), a("a"), acute("\xC3\xA9");
+  // The first k of three values, as the list setter's list.
+  auto first = [](auto list, int k) {
     decltype(list) out;
-    for (int i = 1; i <= count && i <= list.Size(); ++i) out.Append(list[i]);
+    for (int i = 1; i <= k; ++i) out.Append(list[i]);
     return out;
   };
-  const std::vector<VariadicCase> cases = {
-      {"SetValueBinaries", 12,
-       [&](VLXKDMInstance& in, const VLXUnicodeString& n, int k) { return in.SetValueBinaries(n, k, &b1, &b2, &b3); },
-       [&](VLXKDMInstance& in, int p, int k) { return in.SetValueBinaries(p, k, &b1, &b2, &b3); },
-       [&](VLXKDMInstance& in, const VLXUnicodeString& n, int k) {
-         return in.SetValue(n, first(ListOf<VLXListValVLXBinary>({b1, b2, b3}), k));
-       }},
-      {"SetValueBooleans", 11,
-       // Any non-zero argument is true.
-       [](VLXKDMInstance& in, const VLXUnicodeString& n, int k) { return in.SetValueBooleans(n, k, 1, 256, 1); },
-       [](VLXKDMInstance& in, int p, int k) { return in.SetValueBooleans(p, k, 1, 256, 1); },
-       [&](VLXKDMInstance& in, const VLXUnicodeString& n, int k) {
-         return in.SetValue(n, first(ListOf<VLXListValVLXBoolean>({VLXBoolean(1), VLXBoolean(1), VLXBoolean(1)}), k));
-       }},
-      {"SetValueDates", 10,
-       [&](VLXKDMInstance& in, const VLXUnicodeString& n, int k) { return in.SetValueDates(n, k, &d1, &d2, &d3); },
-       [&](VLXKDMInstance& in, int p, int k) { return in.SetValueDates(p, k, &d1, &d2, &d3); },
-       [&](VLXKDMInstance& in, const VLXUnicodeString& n, int k) {
-         return in.SetValue(n, first(ListOf<VLXListValVLXTime>({d1, d2, d3}), k));
-       }},
-      {"SetValueDoubles", 8,
-       [](VLXKDMInstance& in, const VLXUnicodeString& n, int k) { return in.SetValueDoubles(n, k, 0.5, -2.0, 1e300); },
-       [](VLXKDMInstance& in, int p, int k) { return in.SetValueDoubles(p, k, 0.5, -2.0, 1e300); },
-       [&](VLXKDMInstance& in, const VLXUnicodeString& n, int k) {
-         return in.SetValue(n, first(ListOf<VLXRawColldouble>({0.5, -2.0, 1e300}), k));
-       }},
-      {"SetValueInstances", 13,
-       [&](VLXKDMInstance& in, const VLXUnicodeString& n, int k) { return in.SetValueInstances(n, k, &t1, &t2, &t1); },
-       [&](VLXKDMInstance& in, int p, int k) { return in.SetValueInstances(p, k, &t1, &t2, &t1); },
-       [&](VLXKDMInstance& in, const VLXUnicodeString& n, int k) {
-         VLXListValVLXKDMInstance list;
-         const VLXKDMInstance* all[] = {&t1, &t2, &t1};
-         for (int i = 0; i < k; ++i) list.Append(*all[i]);
-         return in.SetValue(n, list);
-       }},
-      {"SetValueIntegers", 7,
-       [](VLXKDMInstance& in, const VLXUnicodeString& n, int k) { return in.SetValueIntegers(n, k, 1, 2, 3); },
-       [](VLXKDMInstance& in, int p, int k) { return in.SetValueIntegers(p, k, 1, 2, 3); },
-       [&](VLXKDMInstance& in, const VLXUnicodeString& n, int k) {
-         return in.SetValue(n, first(ListOf<VLXRawCollint>({1, 2, 3}), k));
-       }},
-      {"SetValueStrings", 9,
-       [](VLXKDMInstance& in, const VLXUnicodeString& n, int k) { return in.SetValueStrings(n, k, "a", "\xC3\xA9", ""); },
-       [](VLXKDMInstance& in, int p, int k) { return in.SetValueStrings(p, k, "a", "\xC3\xA9", ""); },
-       [&](VLXKDMInstance& in, const VLXUnicodeString& n, int k) {
-         return in.SetValue(n, first(ListOf<VLXListValVLXUnicodeString>(
-                                         {VLXUnicodeString("a"), VLXUnicodeString("\xC3\xA9"), VLXUnicodeString("")}),
-                                     k));
-       }},
+  using F = std::function<long(int position, int k, bool byName)>;
+  auto at = [&](int p, bool byName, auto set) { return byName ? set(U(SampleAttributes()[p].name)) : set(p); };
+  const struct {
+    int position;
+    F variadic, list;
+  } cases[] = {
+      {12, [&](int p, int k, bool n) { return at(p, n, [&](auto x) { return in.SetValueBinaries(x, k, &b1, &b2, &b3); }); },
+       [&](int p, int k, bool) { return in.SetValue(p, first(ListOf<VLXListValVLXBinary>({b1, b2, b3}), k)); }},
+      {11, [&](int p, int k, bool n) { return at(p, n, [&](auto x) { return in.SetValueBooleans(x, k, 1, 256, 1); }); },
+       [&](int p, int k, bool) { return in.SetValue(p, first(ListOf<VLXListValVLXBoolean>({VLXBoolean(1), VLXBoolean(1), VLXBoolean(1)}), k)); }},
+      {10, [&](int p, int k, bool n) { return at(p, n, [&](auto x) { return in.SetValueDates(x, k, &d1, &d2, &d3); }); },
+       [&](int p, int k, bool) { return in.SetValue(p, first(ListOf<VLXListValVLXTime>({d1, d2, d3}), k)); }},
+      {8, [&](int p, int k, bool n) { return at(p, n, [&](auto x) { return in.SetValueDoubles(x, k, 0.5, -2.0, 1e300); }); },
+       [&](int p, int k, bool) { return in.SetValue(p, first(ListOf<VLXRawColldouble>({0.5, -2.0, 1e300}), k)); }},
+      {13, [&](int p, int k, bool n) { return at(p, n, [&](auto x) { return in.SetValueInstances(x, k, &t1, &t2, &t1); }); },
+       [&](int p, int k, bool) { return in.SetValue(p, first(ListOf<VLXListValVLXKDMInstance>({t1, t2, t1}), k)); }},
+      {7, [&](int p, int k, bool n) { return at(p, n, [&](auto x) { return in.SetValueIntegers(x, k, 1, 2, 3); }); },
+       [&](int p, int k, bool) { return in.SetValue(p, first(ListOf<VLXRawCollint>({1, 2, 3}), k)); }},
+      {9, [&](int p, int k, bool n) { return at(p, n, [&](auto x) { return in.SetValueStrings(x, k, "a", "\xC3\xA9", ""); }); },
+       [&](int p, int k, bool) { return in.SetValue(p, first(ListOf<VLXListValVLXUnicodeString>({a, acute, e}), k)); }},
   };
-  auto read = [&instance](int position) {
+  auto read = [&in](int position) {
     VLXKDMInstanceValue value;
-    EXPECT_EQ(VLX_S_OK, instance.GetValue(position, value));
+    EXPECT_EQ(VLX_S_OK, in.GetValue(position, value));
     return value;
   };
-  auto same = [](VLXKDMInstanceValue& a, VLXKDMInstanceValue& b) {
-    if (a.GetType() != b.GetType() || !a.IsMultiValuated() || !b.IsMultiValuated()) return false;
-    switch (a.GetType()) {
-      case VLXKDMInstanceValue::IntegerType: return (a.GetListOfInteger() == b.GetListOfInteger()) != 0;
-      case VLXKDMInstanceValue::DoubleType: return (a.GetListOfDouble() == b.GetListOfDouble()) != 0;
-      case VLXKDMInstanceValue::StringType: return (a.GetListOfString() == b.GetListOfString()) != 0;
-      case VLXKDMInstanceValue::DateType: return (a.GetListOfDate() == b.GetListOfDate()) != 0;
-      case VLXKDMInstanceValue::BooleanType: return (a.GetListOfBoolean() == b.GetListOfBoolean()) != 0;
-      case VLXKDMInstanceValue::BinaryType: return (a.GetListOfBinary() == b.GetListOfBinary()) != 0;
-      case VLXKDMInstanceValue::InstanceType: return (a.GetListOfInstance() == b.GetListOfInstance()) != 0;
+  auto same = [](VLXKDMInstanceValue& x, VLXKDMInstanceValue& y) {
+    if (x.GetType() != y.GetType() || !x.IsMultiValuated() || !y.IsMultiValuated()) return false;
+    switch (x.GetType()) {
+      case VLXKDMInstanceValue::IntegerType: return (x.GetListOfInteger() == y.GetListOfInteger()) != 0;
+      case VLXKDMInstanceValue::DoubleType: return (x.GetListOfDouble() == y.GetListOfDouble()) != 0;
+      case VLXKDMInstanceValue::StringType: return (x.GetListOfString() == y.GetListOfString()) != 0;
+      case VLXKDMInstanceValue::DateType: return (x.GetListOfDate() == y.GetListOfDate()) != 0;
+      case VLXKDMInstanceValue::BooleanType: return (x.GetListOfBoolean() == y.GetListOfBoolean()) != 0;
+      case VLXKDMInstanceValue::BinaryType: return (x.GetListOfBinary() == y.GetListOfBinary()) != 0;
+      case VLXKDMInstanceValue::InstanceType: return (x.GetListOfInstance() == y.GetListOfInstance()) != 0;
     }
     return false;
   };
-  auto size = [](VLXKDMInstanceValue& v) {
-    switch (v.GetType()) {
-      case VLXKDMInstanceValue::IntegerType: return v.GetListOfInteger().Size();
-      case VLXKDMInstanceValue::DoubleType: return v.GetListOfDouble().Size();
-      case VLXKDMInstanceValue::StringType: return v.GetListOfString().Size();
-      case VLXKDMInstanceValue::DateType: return v.GetListOfDate().Size();
-      case VLXKDMInstanceValue::BooleanType: return v.GetListOfBoolean().Size();
-      case VLXKDMInstanceValue::BinaryType: return v.GetListOfBinary().Size();
-      case VLXKDMInstanceValue::InstanceType: return v.GetListOfInstance().Size();
-    }
-    return -1;
-  };
-
-  for (const VariadicCase& c : cases) {
-    const VLXUnicodeString name(SampleAttributes()[c.position].name);
-    for (int count : {3, 0}) {
-      SCOPED_TRACE(std::string(c.operation) + " with count " + std::to_string(count));
-      ASSERT_EQ(VLX_S_OK, c.listTwin(instance, name, count));
-      VLXKDMInstanceValue fromList = read(c.position);
-      ASSERT_EQ(VLX_S_OK, instance.ClearValue(c.position));
-      ASSERT_EQ(VLX_S_OK, c.byName(instance, name, count));
-      VLXKDMInstanceValue variadicByName = read(c.position);
-      ASSERT_EQ(VLX_S_OK, instance.ClearValue(c.position));
-      ASSERT_EQ(VLX_S_OK, c.byPosition(instance, c.position, count));
-      VLXKDMInstanceValue variadicByPosition = read(c.position);
-      EXPECT_EQ(count, size(fromList));
-      EXPECT_TRUE(same(fromList, variadicByName));
-      EXPECT_TRUE(same(fromList, variadicByPosition));
-      // A negative count is refused and leaves the value as it was.
-      EXPECT_EQ(VLX_E_INVALIDARG, c.byName(instance, name, -1));
-      EXPECT_EQ(VLX_E_INVALIDARG, c.byPosition(instance, c.position, -1));
-      VLXKDMInstanceValue after = read(c.position);
-      EXPECT_TRUE(same(fromList, after));
+  for (const auto& c : cases) {
+    for (int k : {3, 0}) {
+      for (bool byName : {true, false}) {
+        SCOPED_TRACE(std::string(SampleAttributes()[c.position].name) + " with " + std::to_string(k) +
+                     (byName ? " by name" : " by position"));
+        ASSERT_EQ(VLX_S_OK, c.list(c.position, k, byName));
+        VLXKDMInstanceValue fromList = read(c.position);
+        ASSERT_EQ(VLX_S_OK, in.ClearValue(c.position));
+        ASSERT_EQ(VLX_S_OK, c.variadic(c.position, k, byName));
+        VLXKDMInstanceValue variadic = read(c.position);
+        EXPECT_TRUE(same(fromList, variadic));
+        EXPECT_EQ(VLX_E_INVALIDARG, c.variadic(c.position, -1, byName));
+        VLXKDMInstanceValue after = read(c.position);
+        EXPECT_TRUE(same(fromList, after));
+      }
     }
   }
 }

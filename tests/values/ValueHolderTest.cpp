@@ -154,32 +154,7 @@ TEST(ValueTypes, EverySingleAndListTypeCrossesToJavaAndBack) { RoundTrip(5); }
 TEST(ValueTypes, EmptyListsCrossToJavaAndBack) { RoundTrip(0); }
 TEST(ValueTypes, ListsOfAHundredThousandElementsCrossToJavaAndBack) { RoundTrip(100000); }
 
-TEST(ValueTypes, AnArrayOfInstancesIsReadAsProxiesOfItsObjects)
-{
-  std::vector<VLXKDMInstance> objects = NewInstances(2);
-  Local array(NewArray(kInstanceClass, {objects[1].GetHandle(), objects[0].GetHandle()}));
-  VLXKDMInstanceValue value;
-  ASSERT_EQ(VLX_S_OK, value.SetHandle(Env(), array.get()));
-  ASSERT_EQ(VLX_S_OK, value.BuildLocal());
-  EXPECT_EQ(VLXKDMInstanceValue::InstanceType, value.GetType());
-  ASSERT_EQ(2, value.GetListOfInstance().Size());
-  EXPECT_TRUE(value.GetListOfInstance()[1] == objects[1]);
-  EXPECT_TRUE(value.GetListOfInstance()[2] == objects[0]);
-}
-
 // ---- States ----------------------------------------------------------------------------------
-
-TEST(ValueStates, ANewValueHasNoTypeAndCannotBeReadFromJava)
-{
-  VLXKDMInstanceValue value;
-  EXPECT_EQ(kNoType, value.GetType());
-  EXPECT_EQ(0, value.IsMultiValuated());
-  ClearLastError();
-  EXPECT_EQ(VLX_E_FAIL, value.BuildLocal());
-  EXPECT_EQ("VLXJBXInfraERR_1003", PeekLastError().id);
-  EXPECT_EQ("VLXKDMInstanceValue::BuildLocal()", PeekLastError().parameters.at(0));
-  EXPECT_EQ(kNoType, value.GetType());
-}
 
 // Empty -> Local -> Synchronized -> Attached -> Synchronized -> Local, as seen from outside.
 TEST(ValueStates, EmptyAttachedLocalAndSynchronized)
