@@ -1,6 +1,6 @@
-// Attribute values and identifiers of instances of a real replica: every type, single and list,
-// written by the typed setters, the variadic setters and a value holder, by name and by position,
-// read back both ways; what the native side refuses, and what it leaves alone when it fails.
+// Attribute values and identifiers of instances of a real replica: the variadic setters against the
+// list setters, dates and booleans as written, what the native side refuses, and what it leaves
+// alone when it fails. (Values of every type cross through the converters of values/.)
 #include <climits>
 #include <functional>
 #include <string>
@@ -14,129 +14,7 @@ using namespace corvexa_test;
 
 namespace {
 
-using Type = VLXKDMInstanceValue::Type;
-
 VLXTime Time(time_t seconds) { return Seconds(seconds); }
-
-// One attribute of the class Sample with a value for it, and the ways to write and check it.
-struct ValueCase {
-  int position;
-  Type type;
-  bool list;
-  std::function<long(VLXKDMInstance&, const VLXUnicodeString&)> typedByName;
-  std::function<long(VLXKDMInstance&, int)> typedByPosition;
-  std::function<void(VLXKDMInstanceValue&)> fill;
-  std::function<bool(const VLXKDMInstanceValue&)> holds;
-  std::string attribute() const { return SampleAttributes()[position].name; }
-};
-
-template <auto Set, auto Get, class T>
-ValueCase MakeCase(int position, Type type, const T& value)
-{
-  ValueCase c;
-  c.position = position;
-  c.type = type;
-  c.list = position >= 7;
-  c.typedByName = [value](VLXKDMInstance& instance, const VLXUnicodeString& name) {
-    return instance.SetValue(name, value);
-  };
-  c.typedByPosition = [value](VLXKDMInstance& instance, int p) { return instance.SetValue(p, value); };
-  c.fill = [value](VLXKDMInstanceValue& holder) { (holder.*Set)(value); };
-  c.holds = [value](const VLXKDMInstanceValue& holder) { return static_cast<bool>((holder.*Get)() == value); };
-  return c;
-}
-
-// A value of every type, single and list, some of them at the edges of their range.
-std::vector<ValueCase> EveryType(const VLXKDMInstance& target, const VLXKDMInstance& other)
-{
-  using V = VLXKDMInstanceValue;
-  const std::string text("euro \xE2\x82\xAC, smile \xF0\x9F\x98\x80, nul \0 end", 31);
-  const VLXUnicodeString unicode(text.data(), static_cast<int>(text.size()));
-  const unsigned char raw[] = {0x00, 0xFF, 0x80, 0x7F, 0x00};
-  const VLXBinary bytes(raw, sizeof raw);
-  VLXListValVLXKDMInstance instances;
-  instances.Append(target);
-  instances.Append(other);
-  instances.Append(target);
-  return {
-      MakeCase<&V::SetInteger, &V::GetInteger>(0, V::IntegerType, INT_MIN),
-      MakeCase<&V::SetDouble, &V::GetDouble>(1, V::DoubleType, -6.02214076e-23),
-      MakeCase<&V::SetString, &V::GetString>(2, V::StringType, unicode),
-      MakeCase<&V::SetDate, &V::GetDate>(3, V::DateType, Time(4102444799)),
-      MakeCase<&V::SetBoolean, &V::GetBoolean>(4, V::BooleanType, VLXBoolean(1)),
-      MakeCase<&V::SetBinary, &V::GetBinary>(5, V::BinaryType, bytes),
-      MakeCase<&V::SetInstance, &V::GetInstance>(6, V::InstanceType, target),
-      MakeCase<&V::SetListOfInteger, &V::GetListOfInteger>(
-          7, V::IntegerType, ListOf<VLXRawCollint>({INT_MIN, -1, 0, 7, INT_MAX})),
-      MakeCase<&V::SetListOfDouble, &V::GetListOfDouble>(
-          8, V::DoubleType, ListOf<VLXRawColldouble>({0.1, -0.0, 1e308, 5e-324})),
-      MakeCase<&V::SetListOfString, &V::GetListOfString>(
-          9, V::StringType, ListOf<VLXListValVLXUnicodeString>({unicode, VLXUnicodeString(""), VLXUnicodeString("b")})),
-      MakeCase<&V::SetListOfDate, &V::GetListOfDate>(
-          10, V::DateType, ListOf<VLXListValVLXTime>({Time(0), Time(1), Time(1700000000), Time(253402300799)})),
-      MakeCase<&V::SetListOfBoolean, &V::GetListOfBoolean>(
-          11, V::BooleanType, ListOf<VLXListValVLXBoolean>({VLXBoolean(1), VLXBoolean(0), VLXBoolean(1)})),
-      MakeCase<&V::SetListOfBinary, &V::GetListOfBinary>(
-          12, V::BinaryType, ListOf<VLXListValVLXBinary>({bytes, VLXBinary(), VLXBinary("z", 1)})),
-      MakeCase<&V::SetListOfInstance, &V::GetListOfInstance>(13, V::InstanceType, instances),
-  };
-}
-
-// Reads the attribute by name and by position and checks both against the case.
-void ExpectReadBack(VLXKDMInstance& instance, const ValueCase& c)
-{
-  VLXKDMInstanceValue byName, byPosition;
-  ASSERT_EQ(VLX_S_OK, instance.GetValue(VLXUnicodeString(c.attribute().c_str()), byName));
-  ASSERT_EQ(VLX_S_OK, instance.GetValue(c.position, byPosition));
-  for (VLXKDMInstanceValue* read : {&byName, &byPosition}) {
-    EXPECT_EQ(c.type, read->GetType());
-    EXPECT_EQ(c.list ? 1 : 0, read->IsMultiValuated());
-    EXPECT_TRUE(c.holds(*read));
-  }
-}
-
-TEST(Values, EveryTypeWrittenEachWayReadsBackByNameAndPosition)
-{
-  SampleReplica s;
-  VLXKDMInstance instance = s.Create(), target = s.Create(), other = s.Create();
-  for (const ValueCase& c : EveryType(target, other)) {
-    const VLXUnicodeString name(c.attribute().c_str());
-    const struct {
-      const char* how;
-      std::function<long()> write;
-    } writes[] = {
-        {"typed setter by name", [&] { return c.typedByName(instance, name); }},
-        {"typed setter by position", [&] { return c.typedByPosition(instance, c.position); }},
-        {"value holder by name", [&] {
-           VLXKDMInstanceValue holder;
-           c.fill(holder);
-           const long rc = instance.SetValue(name, holder);
-           EXPECT_NE(nullptr, holder.GetHandle());  // the holder keeps its Java form
-           return rc;
-         }},
-        {"value holder by position", [&] {
-           VLXKDMInstanceValue holder;
-           c.fill(holder);
-           return instance.SetValue(c.position, holder);
-         }},
-    };
-    for (const auto& w : writes) {
-      SCOPED_TRACE(c.attribute() + ", " + w.how);
-      ASSERT_EQ(VLX_S_OK, instance.ClearValue(c.position));
-      VLXBoolean valuated = 9;
-      ASSERT_EQ(VLX_S_OK, instance.IsValuated(c.position, valuated));
-      ASSERT_EQ(0, valuated);
-      ASSERT_EQ(VLX_S_OK, w.write());
-      ASSERT_EQ(VLX_S_OK, instance.IsValuated(name, valuated));
-      EXPECT_EQ(1, valuated);
-      ExpectReadBack(instance, c);
-    }
-  }
-  // The instance given to a typed setter stays attached to its Java object.
-  ASSERT_EQ(VLX_S_OK, instance.SetValue(6, target));
-  VLXUnicodeString text;
-  EXPECT_EQ(VLX_S_OK, target.ToString(text));
-}
 
 // Each variadic setter, by name and by position, with three values and with none, sends the list
 // that the list setter sends; a negative count is refused and leaves the attribute as it was.
@@ -223,7 +101,7 @@ TEST(ValueFailures, AClassOutsideTheTableIsReportedAndFails)
     ASSERT_FALSE(FatalRecorder::Reports().empty());
     EXPECT_EQ("AssertionFailed:_type != (Type) -1", FatalRecorder::Reports()[0].message);
     EXPECT_EQ(99, FatalRecorder::Reports()[0].line);
-    EXPECT_EQ(static_cast<Type>(-1), value.GetType());
+    EXPECT_EQ(static_cast<VLXKDMInstanceValue::Type>(-1), value.GetType());
   }
 }
 
