@@ -127,6 +127,7 @@ void RoundTrip(int n)
 {
   const std::vector<VLXKDMInstance> instances = NewInstances(3);
   FatalRecorder recorder;  // a getter of the wrong type would be recorded, not abort
+  const long globals = GlobalRefCount(), locals = LocalRefCount();
   for (const Case& c : Cases(n, instances)) {
     SCOPED_TRACE(c.name);
     VLXKDMInstanceValue written;
@@ -148,6 +149,8 @@ void RoundTrip(int n)
     }
   }
   EXPECT_TRUE(Reports().empty()) << Reports().front();
+  EXPECT_EQ(globals, GlobalRefCount());  // the values and their Java objects are gone
+  EXPECT_EQ(locals, LocalRefCount());
 }
 
 TEST(ValueTypes, EverySingleAndListTypeCrossesToJavaAndBack) { RoundTrip(5); }
