@@ -7,16 +7,12 @@
 
 #include <gtest/gtest.h>
 
-#include "ReplicaStubs.h"
+#include "CallFrame.h"
 #include "TestSupport.h"
 
 using namespace corvexa_test;
 
 namespace {
-
-struct TableReader : VLXKDMJavaObject {
-  static ReplicaStubs* Table() { return _st.load(); }
-};
 
 // A row's quoted argument: string literals and the file's own #define'd prefixes, concatenated.
 std::string Literal(const std::string& text, const std::map<std::string, std::string>& prefixes)
@@ -32,7 +28,7 @@ TEST(BindingTable, EverySlotHoldsWhatItsRowNames)
 {
   VLXKDMReplica replica;
   ASSERT_EQ(VLX_S_OK, replica.Build());
-  const ReplicaStubs* table = TableReader::Table();
+  const ReplicaStubs* table = corvexa::FrameAccess::Table();
   ASSERT_TRUE(table && table->IsBound());
   JNIEnv* env = Env();
 
