@@ -1,63 +1,77 @@
-// The binding table's slot numbers and its filling against the real replica package.
+// The binding table as filled against the real replica package, read row by row from
+// BindingTable.def itself: each slot holds what its row names, in row order.
+#include <fstream>
+#include <map>
+#include <regex>
+#include <string>
+
 #include <gtest/gtest.h>
 
-#include "JavaTestSupport.h"
-#include "ReplicaStubs.h"
-#include "VLXKDMReplica.h"
+#include "CallFrame.h"
+#include "TestSupport.h"
 
-using namespace corvexa;
 using namespace corvexa_test;
 
 namespace {
 
-// The slot numbers are part of the library's contract with the Java side.
-static_assert(AttributeDef == 0 && AttributeDef_getAttributeName == 28, "AttributeDef group");
-static_assert(AttributeDefList == 29 && AttributeDefList_getItemAt == 40, "AttributeDefList group");
-static_assert(ClassDef == 41 && ClassDef_getQKAComment == 66 && ClassDef_setQKAComment == 67, "ClassDef group");
-static_assert(Instance == 68 && Instance_getValueNamed == 85, "Instance group");
-static_assert(InstanceSet == 86 && InstanceSet_getItem == 93, "InstanceSet group");
-static_assert(Model == 94 && Model_getClassDef == 101, "Model group");
-static_assert(ModelSet == 102 && ModelSet_getCount == 113, "ModelSet group");
-static_assert(Replica == 114 && Replica_setFeature == 121 && Replica_getName == 137, "Replica group");
-static_assert(ReplicaHolder == 138 && ReplicaHolder_setValue == 141, "ReplicaHolder group");
-static_assert(String == 142 && Double == 145 && Integer == 148 && Date == 151 && Boolean == 154, "boxes");
-static_assert(ByteArray == 157 && InstanceArray == 164, "array classes");
-static_assert(AttributeType == 165 && AttributeType_Relationship == 172 && AttributeType_reserved == 173,
-              "AttributeType constants");
-static_assert(AccessMode == 174 && AccessMode_ReadWrite == 177, "AccessMode constants");
-static_assert(AggregationType == 178 && AggregationType_Shared == 180, "AggregationType constants");
-static_assert(ClassType == 181 && ClassType_Extension == 183, "ClassType constants");
-static_assert(Visibility == 184 && Visibility_Private == 187, "Visibility constants");
+// A row's quoted argument: string literals and the file's own #define'd prefixes, concatenated.
+std::string Literal(const std::string& text, const std::map<std::string, std::string>& prefixes)
+{
+  std::string out;
+  static const std::regex part("\"([^\"]*)\"|([A-Z]+)");
+  for (auto it = std::sregex_iterator(text.begin(), text.end(), part); it != std::sregex_iterator(); ++it)
+    out += (*it)[1].matched ? (*it)[1].str() : prefixes.at((*it)[2].str());
+  return out;
+}
 
-struct TableReader : VLXKDMJavaObject {
-  static ReplicaStubs* Table() { return _st.load(); }
-};
-
-TEST(BindingTable, EverySlotButTheReservedOneIsFilledAndConstantsAreDistinct)
+TEST(BindingTable, EverySlotHoldsWhatItsRowNames)
 {
   VLXKDMReplica replica;
   ASSERT_EQ(VLX_S_OK, replica.Build());
-  const ReplicaStubs* table = TableReader::Table();
-  ASSERT_NE(nullptr, table);
-  ASSERT_TRUE(table->IsBound());
-  for (int slot = 0; slot < SlotCount; ++slot) {
-    SCOPED_TRACE(slot);
-    const void* entry = table->Constant(static_cast<Slot>(slot));
-    if (slot == AttributeType_reserved)
-      EXPECT_EQ(nullptr, entry);
-    else
-      EXPECT_NE(nullptr, entry);
-  }
-  // Overloads are told apart by signature.
-  EXPECT_NE(table->Method(Instance_getValueAt), table->Method(Instance_getValueNamed));
-  EXPECT_NE(table->Method(Replica_getXml), table->Method(Replica_getXmlWithState));
-  EXPECT_NE(table->Method(Replica_new), table->Method(Replica_new_name));
-
+  const ReplicaStubs* table = corvexa::FrameAccess::Table();
+  ASSERT_TRUE(table && table->IsBound());
   JNIEnv* env = Env();
-  EXPECT_FALSE(env->IsSameObject(table->Constant(AttributeType_Integer), table->Constant(AttributeType_Double)));
-  EXPECT_FALSE(env->IsSameObject(table->Constant(Visibility_Public), table->Constant(Visibility_Private)));
-  jclass accessMode = table->Class(AccessMode);
-  EXPECT_TRUE(env->IsInstanceOf(table->Constant(AccessMode_Write), accessMode));
+
+  std::ifstream def(CORVEXA_BINDING_TABLE);
+  ASSERT_TRUE(def) << CORVEXA_BINDING_TABLE;
+  static const std::regex define("#define ([A-Z]+) \"([^\"]*)\"");
+  static const std::regex row("^(CLASS|METHOD|STATIC|SETTER_FIRST|CONSTANT|RESERVED)\\((\\w+)(?:, ([^,]+))?(?:, (.+))?\\)$");
+  std::map<std::string, std::string> prefixes;
+  std::string line;
+  int slot = 0;
+  Local cls;
+  std::string classPath;
+  while (std::getline(def, line)) {
+    std::smatch m;
+    if (std::regex_search(line, m, define)) prefixes[m[1]] = m[2];
+    if (!std::regex_match(line, m, row)) continue;
+    SCOPED_TRACE(line);
+    ASSERT_LT(slot, corvexa::SlotCount);
+    const auto at = static_cast<corvexa::Slot>(slot++);
+    const std::string kind = m[1], first = m[3].matched ? Literal(m[3], prefixes) : "";
+    const std::string second = m[4].matched ? Literal(m[4], prefixes) : "";
+    if (kind == "CLASS") {
+      classPath = first;
+      cls.reset(env->FindClass(first.c_str()));
+      ASSERT_TRUE(NoPending(first.c_str()) && cls.get());
+      EXPECT_TRUE(Same(table->Class(at), cls.get()));
+    } else if (kind == "RESERVED") {
+      EXPECT_EQ(nullptr, table->Constant(at));
+    } else if (kind == "CONSTANT") {
+      const jclass c = static_cast<jclass>(cls.get());
+      const jfieldID field = env->GetStaticFieldID(c, first.c_str(), ("L" + classPath + ";").c_str());
+      ASSERT_TRUE(NoPending(first.c_str()) && field);
+      Local constant(env->GetStaticObjectField(c, field));
+      EXPECT_TRUE(Same(table->Constant(at), constant.get()));
+    } else {
+      const jclass c = static_cast<jclass>(cls.get());
+      const jmethodID method = kind == "STATIC" ? env->GetStaticMethodID(c, first.c_str(), second.c_str())
+                                                : env->GetMethodID(c, first.c_str(), second.c_str());
+      ASSERT_TRUE(NoPending(second.c_str()) && method);
+      EXPECT_EQ(method, table->Method(at));
+    }
+  }
+  EXPECT_EQ(corvexa::SlotCount, slot);
 }
 
 }  // namespace

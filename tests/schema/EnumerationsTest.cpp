@@ -5,9 +5,7 @@
 
 #include <gtest/gtest.h>
 
-#include "JavaTestSupport.h"
-#include "VLXKDMAttributeDef.h"
-#include "VLXKDMClassDef.h"
+#include "TestSupport.h"
 
 using namespace corvexa_test;
 

@@ -12,7 +12,7 @@
 
 #include <gtest/gtest.h>
 
-#include "JavaTestSupport.h"
+#include "TestSupport.h"
 #include "ReplicaStubs.h"
 #include "VLXKDMReplica.h"
 

@@ -9,7 +9,8 @@
 
 #include <gtest/gtest.h>
 
-#include "ValuesSupport.h"
+#include "CallFrame.h"
+#include "TestSupport.h"
 #include "VLXListValVLXBinary.h"
 #include "VLXListValVLXTime.h"
 
@@ -18,14 +19,27 @@ using corvexa::Values;
 
 namespace {
 
+// Every test, its failure paths included, leaves the global references and this natively attached
+// thread's local references as it found them.
 class Converters : public ::testing::Test {
  protected:
   static void SetUpTestSuite()
   {
-    VLXKDMInstanceValue start;
-    start.SetInteger(0);  // starts the Java side
+    VLXKDMReplica start;
+    ASSERT_EQ(VLX_S_OK, start.Build());  // starts the Java side
+  }
+  void SetUp() override
+  {
+    globals = GlobalRefCount();
+    locals = LocalRefCount();
+  }
+  void TearDown() override
+  {
+    EXPECT_EQ(globals, GlobalRefCount());
+    EXPECT_EQ(locals, LocalRefCount());
   }
   JNIEnv* env = Env();
+  long globals = 0, locals = 0;
 };
 
 // ---- Times -----------------------------------------------------------------------------------
@@ -238,7 +252,7 @@ TEST_F(Converters, AnArrayOfByteArraysKeepsTheElementsBeforeOneThatIsNoByteArray
   JNIEnv* e = env;
   const jbyte raw[] = {1, 2, 3};
   Local bytes(e->NewByteArray(3));
-  e->SetByteArrayRegion(bytes.as<jbyteArray>(), 0, 3, raw);
+  e->SetByteArrayRegion(static_cast<jbyteArray>(bytes.get()), 0, 3, raw);
   Local empty(e->NewByteArray(0));
   Local text(e->NewStringUTF("not bytes"));
 

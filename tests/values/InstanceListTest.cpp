@@ -5,7 +5,7 @@
 
 #include <gtest/gtest.h>
 
-#include "ValuesSupport.h"
+#include "TestSupport.h"
 
 using namespace corvexa_test;
 

@@ -1,0 +1,125 @@
+// Texts cross to Java and back byte for byte; malformed UTF-8 is refused before any Java call, with
+// the converter's own code or the translated one as each operation says.
+#include <functional>
+#include <string>
+
+#include <gtest/gtest.h>
+
+#include "TestSupport.h"
+
+using namespace corvexa_test;
+
+namespace {
+
+TEST(Strings, NamesSurviveARoundTripByteForByte)
+{
+  const std::string samples[] = {
+      "plain",
+      "Zo\xC3\xAB \xC3\x85ngstr\xC3\xB6m, na\xC3\xAFve caf\xC3\xA9",            // Latin accents
+      "\xE6\x95\xB0\xE6\x8D\xAE\xE5\x89\xAF\xE6\x9C\xAC",                        // CJK
+      "fox \xF0\x9F\xA6\x8A rocket \xF0\x9F\x9A\x80",                            // outside the BMP
+      std::string("nul\0inside\0", 12),                                          // embedded NUL
+      "\xEF\xBF\xBF edge \xF4\x8F\xBF\xBF",                                      // U+FFFF, U+10FFFF
+      "",
+      std::string(70000, 'x'),
+  };
+  VLXKDMReplica replica;
+  ASSERT_EQ(VLX_S_OK, replica.Build());
+  for (const std::string& sample : samples) {
+    SCOPED_TRACE(sample.substr(0, 40));
+    ASSERT_EQ(VLX_S_OK, replica.SetName(VLXUnicodeString(sample.data(), static_cast<int>(sample.size()))));
+    VLXUnicodeString back("stale");
+    ASSERT_EQ(VLX_S_OK, replica.GetName(back));
+    EXPECT_EQ(sample, Text(back));
+  }
+}
+
+TEST(Strings, MalformedUtf8GivesTheRawCodeOrTheTranslatedOneAsEachOperationSays)
+{
+  VLXKDMReplica replica;
+  ASSERT_EQ(VLX_S_OK, replica.Build(VLXUnicodeString("kept")));
+  const char* const malformed[] = {"bad \xC3\x28 byte", "\xED\xA0\x80 surrogate", "\xC0\xAF overlong",
+                                   "cut \xE6\x95", "\xF5\x80\x80\x80 too big"};
+  for (const char* text : malformed) {
+    SCOPED_TRACE(text);
+    ClearLastError();
+    // SetName returns the converter's own code, untranslated.
+    const long raw = replica.SetName(VLXUnicodeString(text));
+    EXPECT_LT(raw, 0);
+    EXPECT_NE(VLX_E_FAIL, raw);
+    const LastError error = PeekLastError();
+    EXPECT_NE(std::string::npos, error.text.find("UTF-8")) << error.text;
+
+    // GetClassDef passes the same failure through the error translation.
+    VLXKDMClassDef classDef;
+    EXPECT_EQ(VLX_E_FAIL, replica.GetClassDef(VLXUnicodeString(text), classDef));
+    EXPECT_EQ(nullptr, classDef.GetHandle());
+  }
+  VLXUnicodeString name;
+  ASSERT_EQ(VLX_S_OK, replica.GetName(name));
+  EXPECT_EQ("kept", Text(name));
+}
+
+// Which operations return the converter's code as it is (VLX_E_INVALIDARG) and which translate it
+// (VLX_E_FAIL); either way the out-parameters and the Java side are left alone.
+TEST(Strings, AMalformedTextArgumentGivesEachOperationsOwnCode)
+{
+  SampleReplica s;
+  VLXKDMInstance instance = s.Create();
+  ASSERT_EQ(VLX_S_OK, instance.SetValue(0, 42));
+  VLXKDMModelSet models;
+  ASSERT_EQ(VLX_S_OK, s.replica.GetModels(models));
+  VLXKDMAttributeDef attribute;
+  ASSERT_EQ(VLX_S_OK, attribute.Build(VLXUnicodeString("a"), VLXKDMAttributeType::String));
+  VLXKDMAttributeDef copy(attribute);
+  const VLXUnicodeString bad("bad \xC3\x28 name");
+  const VLXListOfVLXUnicodeString badList = ListOf<VLXListOfVLXUnicodeString>({VLXUnicodeString("fine"), bad});
+  VLXBoolean flag = 9;
+  int number = 9;
+  VLXKDMInstanceValue value;
+  value.SetInteger(8);
+  VLXKDMInstanceValue holder;
+  holder.SetInteger(4);
+  const struct {
+    const char* what;
+    long expected;
+    std::function<long()> call;
+  } cases[] = {
+      {"SetName", VLX_E_INVALIDARG, [&] { return s.replica.SetName(bad); }},
+      {"ModelSet::Includes", VLX_E_INVALIDARG, [&] { return models.Includes(bad, flag); }},
+      {"Instance::IsValuated", VLX_E_INVALIDARG, [&] { return instance.IsValuated(bad, flag); }},
+      {"Instance::GetValue", VLX_E_INVALIDARG, [&] { return instance.GetValue(bad, value); }},
+      {"AttributeDef::SetQKAComment", VLX_E_INVALIDARG, [&] { return attribute.SetQKAComment(bad); }},
+      {"AttributeDef::SetTargetNames", VLX_E_INVALIDARG, [&] { return attribute.SetTargetNames(badList); }},
+      {"AttributeDef::Build", VLX_E_INVALIDARG, [&] { return copy.Build(bad, VLXKDMAttributeType::Integer); }},
+      {"ModelSet::IndexOf", VLX_E_FAIL, [&] { return models.IndexOf(bad, number); }},
+      {"AttributeDef::SetUuid", VLX_E_FAIL, [&] { return attribute.SetUuid(bad); }},
+      {"AttributeDef::SetTargetRefs", VLX_E_FAIL, [&] { return attribute.SetTargetRefs(badList); }},
+      {"Instance::ClearValue", VLX_E_FAIL, [&] { return instance.ClearValue(bad); }},
+      {"Instance::SetID", VLX_E_FAIL, [&] { return instance.SetID(bad); }},
+      {"Instance::SetValue(name, int)", VLX_E_FAIL, [&] { return instance.SetValue(bad, 5); }},
+      {"Instance::SetValue(name, text)", VLX_E_FAIL, [&] { return instance.SetValue(VLXUnicodeString("string"), bad); }},
+      // The holder gets its Java form before the name is converted.
+      {"Instance::SetValue(name, holder)", VLX_E_FAIL, [&] { return instance.SetValue(bad, holder); }},
+  };
+  for (const auto& c : cases) {
+    SCOPED_TRACE(c.what);
+    ClearLastError();
+    EXPECT_EQ(c.expected, c.call());
+    EXPECT_TRUE(Has(PeekLastError().text, "UTF-8")) << PeekLastError().text;
+  }
+  EXPECT_EQ(9, flag);
+  EXPECT_EQ(9, number);
+  EXPECT_EQ(8, value.GetInteger());
+  EXPECT_EQ(nullptr, value.GetHandle());
+  EXPECT_NE(nullptr, holder.GetHandle());
+  EXPECT_TRUE(copy == attribute);
+  VLXKDMInstanceValue kept;
+  ASSERT_EQ(VLX_S_OK, instance.GetValue(0, kept));
+  EXPECT_EQ(42, kept.GetInteger());
+  VLXBoolean valuated = 9;
+  ASSERT_EQ(VLX_S_OK, instance.IsValuated(2, valuated));
+  EXPECT_EQ(0, valuated);
+}
+
+}  // namespace
