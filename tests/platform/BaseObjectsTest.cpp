@@ -9,6 +9,8 @@
 #include <gtest/gtest.h>
 
 #include <atomic>
+#include <new>
+#include <typeinfo>
 #include <thread>
 #include <vector>
 
@@ -95,6 +97,36 @@ TEST(BaseUnknown, ClassNamesAndInterfacesComeFromTheDynamicType)
   EXPECT_EQ(base->QueryInterface("Unknown", &found), VLX_E_NOINTERFACE);
   EXPECT_EQ(base->QueryInterface("VLXBaseUnknown", nullptr), VLX_E_INVALIDARG);
   EXPECT_EQ(base->GetRefCount(), 3u);
+}
+
+// The rest of the base's contract: no scripting type information, an implementation pointer and a
+// component state that are only stored, identity as equality, and the class allocator.
+TEST(BaseUnknown, TypeInformationIsAbsentAndStoredStateIsKept)
+{
+  shapes::Counted object;
+  unsigned int count = 7;
+  void* info = &info;
+  VLXIID iid = IID_VLXBaseUnknown;
+  EXPECT_EQ(object.GetTypeInfoCount(&count), VLX_S_OK);
+  EXPECT_EQ(count, 0u);
+  EXPECT_EQ(object.GetTypeInfoCount(nullptr), VLX_E_INVALIDARG);
+  EXPECT_EQ(object.GetTypeInfo(0, 0, &info), VLX_E_NOTIMPL);
+  EXPECT_EQ(info, nullptr);
+  EXPECT_EQ(object.GetIDsOfNames(iid, nullptr, 0, 0, nullptr), VLX_E_NOTIMPL);
+  EXPECT_EQ(object.Invoke(0, iid, 0, 0, nullptr, nullptr, nullptr, nullptr), VLX_E_NOTIMPL);
+  EXPECT_EQ(object.GetImpl(), nullptr);
+  object.SetImpl(&count);
+  EXPECT_EQ(object.GetImpl(), &count);
+  EXPECT_EQ(object.IsNull(), 0);
+  EXPECT_TRUE(object.IsEqual(&object));
+  shapes::Counted other;
+  EXPECT_FALSE(object.IsEqual(&other));
+  EXPECT_EQ(object.ChangeComponentState(3), VLX_S_OK);
+  EXPECT_EQ(object.GetComponentState(), 3);
+  EXPECT_EQ(object.GetMetaObject(), typeid(shapes::Counted));
+  VLXBaseUnknown* made = new (std::nothrow) shapes::Counted;  // the class allocator, nothrow form
+  ASSERT_NE(made, nullptr);
+  made->Release();
 }
 
 // ---- errors ----
