@@ -72,7 +72,8 @@ constexpr time_t kBaseSeconds = 1700000000;
 class Local {
  public:
   Local(JNIEnv* env, jobject ref) : _env(env), _ref(ref) {}
-  ~Local() {
+  ~Local()
+  {
     if (_ref) _env->DeleteLocalRef(_ref);
   }
   Local(const Local&) = delete;
@@ -209,19 +210,20 @@ bool SetUp(World& w, std::string& why)
   Local replicaClass(env, env->GetObjectClass(w.replicaRef));
   Local instanceClass(env, env->GetObjectClass(w.instanceRef));
   w.replicaGetName = Method(env, static_cast<jclass>(replicaClass.get()), "getName", "()Ljava/lang/String;");
-  w.replicaGetModels = Method(env, static_cast<jclass>(replicaClass.get()), "getModels",
-                              "()Lcom/velmora/tessara/kdmreplica/ModelSet;");
+  w.replicaGetModels =
+      Method(env, static_cast<jclass>(replicaClass.get()), "getModels", "()Lcom/velmora/tessara/kdmreplica/ModelSet;");
   const jclass instance = static_cast<jclass>(instanceClass.get());
   w.instanceSetValueNamed = Method(env, instance, "setValue", "(Ljava/lang/String;Ljava/lang/Object;)V");
   w.instanceSetValueAt = Method(env, instance, "setValue", "(ILjava/lang/Object;)V");
   w.instanceGetValueNamed = Method(env, instance, "getValue", "(Ljava/lang/String;)Ljava/lang/Object;");
-  if (!w.integerValueOf || !w.integerIntValue || !w.replicaGetName || !w.replicaGetModels ||
-      !w.instanceSetValueNamed || !w.instanceSetValueAt || !w.instanceGetValueNamed)
+  if (!w.integerValueOf || !w.integerIntValue || !w.replicaGetName || !w.replicaGetModels || !w.instanceSetValueNamed ||
+      !w.instanceSetValueAt || !w.instanceGetValueNamed)
     return Fail(why, "a hand-written lookup failed");
 
   w.fillClass = GlobalClass(env, "com/velmora/tessara/bench/FillBaseline");
   w.fill = Method(env, w.fillClass, "fill", "(Lcom/velmora/tessara/kdmreplica/Model;IJ)I", true);
-  if (!w.fill) return Fail(why, "class com.velmora.tessara.bench.FillBaseline not found (is the bench jar on VLXJBX_CLASSPATH?)");
+  if (!w.fill)
+    return Fail(why, "class com.velmora.tessara.bench.FillBaseline not found (is the bench jar on VLXJBX_CLASSPATH?)");
   w.systemClass = GlobalClass(env, "java/lang/System");
   w.systemGc = Method(env, w.systemClass, "gc", "()V", true);
   if (!w.systemGc) return Fail(why, "System.gc not found");
@@ -244,10 +246,10 @@ void TearDown(World& w)
 {
   JNIEnv* env = w.env;
   if (!env) return;
-  for (jobject ref : {w.replicaRef, w.instanceRef, w.modelsRef, w.keptValue, static_cast<jobject>(w.integerClass),
-                      static_cast<jobject>(w.fillClass), static_cast<jobject>(w.systemClass),
-                      static_cast<jobject>(w.doubleClass), static_cast<jobject>(w.booleanClass),
-                      static_cast<jobject>(w.dateClass)})
+  for (jobject ref :
+       {w.replicaRef, w.instanceRef, w.modelsRef, w.keptValue, static_cast<jobject>(w.integerClass),
+        static_cast<jobject>(w.fillClass), static_cast<jobject>(w.systemClass), static_cast<jobject>(w.doubleClass),
+        static_cast<jobject>(w.booleanClass), static_cast<jobject>(w.dateClass)})
     if (ref) env->DeleteGlobalRef(ref);
 }
 
@@ -424,15 +426,9 @@ void RunOperation(benchmark::State& state, Operation operation)
 // Not pairs: the price of the JNI functions the frame calls around every Java call, so that a
 // ratio's excess can be read as a count of them.
 
-bool JustExceptionCheck(World& w, int)
-{
-  return !w.env->ExceptionCheck();
-}
+bool JustExceptionCheck(World& w, int) { return !w.env->ExceptionCheck(); }
 
-bool JustIsInstanceOf(World& w, int)
-{
-  return w.env->IsInstanceOf(w.instanceRef, w.integerClass) == JNI_FALSE;
-}
+bool JustIsInstanceOf(World& w, int) { return w.env->IsInstanceOf(w.instanceRef, w.integerClass) == JNI_FALSE; }
 
 bool JustGetJNIEnv(World& w, int)
 {
@@ -475,17 +471,16 @@ bool MakeFillReplica(FillReplica& f)
 {
   using T = VLXKDMAttributeType::Type;
   const auto single = [](T type) { return std::make_pair(type, false); };
-  return f.replica.Build(VLXUnicodeString("fill")) >= 0 &&
-         AddClass(f.replica, "Item",
-                  {{"code", single(VLXKDMAttributeType::Integer)},
-                   {"price", single(VLXKDMAttributeType::Double)},
-                   {"label", single(VLXKDMAttributeType::String)},
-                   {"created", single(VLXKDMAttributeType::Date)},
-                   {"active", single(VLXKDMAttributeType::Boolean)},
-                   {"payload", single(VLXKDMAttributeType::Binary)},
-                   {"quantity", single(VLXKDMAttributeType::Integer)},
-                   {"note", single(VLXKDMAttributeType::String)}},
-                  f.model);
+  return f.replica.Build(VLXUnicodeString("fill")) >= 0 && AddClass(f.replica, "Item",
+                                                                    {{"code", single(VLXKDMAttributeType::Integer)},
+                                                                     {"price", single(VLXKDMAttributeType::Double)},
+                                                                     {"label", single(VLXKDMAttributeType::String)},
+                                                                     {"created", single(VLXKDMAttributeType::Date)},
+                                                                     {"active", single(VLXKDMAttributeType::Boolean)},
+                                                                     {"payload", single(VLXKDMAttributeType::Binary)},
+                                                                     {"quantity", single(VLXKDMAttributeType::Integer)},
+                                                                     {"note", single(VLXKDMAttributeType::String)}},
+                                                                    f.model);
 }
 
 // The same instances as FillBaseline.fill, through the library, attributes by name.
@@ -549,8 +544,8 @@ bool HandFill(World& w, VLXKDMModel& model, int count)
     ok = ok && set(instance, price, env->CallStaticObjectMethod(w.doubleClass, w.doubleValueOf, i * 0.25));
     std::snprintf(text, sizeof text, "item-%d", i);
     ok = ok && set(instance, label, NewJavaString(env, VLXUnicodeString(text)));
-    ok = ok && set(instance, created,
-                   env->NewObject(w.dateClass, w.dateNew, static_cast<jlong>(kBaseSeconds + i) * 1000));
+    ok = ok &&
+         set(instance, created, env->NewObject(w.dateClass, w.dateNew, static_cast<jlong>(kBaseSeconds + i) * 1000));
     ok = ok && set(instance, active,
                    env->CallStaticObjectMethod(w.booleanClass, w.booleanValueOf, static_cast<jboolean>((i & 1) != 0)));
     for (int b = 0; b < 8; ++b) bytes[b] = static_cast<jbyte>(static_cast<unsigned>(i) >> (b * 4));
@@ -601,9 +596,12 @@ enum class FillBy { Library, HandJni, PureJava };
 bool Fill(World& w, FillBy by, VLXKDMModel& model, int count)
 {
   switch (by) {
-    case FillBy::Library: return LibraryFill(model, count);
-    case FillBy::HandJni: return HandFill(w, model, count);
-    case FillBy::PureJava: return JavaFill(w, model, count);
+    case FillBy::Library:
+      return LibraryFill(model, count);
+    case FillBy::HandJni:
+      return HandFill(w, model, count);
+    case FillBy::PureJava:
+      return JavaFill(w, model, count);
   }
   return false;
 }
@@ -626,7 +624,8 @@ bool FillsAgree(World& w, std::string& why)
     }
     for (int k = 0; k < count; ++k)
       if (texts[k] != reference[k])
-        return Fail(why, "the fills differ at instance " + std::to_string(k) + ":\n  " + reference[k] + "\n  " + texts[k]);
+        return Fail(why,
+                    "the fills differ at instance " + std::to_string(k) + ":\n  " + reference[k] + "\n  " + texts[k]);
   }
   return true;
 }
@@ -680,8 +679,8 @@ std::string JniCallsOf(World& w, Operation operation, int calls, bool& ok)
     if (!counts[f]) continue;
     total += counts[f];
     char item[64];
-    std::snprintf(item, sizeof item, "%s%s %.3g", text.empty() ? "" : ", ", JniFunctionName(static_cast<JniFunction>(f)),
-                  static_cast<double>(counts[f]) / calls);
+    std::snprintf(item, sizeof item, "%s%s %.3g", text.empty() ? "" : ", ",
+                  JniFunctionName(static_cast<JniFunction>(f)), static_cast<double>(counts[f]) / calls);
     text += item;
   }
   char sum[32];
@@ -704,15 +703,16 @@ void PrintSummary(const SummaryReporter& reporter, const std::map<std::string, A
 {
   std::printf("\n==== Corvexa: library against hand-written JNI (same process, same run) ====\n");
   std::printf("Times per call; \"cpu\" is the CPU time of the calling thread, \"real\" the wall-clock time.\n");
-  std::printf("The target applies to the cpu ratio for single operations (steadier on a shared machine) and\n"
-              "is shown against both.\n\n");
+  std::printf(
+      "The target applies to the cpu ratio for single operations (steadier on a shared machine) and\n"
+      "is shown against both.\n\n");
   std::printf("%-46s %10s %10s %10s %10s %10s %6s %6s %7s  %s\n", "operation", "lib cpu", "base cpu", "excess",
               "lib real", "base real", "cpu x", "real x", "target", "");
   int misses = 0;
   const auto row = [&](const char* what, const std::string& lib, const std::string& base, double target, bool byReal) {
     const SummaryReporter::Times l = reporter.Nanoseconds(lib), b = reporter.Nanoseconds(base);
-    const double ratio = byReal ? (l.real > 0 && b.real > 0 ? l.real / b.real : -1)
-                                : (l.cpu > 0 && b.cpu > 0 ? l.cpu / b.cpu : -1);
+    const double ratio =
+        byReal ? (l.real > 0 && b.real > 0 ? l.real / b.real : -1) : (l.cpu > 0 && b.cpu > 0 ? l.cpu / b.cpu : -1);
     std::string verdict;
     if (!reporter.Failure(lib).empty() || !reporter.Failure(base).empty())
       verdict = "FAILED: " + reporter.Failure(lib) + reporter.Failure(base);
@@ -723,9 +723,8 @@ void PrintSummary(const SummaryReporter& reporter, const std::map<std::string, A
     char targetText[16] = "-";
     if (target > 0) std::snprintf(targetText, sizeof targetText, "<=%.2f", target);
     std::printf("%-46s %10s %10s %10s %10s %10s %6s %6s %7s  %s\n", what, Figure(l.cpu).c_str(), Figure(b.cpu).c_str(),
-                Excess(l.cpu, b.cpu).c_str(), Figure(l.real).c_str(),
-                Figure(b.real).c_str(), Ratio(l.cpu, b.cpu).c_str(),
-                Ratio(l.real, b.real).c_str(), targetText, verdict.c_str());
+                Excess(l.cpu, b.cpu).c_str(), Figure(l.real).c_str(), Figure(b.real).c_str(),
+                Ratio(l.cpu, b.cpu).c_str(), Ratio(l.real, b.real).c_str(), targetText, verdict.c_str());
   };
   std::printf("  base: hand-written JNI\n");
   for (const Pair& pair : Pairs())

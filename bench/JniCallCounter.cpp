@@ -60,11 +60,11 @@ void GetStringRegion(JNIEnv* env, jstring string, jsize start, jsize length, jch
   gOriginal->GetStringRegion(env, string, start, length, units);
 }
 
-#define COUNTING_CALL(Name, Result, Target)                                        \
-  Result Name(JNIEnv* env, Target target, jmethodID method, va_list args)          \
-  {                                                                                \
-    ++gCounts[kCallMethod];                                                        \
-    return gOriginal->Name(env, target, method, args);                             \
+#define COUNTING_CALL(Name, Result, Target)                               \
+  Result Name(JNIEnv* env, Target target, jmethodID method, va_list args) \
+  {                                                                       \
+    ++gCounts[kCallMethod];                                               \
+    return gOriginal->Name(env, target, method, args);                    \
   }
 COUNTING_CALL(CallObjectMethodV, jobject, jobject)
 COUNTING_CALL(CallVoidMethodV, void, jobject)
@@ -114,9 +114,9 @@ void SetByteArrayRegion(JNIEnv* env, jbyteArray array, jsize start, jsize length
 const char* JniFunctionName(JniFunction function)
 {
   static const char* const names[kJniFunctionCount] = {
-      "ExceptionCheck", "IsInstanceOf",    "GetObjectClass",  "IsSameObject", "NewGlobalRef",
-      "DeleteGlobalRef", "DeleteLocalRef", "NewString",       "GetStringLength", "GetStringRegion",
-      "Call*Method/NewObject", "New*Array", "*ArrayRegion"};
+      "ExceptionCheck",        "IsInstanceOf",   "GetObjectClass", "IsSameObject",    "NewGlobalRef",
+      "DeleteGlobalRef",       "DeleteLocalRef", "NewString",      "GetStringLength", "GetStringRegion",
+      "Call*Method/NewObject", "New*Array",      "*ArrayRegion"};
   return names[function];
 }
 

@@ -21,9 +21,9 @@ enum JniFunction {
   kNewString,
   kGetStringLength,
   kGetStringRegion,
-  kCallMethod,  // every Call<Type>Method and CallStatic<Type>Method of the V form, and NewObjectV
-  kNewArray,    // NewIntArray, NewByteArray, NewObjectArray
-  kArrayRegion, // Set/Get<Type>ArrayRegion for int and byte
+  kCallMethod,   // every Call<Type>Method and CallStatic<Type>Method of the V form, and NewObjectV
+  kNewArray,     // NewIntArray, NewByteArray, NewObjectArray
+  kArrayRegion,  // Set/Get<Type>ArrayRegion for int and byte
   kJniFunctionCount
 };
 

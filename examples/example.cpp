@@ -125,12 +125,12 @@ struct SensorAttribute {
   bool multi;
 };
 const SensorAttribute kSensorAttributes[] = {
-    {"serial", VLXKDMAttributeType::Integer, false},   {"counts", VLXKDMAttributeType::Integer, true},
-    {"reading", VLXKDMAttributeType::Double, false},   {"history", VLXKDMAttributeType::Double, true},
-    {"label", VLXKDMAttributeType::String, false},     {"tags", VLXKDMAttributeType::String, true},
-    {"installed", VLXKDMAttributeType::Date, false},   {"serviced", VLXKDMAttributeType::Date, true},
-    {"active", VLXKDMAttributeType::Boolean, false},   {"flags", VLXKDMAttributeType::Boolean, true},
-    {"firmware", VLXKDMAttributeType::Binary, false},  {"blobs", VLXKDMAttributeType::Binary, true},
+    {"serial", VLXKDMAttributeType::Integer, false},    {"counts", VLXKDMAttributeType::Integer, true},
+    {"reading", VLXKDMAttributeType::Double, false},    {"history", VLXKDMAttributeType::Double, true},
+    {"label", VLXKDMAttributeType::String, false},      {"tags", VLXKDMAttributeType::String, true},
+    {"installed", VLXKDMAttributeType::Date, false},    {"serviced", VLXKDMAttributeType::Date, true},
+    {"active", VLXKDMAttributeType::Boolean, false},    {"flags", VLXKDMAttributeType::Boolean, true},
+    {"firmware", VLXKDMAttributeType::Binary, false},   {"blobs", VLXKDMAttributeType::Binary, true},
     {"next", VLXKDMAttributeType::Relationship, false}, {"peers", VLXKDMAttributeType::Relationship, true},
 };
 
@@ -158,10 +158,9 @@ bool BuildSchema(VLXKDMReplica& replica)
 
   VLXKDMModel model;
   VLXKDMModelSet models;
-  return Must("Build the class \"Sensor\" with 14 attributes in C++",
-              VLX_SUCCEEDED(model.Build(sensor)) && VLX_SUCCEEDED(replica.GetModels(models))
-                  ? models.Add(model)
-                  : VLX_E_FAIL);
+  return Must(
+      "Build the class \"Sensor\" with 14 attributes in C++",
+      VLX_SUCCEEDED(model.Build(sensor)) && VLX_SUCCEEDED(replica.GetModels(models)) ? models.Add(model) : VLX_E_FAIL);
 }
 
 bool SchemaBuiltInCpp(VLXKDMReplica& replica)
@@ -332,9 +331,8 @@ bool DataOfEveryType(VLXKDMReplica& replica)
   std::printf("\n4. Data of every type\n");
   VLXKDMModelSet models;
   VLXKDMModel model;
-  if (!Must("Reach the model of \"Sensor\"", VLX_SUCCEEDED(replica.GetModels(models))
-                                                  ? models.GetItem(VLXUnicodeString("Sensor"), model)
-                                                  : VLX_E_FAIL))
+  if (!Must("Reach the model of \"Sensor\"",
+            VLX_SUCCEEDED(replica.GetModels(models)) ? models.GetItem(VLXUnicodeString("Sensor"), model) : VLX_E_FAIL))
     return false;
   const int kSensors = 5;
   std::vector<VLXKDMInstance> sensors(kSensors);

@@ -35,7 +35,8 @@ TEST(BindingTable, EverySlotHoldsWhatItsRowNames)
   std::ifstream def(CORVEXA_BINDING_TABLE);
   ASSERT_TRUE(def) << CORVEXA_BINDING_TABLE;
   static const std::regex define("#define ([A-Z]+) \"([^\"]*)\"");
-  static const std::regex row("^(CLASS|METHOD|STATIC|SETTER_FIRST|CONSTANT|RESERVED)\\((\\w+)(?:, ([^,]+))?(?:, (.+))?\\)$");
+  static const std::regex row(
+      "^(CLASS|METHOD|STATIC|SETTER_FIRST|CONSTANT|RESERVED)\\((\\w+)(?:, ([^,]+))?(?:, (.+))?\\)$");
   std::map<std::string, std::string> prefixes;
   std::string line;
   int slot = 0;

@@ -66,12 +66,19 @@ TEST_F(FrameTest, AnObjectOfAnotherClassNeverEntersAProxy)
       {"SetHandle", [&] { return target.SetHandle(Env(), classDef.GetHandle()); }, kClassDef, kReplica},
       {"exchange", [&] { return target.BuildFromJavaType(Env(), string); }, "java.lang.String", kReplica},
       {"holder in", [&] { return target.BuildFromJavaHolder(Env(), replica.GetHandle()); }, kReplica, kHolder},
-      {"holder out", [&] { jobject h = string; return target.ConvertToJavaHolder(Env(), h); }, "java.lang.String", kHolder},
-      {"assignment through the base", [&] {
+      {"holder out",
+       [&] {
+         jobject h = string;
+         return target.ConvertToJavaHolder(Env(), h);
+       },
+       "java.lang.String", kHolder},
+      {"assignment through the base",
+       [&] {
          VLXKDMJavaObject& base = target;
          base = classDef;
          return VLX_E_INVALIDARG;
-       }, kClassDef, kReplica},
+       },
+       kClassDef, kReplica},
   };
   for (const Case& c : cases) {
     SCOPED_TRACE(c.what);

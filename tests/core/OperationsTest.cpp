@@ -212,7 +212,8 @@ const std::string& DocumentFile()
 {
   static const std::string path = [] {
     const std::string p = ::testing::TempDir() + "corvexa-operations-" + std::to_string(getpid()) + ".xml";
-    std::ofstream(p) << "<replica xmlns=\"urn:corvexa:replica:1\" format=\"1\" name=\"doc\"><Sample key=\"k1\"/></replica>";
+    std::ofstream(p)
+        << "<replica xmlns=\"urn:corvexa:replica:1\" format=\"1\" name=\"doc\"><Sample key=\"k1\"/></replica>";
     return p;
   }();
   return path;
@@ -225,10 +226,30 @@ struct Operation {
   bool needsProxy;     // false: a Build, static or exchange operation, which runs on no built proxy
 };
 
-#define OP(name, landed, ...) {name, [](World& w, Outs& o) -> long { (void)w, (void)o; return __VA_ARGS__; }, landed, true}
-#define FREE(name, landed, ...) {name, [](World& w, Outs& o) -> long { (void)w, (void)o; return __VA_ARGS__; }, landed, false}
+#define OP(name, landed, ...)           \
+  {                                     \
+    name,                               \
+        [](World& w, Outs& o) -> long { \
+          (void)w, (void)o;             \
+          return __VA_ARGS__;           \
+        },                              \
+        landed, true                    \
+  }
+#define FREE(name, landed, ...)         \
+  {                                     \
+    name,                               \
+        [](World& w, Outs& o) -> long { \
+          (void)w, (void)o;             \
+          return __VA_ARGS__;           \
+        },                              \
+        landed, false                   \
+  }
 // b runs only when a succeeded.
-#define THEN(a, b) [&] { const long rc = (a); return rc < 0 ? rc : (b); }()
+#define THEN(a, b)            \
+  [&] {                       \
+    const long rc = (a);      \
+    return rc < 0 ? rc : (b); \
+  }()
 #define INST "VLXKDMInstance::"
 #define LIST_NAMED(T) INST "SetValue(const VLXUnicodeString&, const VLXListOf" T "&)"
 #define LIST_AT(T) INST "SetValue(int, const VLXListOf" T "&)"
@@ -253,7 +274,8 @@ const Operation kOperations[] = {
        w.replica.GetAttributeDef(U("Sample.double"), o.attribute)),
     FREE("VLXKDMReplica::SetSchemaLocation(const VLXUnicodeString&)", "", VLXKDMReplica::SetSchemaLocation(U(""))),
     OP("VLXKDMReplica::GetSchemaLocation(VLXUnicodeString&)", "text", w.replica.GetSchemaLocation(o.text)),
-    FREE("VLXKDMReplica::SetFeature(const VLXUnicodeString&, VLXBoolean)", "", VLXKDMReplica::SetFeature(U("indent"), 1)),
+    FREE("VLXKDMReplica::SetFeature(const VLXUnicodeString&, VLXBoolean)", "",
+         VLXKDMReplica::SetFeature(U("indent"), 1)),
     OP("VLXKDMReplica::InsertSchemaFile(const VLXUnicodeString&)", "classDef",
        THEN(w.replica.InsertSchemaFile(U(kExamples + "/inventory.xsd")), w.replica.GetClassDef(U("Bolt"), o.classDef))),
     OP("VLXKDMReplica::InsertSchemaString(const VLXUnicodeString&)", "classDef",
@@ -302,11 +324,13 @@ const Operation kOperations[] = {
        THEN(w.classDef.SetQKADerivability(U("derived")), w.classDef.GetQKADerivability(o.text))),
     OP("VLXKDMClassDef::GetScopeNames(VLXListOfVLXUnicodeString&)", "texts", w.classDef.GetScopeNames(o.texts)),
     OP("VLXKDMClassDef::SetScopeNames(const VLXListOfVLXUnicodeString&)", "texts=a,b",
-       THEN(w.classDef.SetScopeNames(ListOf<VLXListOfVLXUnicodeString>({U("a"), U("b")})), w.classDef.GetScopeNames(o.texts))),
+       THEN(w.classDef.SetScopeNames(ListOf<VLXListOfVLXUnicodeString>({U("a"), U("b")})),
+            w.classDef.GetScopeNames(o.texts))),
     OP("VLXKDMClassDef::SetScopeNames(const VLXListOfVLXUnicodeString&)", "texts=a,b",
        THEN(w.classDef.SetScopeNames(2, "a", "b"), w.classDef.GetScopeNames(o.texts))),
     OP("VLXKDMClassDef::IsAbstract(VLXBoolean&)", "flag=0", w.classDef.IsAbstract(o.flag)),
-    OP("VLXKDMClassDef::SetAbstract(VLXBoolean)", "flag=1", THEN(w.classDef.SetAbstract(2), w.classDef.IsAbstract(o.flag))),
+    OP("VLXKDMClassDef::SetAbstract(VLXBoolean)", "flag=1",
+       THEN(w.classDef.SetAbstract(2), w.classDef.IsAbstract(o.flag))),
     OP("VLXKDMClassDef::IsExtensible(VLXBoolean&)", "flag", w.classDef.IsExtensible(o.flag)),
     OP("VLXKDMClassDef::SetExtensibility(VLXBoolean)", "flag=0",
        THEN(w.classDef.SetExtensibility(0), w.classDef.IsExtensible(o.flag))),
@@ -315,7 +339,8 @@ const Operation kOperations[] = {
        THEN(w.classDef.SetPersistency(0), w.classDef.IsPersistent(o.flag))),
     OP("VLXKDMClassDef::GetClassType(VLXKDMClassType::Type&)", "classType=1", w.classDef.GetClassType(o.classType)),
     OP("VLXKDMClassDef::SetClassType(VLXKDMClassType::Type)", "number=0",
-       THEN(w.classDef.SetClassType(VLXKDMClassType::Class), AsNumber(w.classDef, &VLXKDMClassDef::GetClassType, o.number))),
+       THEN(w.classDef.SetClassType(VLXKDMClassType::Class),
+            AsNumber(w.classDef, &VLXKDMClassDef::GetClassType, o.number))),
     OP("VLXKDMClassDef::GetSoftwareVisibility(VLXKDMVisibility::Mode&)", "visibility=1",
        w.classDef.GetSoftwareVisibility(o.visibility)),
     OP("VLXKDMClassDef::SetSoftwareVisibility(VLXKDMVisibility::Mode)", "number=2",
@@ -328,7 +353,8 @@ const Operation kOperations[] = {
     FREE("VLXKDMAttributeDef::Build(const VLXUnicodeString&, VLXKDMAttributeType::Type)", "type=4 attribute",
          THEN(o.attribute.Build(U("made"), VLXKDMAttributeType::Boolean), o.attribute.GetAttributeType(o.type))),
     OP("VLXKDMAttributeDef::GetAttributeName(VLXUnicodeString&)", "text=double", w.attribute.GetAttributeName(o.text)),
-    OP("VLXKDMAttributeDef::GetAttributeType(VLXKDMAttributeType::Type&)", "type=1", w.attribute.GetAttributeType(o.type)),
+    OP("VLXKDMAttributeDef::GetAttributeType(VLXKDMAttributeType::Type&)", "type=1",
+       w.attribute.GetAttributeType(o.type)),
     OP("VLXKDMAttributeDef::GetUuid(VLXUnicodeString&)", "text", w.attribute.GetUuid(o.text)),
     OP("VLXKDMAttributeDef::SetUuid(const VLXUnicodeString&)", "text=u-2",
        THEN(w.attribute.SetUuid(U("u-2")), w.attribute.GetUuid(o.text))),
@@ -337,12 +363,14 @@ const Operation kOperations[] = {
        THEN(w.attribute.SetQKAComment(U("noted")), w.attribute.GetQKAComment(o.text))),
     OP("VLXKDMAttributeDef::GetTargetNames(VLXListOfVLXUnicodeString&)", "texts", w.attribute.GetTargetNames(o.texts)),
     OP("VLXKDMAttributeDef::SetTargetNames(const VLXListOfVLXUnicodeString&)", "texts=P",
-       THEN(w.attribute.SetTargetNames(ListOf<VLXListOfVLXUnicodeString>({U("P")})), w.attribute.GetTargetNames(o.texts))),
+       THEN(w.attribute.SetTargetNames(ListOf<VLXListOfVLXUnicodeString>({U("P")})),
+            w.attribute.GetTargetNames(o.texts))),
     OP("VLXKDMAttributeDef::SetTargetNames(const VLXListOfVLXUnicodeString&)", "texts=P,Q",
        THEN(w.attribute.SetTargetNames(2, "P", "Q"), w.attribute.GetTargetNames(o.texts))),
     OP("VLXKDMAttributeDef::GetTargetRefs(VLXListOfVLXUnicodeString&)", "texts", w.attribute.GetTargetRefs(o.texts)),
     OP("VLXKDMAttributeDef::SetTargetRefs(const VLXListOfVLXUnicodeString&)", "texts=r",
-       THEN(w.attribute.SetTargetRefs(ListOf<VLXListOfVLXUnicodeString>({U("r")})), w.attribute.GetTargetRefs(o.texts))),
+       THEN(w.attribute.SetTargetRefs(ListOf<VLXListOfVLXUnicodeString>({U("r")})),
+            w.attribute.GetTargetRefs(o.texts))),
     OP("VLXKDMAttributeDef::SetTargetRefs(const VLXListOfVLXUnicodeString&)", "texts=r,s,t",
        THEN(w.attribute.SetTargetRefs(3, "r", "s", "t"), w.attribute.GetTargetRefs(o.texts))),
     OP("VLXKDMAttributeDef::GetAggregationType(VLXKDMAggregationType::Type&)", "aggregation=1",
@@ -352,14 +380,16 @@ const Operation kOperations[] = {
             AsNumber(w.attribute, &VLXKDMAttributeDef::GetAggregationType, o.number))),
     OP("VLXKDMAttributeDef::GetAccessMode(VLXKDMAccessMode::Mode&)", "access=1", w.attribute.GetAccessMode(o.access)),
     OP("VLXKDMAttributeDef::SetAccessMode(VLXKDMAccessMode::Mode)", "number=0",
-       THEN(w.attribute.SetAccessMode(VLXKDMAccessMode::Read), AsNumber(w.attribute, &VLXKDMAttributeDef::GetAccessMode, o.number))),
+       THEN(w.attribute.SetAccessMode(VLXKDMAccessMode::Read),
+            AsNumber(w.attribute, &VLXKDMAttributeDef::GetAccessMode, o.number))),
     OP("VLXKDMAttributeDef::GetSoftwareVisibility(VLXKDMVisibility::Mode&)", "visibility=2",
        w.attribute.GetSoftwareVisibility(o.visibility)),
     OP("VLXKDMAttributeDef::SetSoftwareVisibility(VLXKDMVisibility::Mode)", "number=1",
        THEN(w.attribute.SetSoftwareVisibility(VLXKDMVisibility::Protected),
             AsNumber(w.attribute, &VLXKDMAttributeDef::GetSoftwareVisibility, o.number))),
     OP("VLXKDMAttributeDef::GetLength(int&)", "number=12", w.attribute.GetLength(o.number)),
-    OP("VLXKDMAttributeDef::SetLength(int)", "number=-3", THEN(w.attribute.SetLength(-3), w.attribute.GetLength(o.number))),
+    OP("VLXKDMAttributeDef::SetLength(int)", "number=-3",
+       THEN(w.attribute.SetLength(-3), w.attribute.GetLength(o.number))),
     OP("VLXKDMAttributeDef::IsMandatory(VLXBoolean&)", "flag=0", w.attribute.IsMandatory(o.flag)),
     OP("VLXKDMAttributeDef::SetMandatory(VLXBoolean)", "flag=1",
        THEN(w.attribute.SetMandatory(128), w.attribute.IsMandatory(o.flag))),
@@ -367,7 +397,8 @@ const Operation kOperations[] = {
     OP("VLXKDMAttributeDef::SetMultiValuation(VLXBoolean)", "flag=1",
        THEN(w.attribute.SetMultiValuation(255), w.attribute.IsMultiValuated(o.flag))),
     OP("VLXKDMAttributeDef::IsUnique(VLXBoolean&)", "flag=0", w.attribute.IsUnique(o.flag)),
-    OP("VLXKDMAttributeDef::SetUnicity(VLXBoolean)", "flag=1", THEN(w.attribute.SetUnicity(3), w.attribute.IsUnique(o.flag))),
+    OP("VLXKDMAttributeDef::SetUnicity(VLXBoolean)", "flag=1",
+       THEN(w.attribute.SetUnicity(3), w.attribute.IsUnique(o.flag))),
     OP("VLXKDMAttributeDef::GetClassDef(VLXKDMClassDef&)", "classDef", w.attribute.GetClassDef(o.classDef)),
     OP("VLXKDMAttributeDef::ToString(VLXUnicodeString&)", "text", w.attribute.ToString(o.text)),
 
@@ -389,7 +420,8 @@ const Operation kOperations[] = {
        THEN(w.attributes.Remove(w.attribute), w.attributes.GetCount(o.number))),
     OP("VLXKDMAttributeDefList::Remove(const VLXUnicodeString&)", "number=13",
        THEN(w.attributes.Remove(U("double")), w.attributes.GetCount(o.number))),
-    OP("VLXKDMAttributeDefList::Remove(int)", "number=13", THEN(w.attributes.Remove(3), w.attributes.GetCount(o.number))),
+    OP("VLXKDMAttributeDefList::Remove(int)", "number=13",
+       THEN(w.attributes.Remove(3), w.attributes.GetCount(o.number))),
 
     // ---- VLXKDMModel
     FREE("VLXKDMModel::Build(const VLXKDMClassDef&)", "model", o.model.Build(w.classDef)),
@@ -405,11 +437,14 @@ const Operation kOperations[] = {
     // ---- VLXKDMModelSet (the one model of Sample)
     OP("VLXKDMModelSet::GetCount(int&)", "number=1", w.models.GetCount(o.number)),
     OP("VLXKDMModelSet::GetItem(int, VLXKDMModel&)", "model", w.models.GetItem(0, o.model)),
-    OP("VLXKDMModelSet::GetItem(const VLXUnicodeString&, VLXKDMModel&)", "model", w.models.GetItem(U("Sample"), o.model)),
-    OP("VLXKDMModelSet::Includes(const VLXUnicodeString&, VLXBoolean&)", "flag=1", w.models.Includes(U("Sample"), o.flag)),
+    OP("VLXKDMModelSet::GetItem(const VLXUnicodeString&, VLXKDMModel&)", "model",
+       w.models.GetItem(U("Sample"), o.model)),
+    OP("VLXKDMModelSet::Includes(const VLXUnicodeString&, VLXBoolean&)", "flag=1",
+       w.models.Includes(U("Sample"), o.flag)),
     OP("VLXKDMModelSet::IndexOf(const VLXKDMClassDef&, int&)", "number=0", w.models.IndexOf(w.classDef, o.number)),
     OP("VLXKDMModelSet::IndexOf(const VLXUnicodeString&, int&)", "number=-1", w.models.IndexOf(U("Absent"), o.number)),
-    OP("VLXKDMModelSet::Add(const VLXKDMModel&)", "number=2", THEN(w.models.Add(w.freeModel), w.models.GetCount(o.number))),
+    OP("VLXKDMModelSet::Add(const VLXKDMModel&)", "number=2",
+       THEN(w.models.Add(w.freeModel), w.models.GetCount(o.number))),
     OP("VLXKDMModelSet::Remove(const VLXKDMClassDef&)", "number=0",
        THEN(w.models.Remove(w.classDef), w.models.GetCount(o.number))),
     OP("VLXKDMModelSet::Remove(const VLXUnicodeString&)", "number=0",
@@ -442,7 +477,8 @@ const Operation kOperations[] = {
     OP(INST "ClearValue(const VLXUnicodeString&)", "flag=0",
        THEN(w.instance.ClearValue(U("integer")), w.instance.IsValuated(0, o.flag))),
     OP(INST "ClearValue(int)", "flag=0", THEN(w.instance.ClearValue(0), w.instance.IsValuated(0, o.flag))),
-    OP(INST "GetValue(const VLXUnicodeString&, VLXKDMInstanceValue&)", "value=0:42+", w.instance.GetValue(U("integer"), o.value)),
+    OP(INST "GetValue(const VLXUnicodeString&, VLXKDMInstanceValue&)", "value=0:42+",
+       w.instance.GetValue(U("integer"), o.value)),
     OP(INST "GetValue(int, VLXKDMInstanceValue&)", "value=0:42+", w.instance.GetValue(0, o.value)),
     OP(INST "SetValue(const VLXUnicodeString&, VLXKDMInstanceValue&)", "value=0:5+",
        THEN(w.instance.SetValue(U("integer"), o.value), w.instance.GetValue(0, o.value))),
@@ -460,22 +496,26 @@ const Operation kOperations[] = {
        THEN(w.instance.SetValue(2, U("s")), w.instance.GetValue(2, o.value))),
     OP(INST "SetValue(const VLXUnicodeString&, const VLXTime&)", "value=3+",
        THEN(w.instance.SetValue(U("date"), kMinute), w.instance.GetValue(3, o.value))),
-    OP(INST "SetValue(int, const VLXTime&)", "value=3+", THEN(w.instance.SetValue(3, kMinute), w.instance.GetValue(3, o.value))),
+    OP(INST "SetValue(int, const VLXTime&)", "value=3+",
+       THEN(w.instance.SetValue(3, kMinute), w.instance.GetValue(3, o.value))),
     OP(INST "SetValue(const VLXUnicodeString&, VLXBoolean)", "value=4+",
        THEN(w.instance.SetValue(U("boolean"), VLXBoolean(1)), w.instance.GetValue(4, o.value))),
     OP(INST "SetValue(int, VLXBoolean)", "value=4+",
        THEN(w.instance.SetValue(4, VLXBoolean(1)), w.instance.GetValue(4, o.value))),
     OP(INST "SetValue(const VLXUnicodeString&, const VLXBinary&)", "value=5+",
        THEN(w.instance.SetValue(U("binary"), kAb), w.instance.GetValue(5, o.value))),
-    OP(INST "SetValue(int, const VLXBinary&)", "value=5+", THEN(w.instance.SetValue(5, kAb), w.instance.GetValue(5, o.value))),
+    OP(INST "SetValue(int, const VLXBinary&)", "value=5+",
+       THEN(w.instance.SetValue(5, kAb), w.instance.GetValue(5, o.value))),
     OP(INST "SetValue(const VLXUnicodeString&, const VLXKDMInstance&)", "value=6+",
        THEN(w.instance.SetValue(U("instance"), w.target), w.instance.GetValue(6, o.value))),
     OP(INST "SetValue(int, const VLXKDMInstance&)", "value=6+",
        THEN(w.instance.SetValue(6, w.target), w.instance.GetValue(6, o.value))),
     OP(LIST_NAMED("Int"), "value=0L+",
        THEN(w.instance.SetValue(U("integers"), ListOf<VLXRawCollint>({1, 2})), w.instance.GetValue(7, o.value))),
-    OP(LIST_AT("Int"), "value=0L+", THEN(w.instance.SetValue(7, ListOf<VLXRawCollint>({1})), w.instance.GetValue(7, o.value))),
-    OP(LIST_NAMED("Int"), "value=0L+", THEN(w.instance.SetValueIntegers(U("integers"), 2, 1, 2), w.instance.GetValue(7, o.value))),
+    OP(LIST_AT("Int"), "value=0L+",
+       THEN(w.instance.SetValue(7, ListOf<VLXRawCollint>({1})), w.instance.GetValue(7, o.value))),
+    OP(LIST_NAMED("Int"), "value=0L+",
+       THEN(w.instance.SetValueIntegers(U("integers"), 2, 1, 2), w.instance.GetValue(7, o.value))),
     OP(LIST_AT("Int"), "value=0L+", THEN(w.instance.SetValueIntegers(7, 1, 3), w.instance.GetValue(7, o.value))),
     OP(LIST_NAMED("Double"), "value=1L+",
        THEN(w.instance.SetValue(U("doubles"), ListOf<VLXRawColldouble>({0.5})), w.instance.GetValue(8, o.value))),
@@ -483,37 +523,45 @@ const Operation kOperations[] = {
        THEN(w.instance.SetValue(8, ListOf<VLXRawColldouble>({0.5})), w.instance.GetValue(8, o.value))),
     OP(LIST_NAMED("Double"), "value=1L+",
        THEN(w.instance.SetValueDoubles(U("doubles"), 1, 0.5), w.instance.GetValue(8, o.value))),
-    OP(LIST_AT("Double"), "value=1L+", THEN(w.instance.SetValueDoubles(8, 2, 0.5, 1.5), w.instance.GetValue(8, o.value))),
+    OP(LIST_AT("Double"), "value=1L+",
+       THEN(w.instance.SetValueDoubles(8, 2, 0.5, 1.5), w.instance.GetValue(8, o.value))),
     OP(LIST_NAMED("VLXUnicodeString"), "value=2L+",
-       THEN(w.instance.SetValue(U("strings"), ListOf<VLXListOfVLXUnicodeString>({U("a")})), w.instance.GetValue(9, o.value))),
+       THEN(w.instance.SetValue(U("strings"), ListOf<VLXListOfVLXUnicodeString>({U("a")})),
+            w.instance.GetValue(9, o.value))),
     OP(LIST_AT("VLXUnicodeString"), "value=2L+",
        THEN(w.instance.SetValue(9, ListOf<VLXListOfVLXUnicodeString>({U("a")})), w.instance.GetValue(9, o.value))),
     OP(LIST_NAMED("VLXUnicodeString"), "value=2L+",
        THEN(w.instance.SetValueStrings(U("strings"), 1, "a"), w.instance.GetValue(9, o.value))),
-    OP(LIST_AT("VLXUnicodeString"), "value=2L+", THEN(w.instance.SetValueStrings(9, 0), w.instance.GetValue(9, o.value))),
+    OP(LIST_AT("VLXUnicodeString"), "value=2L+",
+       THEN(w.instance.SetValueStrings(9, 0), w.instance.GetValue(9, o.value))),
     OP(LIST_NAMED("VLXTime"), "value=3L+",
        THEN(w.instance.SetValue(U("dates"), ListOf<VLXListValVLXTime>({kMinute})), w.instance.GetValue(10, o.value))),
     OP(LIST_AT("VLXTime"), "value=3L+",
        THEN(w.instance.SetValue(10, ListOf<VLXListValVLXTime>({kMinute})), w.instance.GetValue(10, o.value))),
     OP(LIST_NAMED("VLXTime"), "value=3L+",
        THEN(w.instance.SetValueDates(U("dates"), 1, &kMinute), w.instance.GetValue(10, o.value))),
-    OP(LIST_AT("VLXTime"), "value=3L+", THEN(w.instance.SetValueDates(10, 1, &kMinute), w.instance.GetValue(10, o.value))),
+    OP(LIST_AT("VLXTime"), "value=3L+",
+       THEN(w.instance.SetValueDates(10, 1, &kMinute), w.instance.GetValue(10, o.value))),
     OP(LIST_NAMED("VLXBoolean"), "value=4L+",
-       THEN(w.instance.SetValue(U("booleans"), ListOf<VLXListValVLXBoolean>({VLXBoolean(1)})), w.instance.GetValue(11, o.value))),
+       THEN(w.instance.SetValue(U("booleans"), ListOf<VLXListValVLXBoolean>({VLXBoolean(1)})),
+            w.instance.GetValue(11, o.value))),
     OP(LIST_AT("VLXBoolean"), "value=4L+",
        THEN(w.instance.SetValue(11, ListOf<VLXListValVLXBoolean>({VLXBoolean(0)})), w.instance.GetValue(11, o.value))),
     OP(LIST_NAMED("VLXBoolean"), "value=4L+",
        THEN(w.instance.SetValueBooleans(U("booleans"), 2, 1, 0), w.instance.GetValue(11, o.value))),
-    OP(LIST_AT("VLXBoolean"), "value=4L+", THEN(w.instance.SetValueBooleans(11, 1, 1), w.instance.GetValue(11, o.value))),
+    OP(LIST_AT("VLXBoolean"), "value=4L+",
+       THEN(w.instance.SetValueBooleans(11, 1, 1), w.instance.GetValue(11, o.value))),
     OP(LIST_NAMED("VLXBinary"), "value=5L+",
        THEN(w.instance.SetValue(U("binaries"), ListOf<VLXListValVLXBinary>({kAb})), w.instance.GetValue(12, o.value))),
     OP(LIST_AT("VLXBinary"), "value=5L+",
        THEN(w.instance.SetValue(12, ListOf<VLXListValVLXBinary>({kAb})), w.instance.GetValue(12, o.value))),
     OP(LIST_NAMED("VLXBinary"), "value=5L+",
        THEN(w.instance.SetValueBinaries(U("binaries"), 1, &kAb), w.instance.GetValue(12, o.value))),
-    OP(LIST_AT("VLXBinary"), "value=5L+", THEN(w.instance.SetValueBinaries(12, 1, &kAb), w.instance.GetValue(12, o.value))),
+    OP(LIST_AT("VLXBinary"), "value=5L+",
+       THEN(w.instance.SetValueBinaries(12, 1, &kAb), w.instance.GetValue(12, o.value))),
     OP(LIST_NAMED("VLXKDMInstance"), "value=6L+",
-       THEN(w.instance.SetValue(U("instances"), ListOf<VLXListValVLXKDMInstance>({w.target})), w.instance.GetValue(13, o.value))),
+       THEN(w.instance.SetValue(U("instances"), ListOf<VLXListValVLXKDMInstance>({w.target})),
+            w.instance.GetValue(13, o.value))),
     OP(LIST_AT("VLXKDMInstance"), "value=6L+",
        THEN(w.instance.SetValue(13, ListOf<VLXListValVLXKDMInstance>({w.target})), w.instance.GetValue(13, o.value))),
     OP(LIST_NAMED("VLXKDMInstance"), "value=6L+",

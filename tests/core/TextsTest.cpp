@@ -15,11 +15,11 @@ TEST(Strings, NamesSurviveARoundTripByteForByte)
 {
   const std::string samples[] = {
       "plain",
-      "Zo\xC3\xAB \xC3\x85ngstr\xC3\xB6m, na\xC3\xAFve caf\xC3\xA9",            // Latin accents
-      "\xE6\x95\xB0\xE6\x8D\xAE\xE5\x89\xAF\xE6\x9C\xAC",                        // CJK
-      "fox \xF0\x9F\xA6\x8A rocket \xF0\x9F\x9A\x80",                            // outside the BMP
-      std::string("nul\0inside\0", 12),                                          // embedded NUL
-      "\xEF\xBF\xBF edge \xF4\x8F\xBF\xBF",                                      // U+FFFF, U+10FFFF
+      "Zo\xC3\xAB \xC3\x85ngstr\xC3\xB6m, na\xC3\xAFve caf\xC3\xA9",  // Latin accents
+      "\xE6\x95\xB0\xE6\x8D\xAE\xE5\x89\xAF\xE6\x9C\xAC",             // CJK
+      "fox \xF0\x9F\xA6\x8A rocket \xF0\x9F\x9A\x80",                 // outside the BMP
+      std::string("nul\0inside\0", 12),                               // embedded NUL
+      "\xEF\xBF\xBF edge \xF4\x8F\xBF\xBF",                           // U+FFFF, U+10FFFF
       "",
       std::string(70000, 'x'),
   };
@@ -38,8 +38,8 @@ TEST(Strings, MalformedUtf8GivesTheRawCodeOrTheTranslatedOneAsEachOperationSays)
 {
   VLXKDMReplica replica;
   ASSERT_EQ(VLX_S_OK, replica.Build(VLXUnicodeString("kept")));
-  const char* const malformed[] = {"bad \xC3\x28 byte", "\xED\xA0\x80 surrogate", "\xC0\xAF overlong",
-                                   "cut \xE6\x95", "\xF5\x80\x80\x80 too big"};
+  const char* const malformed[] = {"bad \xC3\x28 byte", "\xED\xA0\x80 surrogate", "\xC0\xAF overlong", "cut \xE6\x95",
+                                   "\xF5\x80\x80\x80 too big"};
   for (const char* text : malformed) {
     SCOPED_TRACE(text);
     ClearLastError();
@@ -98,7 +98,8 @@ TEST(Strings, AMalformedTextArgumentGivesEachOperationsOwnCode)
       {"Instance::ClearValue", VLX_E_FAIL, [&] { return instance.ClearValue(bad); }},
       {"Instance::SetID", VLX_E_FAIL, [&] { return instance.SetID(bad); }},
       {"Instance::SetValue(name, int)", VLX_E_FAIL, [&] { return instance.SetValue(bad, 5); }},
-      {"Instance::SetValue(name, text)", VLX_E_FAIL, [&] { return instance.SetValue(VLXUnicodeString("string"), bad); }},
+      {"Instance::SetValue(name, text)", VLX_E_FAIL,
+       [&] { return instance.SetValue(VLXUnicodeString("string"), bad); }},
       // The holder gets its Java form before the name is converted.
       {"Instance::SetValue(name, holder)", VLX_E_FAIL, [&] { return instance.SetValue(bad, holder); }},
   };

@@ -65,7 +65,9 @@ TEST(ValueThreads, WritersOnTheirOwnModelsAndReadersOfASharedOneKeepEveryValue)
     ASSERT_EQ(VLX_S_OK, shared[static_cast<size_t>(j)].SetValue(3, Seconds(j)));
   }
   // What writer w leaves in its instance j in round r.
-  auto text = [](int w, int j, int r) { return "w" + std::to_string(w) + "-" + std::to_string(j) + "-" + std::to_string(r); };
+  auto text = [](int w, int j, int r) {
+    return "w" + std::to_string(w) + "-" + std::to_string(j) + "-" + std::to_string(r);
+  };
   const long globals = GlobalRefCount();
   std::atomic<int> failures{0};
   std::vector<std::thread> threads;
@@ -119,7 +121,6 @@ TEST(ValueThreads, WritersOnTheirOwnModelsAndReadersOfASharedOneKeepEveryValue)
 }
 
 }  // namespace
-
 
 // An application may detach a thread that the library attached, or detach it and attach it again
 // itself: the next call on that thread works, and the library never detaches an attachment that is

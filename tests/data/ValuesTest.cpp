@@ -37,20 +37,45 @@ TEST(VariadicSetters, SendWhatTheListSettersSendAndRefuseANegativeCount)
     int position;
     F variadic, list;
   } cases[] = {
-      {12, [&](int p, int k, bool n) { return at(p, n, [&](auto x) { return in.SetValueBinaries(x, k, &b1, &b2, &b3); }); },
-       [&](int p, int k, bool) { return in.SetValue(p, first(ListOf<VLXListValVLXBinary>({b1, b2, b3}), k)); }},
+      {12,
+       [&](int p, int k, bool n) { return at(p, n, [&](auto x) { return in.SetValueBinaries(x, k, &b1, &b2, &b3); }); },
+       [&](int p, int k, bool) {
+         return in.SetValue(p, first(ListOf<VLXListValVLXBinary>({b1, b2, b3}), k));
+       }},
       {11, [&](int p, int k, bool n) { return at(p, n, [&](auto x) { return in.SetValueBooleans(x, k, 1, 256, 1); }); },
-       [&](int p, int k, bool) { return in.SetValue(p, first(ListOf<VLXListValVLXBoolean>({VLXBoolean(1), VLXBoolean(1), VLXBoolean(1)}), k)); }},
-      {10, [&](int p, int k, bool n) { return at(p, n, [&](auto x) { return in.SetValueDates(x, k, &d1, &d2, &d3); }); },
-       [&](int p, int k, bool) { return in.SetValue(p, first(ListOf<VLXListValVLXTime>({d1, d2, d3}), k)); }},
-      {8, [&](int p, int k, bool n) { return at(p, n, [&](auto x) { return in.SetValueDoubles(x, k, 0.5, -2.0, 1e300); }); },
-       [&](int p, int k, bool) { return in.SetValue(p, first(ListOf<VLXRawColldouble>({0.5, -2.0, 1e300}), k)); }},
-      {13, [&](int p, int k, bool n) { return at(p, n, [&](auto x) { return in.SetValueInstances(x, k, &t1, &t2, &t1); }); },
-       [&](int p, int k, bool) { return in.SetValue(p, first(ListOf<VLXListValVLXKDMInstance>({t1, t2, t1}), k)); }},
+       [&](int p, int k, bool) {
+         return in.SetValue(p, first(ListOf<VLXListValVLXBoolean>({VLXBoolean(1), VLXBoolean(1), VLXBoolean(1)}), k));
+       }},
+      {10,
+       [&](int p, int k, bool n) { return at(p, n, [&](auto x) { return in.SetValueDates(x, k, &d1, &d2, &d3); }); },
+       [&](int p, int k, bool) {
+         return in.SetValue(p, first(ListOf<VLXListValVLXTime>({d1, d2, d3}), k));
+       }},
+      {8,
+       [&](int p, int k, bool n) {
+         return at(p, n, [&](auto x) { return in.SetValueDoubles(x, k, 0.5, -2.0, 1e300); });
+       },
+       [&](int p, int k, bool) {
+         return in.SetValue(p, first(ListOf<VLXRawColldouble>({0.5, -2.0, 1e300}), k));
+       }},
+      {13,
+       [&](int p, int k, bool n) {
+         return at(p, n, [&](auto x) { return in.SetValueInstances(x, k, &t1, &t2, &t1); });
+       },
+       [&](int p, int k, bool) {
+         return in.SetValue(p, first(ListOf<VLXListValVLXKDMInstance>({t1, t2, t1}), k));
+       }},
       {7, [&](int p, int k, bool n) { return at(p, n, [&](auto x) { return in.SetValueIntegers(x, k, 1, 2, 3); }); },
-       [&](int p, int k, bool) { return in.SetValue(p, first(ListOf<VLXRawCollint>({1, 2, 3}), k)); }},
-      {9, [&](int p, int k, bool n) { return at(p, n, [&](auto x) { return in.SetValueStrings(x, k, "a", "\xC3\xA9", ""); }); },
-       [&](int p, int k, bool) { return in.SetValue(p, first(ListOf<VLXListValVLXUnicodeString>({a, acute, e}), k)); }},
+       [&](int p, int k, bool) {
+         return in.SetValue(p, first(ListOf<VLXRawCollint>({1, 2, 3}), k));
+       }},
+      {9,
+       [&](int p, int k, bool n) {
+         return at(p, n, [&](auto x) { return in.SetValueStrings(x, k, "a", "\xC3\xA9", ""); });
+       },
+       [&](int p, int k, bool) {
+         return in.SetValue(p, first(ListOf<VLXListValVLXUnicodeString>({a, acute, e}), k));
+       }},
   };
   auto read = [&in](int position) {
     VLXKDMInstanceValue value;
@@ -60,13 +85,20 @@ TEST(VariadicSetters, SendWhatTheListSettersSendAndRefuseANegativeCount)
   auto same = [](VLXKDMInstanceValue& x, VLXKDMInstanceValue& y) {
     if (x.GetType() != y.GetType() || !x.IsMultiValuated() || !y.IsMultiValuated()) return false;
     switch (x.GetType()) {
-      case VLXKDMInstanceValue::IntegerType: return (x.GetListOfInteger() == y.GetListOfInteger()) != 0;
-      case VLXKDMInstanceValue::DoubleType: return (x.GetListOfDouble() == y.GetListOfDouble()) != 0;
-      case VLXKDMInstanceValue::StringType: return (x.GetListOfString() == y.GetListOfString()) != 0;
-      case VLXKDMInstanceValue::DateType: return (x.GetListOfDate() == y.GetListOfDate()) != 0;
-      case VLXKDMInstanceValue::BooleanType: return (x.GetListOfBoolean() == y.GetListOfBoolean()) != 0;
-      case VLXKDMInstanceValue::BinaryType: return (x.GetListOfBinary() == y.GetListOfBinary()) != 0;
-      case VLXKDMInstanceValue::InstanceType: return (x.GetListOfInstance() == y.GetListOfInstance()) != 0;
+      case VLXKDMInstanceValue::IntegerType:
+        return (x.GetListOfInteger() == y.GetListOfInteger()) != 0;
+      case VLXKDMInstanceValue::DoubleType:
+        return (x.GetListOfDouble() == y.GetListOfDouble()) != 0;
+      case VLXKDMInstanceValue::StringType:
+        return (x.GetListOfString() == y.GetListOfString()) != 0;
+      case VLXKDMInstanceValue::DateType:
+        return (x.GetListOfDate() == y.GetListOfDate()) != 0;
+      case VLXKDMInstanceValue::BooleanType:
+        return (x.GetListOfBoolean() == y.GetListOfBoolean()) != 0;
+      case VLXKDMInstanceValue::BinaryType:
+        return (x.GetListOfBinary() == y.GetListOfBinary()) != 0;
+      case VLXKDMInstanceValue::InstanceType:
+        return (x.GetListOfInstance() == y.GetListOfInstance()) != 0;
     }
     return false;
   };
@@ -209,7 +241,9 @@ TEST(ValueFailures, AnAttributeWithoutValueLeavesTheHolderAsItWas)
     VLXError::GetReturn(2, earlier, nullptr, __FILE__, __LINE__);
     EXPECT_EQ(VLX_E_FAIL, byName ? read.GetValue(VLXUnicodeString("double"), value) : read.GetValue(1, value));
     const std::string text = PeekLastError().text;
-    EXPECT_NE(std::string::npos, text.find(byName ? "the attribute 'double' of Instance Sample" : "the attribute at position 1 of Instance Sample")) << text;
+    EXPECT_NE(std::string::npos, text.find(byName ? "the attribute 'double' of Instance Sample"
+                                                  : "the attribute at position 1 of Instance Sample"))
+        << text;
     EXPECT_NE(std::string::npos, text.find("has no value")) << text;
     EXPECT_EQ(42, value.GetInteger());
     EXPECT_NE(nullptr, value.GetHandle());
@@ -270,17 +304,22 @@ TEST(VariadicSetters, ANegativeCountOrANullPointerIsRefusedChangingNothing)
       {"VLXKDMClassDef::SetScopeNames(int, ...)", negative, [&] { return classDef.SetScopeNames(-1); }},
       {"VLXKDMAttributeDef::SetTargetNames(int, ...)", negative, [&] { return attribute.SetTargetNames(-1); }},
       {"VLXKDMAttributeDef::SetTargetRefs(int, ...)", negative, [&] { return attribute.SetTargetRefs(-1); }},
-      {"VLXKDMInstance::SetValueBinaries(" + name, negative, [&] { return instance.SetValueBinaries(U("binaries"), -1); }},
+      {"VLXKDMInstance::SetValueBinaries(" + name, negative,
+       [&] { return instance.SetValueBinaries(U("binaries"), -1); }},
       {"VLXKDMInstance::SetValueBinaries(int, int, ...)", negative, [&] { return instance.SetValueBinaries(12, -1); }},
-      {"VLXKDMInstance::SetValueBooleans(" + name, negative, [&] { return instance.SetValueBooleans(U("booleans"), -1); }},
+      {"VLXKDMInstance::SetValueBooleans(" + name, negative,
+       [&] { return instance.SetValueBooleans(U("booleans"), -1); }},
       {"VLXKDMInstance::SetValueBooleans(int, int, ...)", negative, [&] { return instance.SetValueBooleans(11, -1); }},
       {"VLXKDMInstance::SetValueDates(" + name, negative, [&] { return instance.SetValueDates(U("dates"), -1); }},
       {"VLXKDMInstance::SetValueDates(int, int, ...)", negative, [&] { return instance.SetValueDates(10, -1); }},
       {"VLXKDMInstance::SetValueDoubles(" + name, negative, [&] { return instance.SetValueDoubles(U("doubles"), -1); }},
       {"VLXKDMInstance::SetValueDoubles(int, int, ...)", negative, [&] { return instance.SetValueDoubles(8, -1); }},
-      {"VLXKDMInstance::SetValueInstances(" + name, negative, [&] { return instance.SetValueInstances(U("instances"), -1); }},
-      {"VLXKDMInstance::SetValueInstances(int, int, ...)", negative, [&] { return instance.SetValueInstances(13, -1); }},
-      {"VLXKDMInstance::SetValueIntegers(" + name, negative, [&] { return instance.SetValueIntegers(U("integers"), -1); }},
+      {"VLXKDMInstance::SetValueInstances(" + name, negative,
+       [&] { return instance.SetValueInstances(U("instances"), -1); }},
+      {"VLXKDMInstance::SetValueInstances(int, int, ...)", negative,
+       [&] { return instance.SetValueInstances(13, -1); }},
+      {"VLXKDMInstance::SetValueIntegers(" + name, negative,
+       [&] { return instance.SetValueIntegers(U("integers"), -1); }},
       {"VLXKDMInstance::SetValueIntegers(int, int, ...)", negative, [&] { return instance.SetValueIntegers(7, -1); }},
       {"VLXKDMInstance::SetValueStrings(" + name, negative, [&] { return instance.SetValueStrings(U("strings"), -1); }},
       {"VLXKDMInstance::SetValueStrings(int, int, ...)", negative, [&] { return instance.SetValueStrings(9, -1); }},

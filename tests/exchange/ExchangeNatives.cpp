@@ -58,8 +58,8 @@ JNIEXPORT jobject JNICALL Java_com_velmora_tessara_exchange_ExchangeNatives_from
 // Renames the replica through the ordinary call frame, on the calling Java thread, and reads the
 // name back.
 JNIEXPORT jstring JNICALL Java_com_velmora_tessara_exchange_ExchangeNatives_renameThroughNative(JNIEnv* env, jclass,
-                                                                                               jobject replica,
-                                                                                               jstring name)
+                                                                                                jobject replica,
+                                                                                                jstring name)
 {
   VLXKDMReplica proxy;
   if (proxy.BuildFromJavaType(env, replica) < 0) return nullptr;
@@ -84,8 +84,8 @@ JNIEXPORT jboolean JNICALL Java_com_velmora_tessara_exchange_ExchangeNatives_unb
 // operations keep for the Java caller must not pile up beyond one per iteration, which the caller
 // frees here.
 JNIEXPORT jint JNICALL Java_com_velmora_tessara_exchange_ExchangeNatives_exchangeLoop(JNIEnv* env, jclass,
-                                                                                     jobject replica, jobject holder,
-                                                                                     jint count)
+                                                                                      jobject replica, jobject holder,
+                                                                                      jint count)
 {
   for (jint i = 0; i < count; ++i) {
     VLXKDMReplica proxy;

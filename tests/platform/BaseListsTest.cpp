@@ -13,37 +13,53 @@
 
 #include <string>
 
-namespace
-{
+namespace {
 
 // Distinct values of each element type.
-template <class T> T Value(int k);
-template <> VLXUnicodeString Value(int k) { return VLXUnicodeString(("v" + std::to_string(k)).c_str()); }
-template <> VLXBoolean Value(int k) { return static_cast<VLXBoolean>(k + 1); }
-template <> int Value(int k) { return k * 7 - 3; }
-template <> double Value(int k) { return k * 0.5 - 1.25; }
-template <> VLXTime Value(int k)
+template <class T>
+T Value(int k);
+template <>
+VLXUnicodeString Value(int k)
+{
+  return VLXUnicodeString(("v" + std::to_string(k)).c_str());
+}
+template <>
+VLXBoolean Value(int k)
+{
+  return static_cast<VLXBoolean>(k + 1);
+}
+template <>
+int Value(int k)
+{
+  return k * 7 - 3;
+}
+template <>
+double Value(int k)
+{
+  return k * 0.5 - 1.25;
+}
+template <>
+VLXTime Value(int k)
 {
   VLXTime t;
   t.Settime_t(1000000 + k);
   return t;
 }
-template <> VLXBinary Value(int k)
+template <>
+VLXBinary Value(int k)
 {
   const unsigned char bytes[3] = {static_cast<unsigned char>(k), 0, static_cast<unsigned char>(k + 1)};
   return VLXBinary(bytes, 3);
 }
 
 template <class List>
-class ValueList : public ::testing::Test
-{
-protected:
+class ValueList : public ::testing::Test {
+ protected:
   using T = typename List::ElementType;
   static List Make(std::initializer_list<int> keys)
   {
     List list;
-    for (int k : keys)
-      list.Append(Value<T>(k));
+    for (int k : keys) list.Append(Value<T>(k));
     return list;
   }
   static bool Holds(const List& list, std::initializer_list<int> keys) { return list == Make(keys); }
@@ -56,13 +72,13 @@ TYPED_TEST_SUITE(ValueList, ListTypes);
 TYPED_TEST(ValueList, PositionsCountFromOneInIndexLocateAndRemovePosition)
 {
   using T = typename TypeParam::ElementType;
-  TypeParam list = this->Make({1, 5, 2, 5}); // 5 at positions 2 and 4
+  TypeParam list = this->Make({1, 5, 2, 5});  // 5 at positions 2 and 4
   EXPECT_TRUE(list[1] == Value<T>(1));
   EXPECT_TRUE(list[4] == Value<T>(5));
-  const struct { int key, from, found; } locate[] = {
-      {5, 1, 2}, {5, 2, 2}, {5, 3, 4}, {5, 4, 4}, {5, 5, 0}, {99, 1, 0}, {1, 0, 1}, {1, -3, 1}, {1, 2, 0}};
-  for (const auto& c : locate)
-    EXPECT_EQ(list.Locate(Value<T>(c.key), c.from), c.found) << c.key << " from " << c.from;
+  const struct {
+    int key, from, found;
+  } locate[] = {{5, 1, 2}, {5, 2, 2}, {5, 3, 4}, {5, 4, 4}, {5, 5, 0}, {99, 1, 0}, {1, 0, 1}, {1, -3, 1}, {1, 2, 0}};
+  for (const auto& c : locate) EXPECT_EQ(list.Locate(Value<T>(c.key), c.from), c.found) << c.key << " from " << c.from;
   EXPECT_EQ(list.Locate(Value<T>(5)), 2) << "the default start is 1";
   EXPECT_EQ(TypeParam().Locate(Value<T>(1)), 0);
 
@@ -116,7 +132,7 @@ TYPED_TEST(ValueList, OutOfRangePositionsAreReportedAndHarmlessWhenTheHandlerRet
   using T = typename TypeParam::ElementType;
   FatalRecorder recorder;
   TypeParam list = this->Make({1, 2});
-  list[0] = Value<T>(7); // writing the scratch element must not touch the list
+  list[0] = Value<T>(7);  // writing the scratch element must not touch the list
   (void)list[3];
   (void)static_cast<const TypeParam&>(list)[-1];
   list.RemovePosition(3);
@@ -131,8 +147,7 @@ TYPED_TEST(ValueList, OutOfRangePositionsAreReportedAndHarmlessWhenTheHandlerRet
 
 // ---- VLXRawCollPV ----
 
-struct Item
-{
+struct Item {
   int key, serial;
 };
 int ByKey(Item* a, Item* b) { return a->key - b->key; }
@@ -157,7 +172,7 @@ TEST(RawCollPV, PositionsLocateSizeAndStorage)
   ASSERT_EQ(list.Size(), 2);
   EXPECT_EQ(list[2], &a);
   list[1] = &b;
-  list.Size(4); // grows with nulls
+  list.Size(4);  // grows with nulls
   EXPECT_EQ(list[2], &a);
   EXPECT_EQ(list[3], nullptr);
   EXPECT_EQ(list[4], nullptr);
@@ -181,29 +196,25 @@ TEST(RawCollPV, PositionsLocateSizeAndStorage)
 
   VLXCollecRoot* root = new VLXRawCollPV(8);
   static_cast<VLXRawCollPV*>(root)->Append(root);
-  delete root; // virtual destructor: no leak under the sanitizer
+  delete root;  // virtual destructor: no leak under the sanitizer
 }
 
 TEST(RawCollPV, SortsAreStableAndCompareOrdersElementwiseThenBySize)
 {
   int values[] = {5, -2, 9, 0, 5, 3};
   VLXRawCollPV ints;
-  for (int& v : values)
-    ints.Append(&v);
+  for (int& v : values) ints.Append(&v);
   ints.QuickSort(&ByPointedInt);
-  const int order[] = {1, 3, 5, 0, 4, 2}; // the two 5s keep their order
-  for (int p = 1; p <= 6; ++p)
-    EXPECT_EQ(ints[p], &values[order[p - 1]]) << p;
+  const int order[] = {1, 3, 5, 0, 4, 2};  // the two 5s keep their order
+  for (int p = 1; p <= 6; ++p) EXPECT_EQ(ints[p], &values[order[p - 1]]) << p;
 
   Item items[] = {{3, 0}, {1, 1}, {3, 2}, {2, 3}};
   VLXRawCollPV list, prefix;
-  for (Item& i : items)
-    list.Append(&i);
+  for (Item& i : items) list.Append(&i);
   VLXRawCollPV copy(list);
   list.QuickSort(&ByKey);
   const int serials[] = {1, 3, 0, 2};
-  for (int p = 1; p <= 4; ++p)
-    EXPECT_EQ(static_cast<Item*>(list[p])->serial, serials[p - 1]) << p;
+  for (int p = 1; p <= 4; ++p) EXPECT_EQ(static_cast<Item*>(list[p])->serial, serials[p - 1]) << p;
   EXPECT_EQ(static_cast<Item*>(copy[1])->serial, 0) << "the copy is a separate list";
   prefix.Append(list[1]);
   EXPECT_EQ(VLXRawCollPV::Compare(list, list, &ByKey), 0);
@@ -215,4 +226,4 @@ TEST(RawCollPV, SortsAreStableAndCompareOrdersElementwiseThenBySize)
   EXPECT_LT(VLXRawCollPV::Compare(nullptr, &values[0]), 0);
 }
 
-} // namespace
+}  // namespace

@@ -14,20 +14,21 @@
 #include <thread>
 #include <vector>
 
-namespace
-{
+namespace {
 
 std::atomic<int> g_destroyed{0};
 
-namespace shapes
-{
-struct Counted : VLXBaseUnknown { ~Counted() override { ++g_destroyed; } };
-struct Mixin { virtual ~Mixin() = default; };
+namespace shapes {
+struct Counted : VLXBaseUnknown {
+  ~Counted() override { ++g_destroyed; }
+};
+struct Mixin {
+  virtual ~Mixin() = default;
+};
 struct Derived : Counted, Mixin {};
-}
+}  // namespace shapes
 
-struct CountedError : VLXError
-{
+struct CountedError : VLXError {
   using VLXError::VLXError;
   ~CountedError() override { ++g_destroyed; }
 };
@@ -57,15 +58,14 @@ TEST(BaseUnknown, TheLastReleaseDeletesEvenUnderConcurrentAddRefAndRelease)
         object->Release();
       }
     });
-  for (std::thread& t : threads)
-    t.join();
+  for (std::thread& t : threads) t.join();
   EXPECT_EQ(object->AddRef(), 2u);
   EXPECT_EQ(object->Release(), 1u);
   EXPECT_EQ(g_destroyed, 0);
   EXPECT_EQ(object->Release(), 0u);
   EXPECT_EQ(g_destroyed, 1);
 
-  shapes::Counted original; // copies have a count of their own
+  shapes::Counted original;  // copies have a count of their own
   original.AddRef();
   shapes::Counted copy(original);
   EXPECT_EQ(copy.GetRefCount(), 1u);
@@ -77,10 +77,15 @@ TEST(BaseUnknown, ClassNamesAndInterfacesComeFromTheDynamicType)
 {
   shapes::Derived object;
   VLXBaseUnknown* base = &object;
-  const struct { const char* name; int isA, kindOf; } names[] = {
-      {"(anonymous namespace)::shapes::Derived", 1, 1}, {"(anonymous namespace)::shapes::Counted", 0, 1},
-      {"(anonymous namespace)::shapes::Mixin", 0, 1},   {"VLXBaseUnknown", 0, 1},
-      {"VLXError", 0, 0},                                {nullptr, 0, 0}};
+  const struct {
+    const char* name;
+    int isA, kindOf;
+  } names[] = {{"(anonymous namespace)::shapes::Derived", 1, 1},
+               {"(anonymous namespace)::shapes::Counted", 0, 1},
+               {"(anonymous namespace)::shapes::Mixin", 0, 1},
+               {"VLXBaseUnknown", 0, 1},
+               {"VLXError", 0, 0},
+               {nullptr, 0, 0}};
   for (const auto& n : names) {
     EXPECT_EQ(base->IsA(n.name), n.isA) << (n.name ? n.name : "null");
     EXPECT_EQ(base->IsAKindOf(n.name), n.kindOf) << (n.name ? n.name : "null");
@@ -131,9 +136,8 @@ TEST(BaseUnknown, TypeInformationIsAbsentAndStoredStateIsKept)
 
 // ---- errors ----
 
-class ErrorRegistry : public ::testing::Test
-{
-protected:
+class ErrorRegistry : public ::testing::Test {
+ protected:
   void SetUp() override
   {
     VLXError::VLXCleanLastError();
@@ -157,10 +161,14 @@ protected:
 TEST_F(ErrorRegistry, MessageTextsFillTheParametersIntoTheCatalogText)
 {
   VLXUnicodeString params[10];
-  for (int i = 0; i < 10; ++i)
-    params[i] = ("p" + std::to_string(i + 1)).c_str();
+  for (int i = 0; i < 10; ++i) params[i] = ("p" + std::to_string(i + 1)).c_str();
   params[2] = VLXUnicodeString("with\0nul", 8);
-  const struct { const char* id; const char* catalog; int count; std::string text; } cases[] = {
+  const struct {
+    const char* id;
+    const char* catalog;
+    int count;
+    std::string text;
+  } cases[] = {
       {"T_1", "TestCatalog", 2, "cannot open p1 for p2"},
       {"T_2", "TestCatalog", 0, "no parameters here, only a path /proc and /p"},
       {"T_3", "TestCatalog", 2, "ten: , one: p1, missing: []"},
@@ -203,16 +211,16 @@ TEST_F(ErrorRegistry, GetReturnRecordsOnlyKindTwoAndTakesOverTheReference)
   VLXError::VLXCleanLastError();
   EXPECT_EQ(e->GetRefCount(), 1u);
   EXPECT_EQ(VLXError::VLXGetLastError(0, nullptr), nullptr);
-  VLXError::GetReturn(2, got, nullptr, __FILE__, __LINE__); // re-raise after a clean
+  VLXError::GetReturn(2, got, nullptr, __FILE__, __LINE__);  // re-raise after a clean
   EXPECT_EQ(e->GetRefCount(), 1u);
-  VLXError::GetReturn(2, VLXError::VLXGetLastError(0, nullptr), nullptr, __FILE__, __LINE__); // without one
+  VLXError::GetReturn(2, VLXError::VLXGetLastError(0, nullptr), nullptr, __FILE__, __LINE__);  // without one
   EXPECT_EQ(e->GetRefCount(), 1u);
   EXPECT_EQ(g_destroyed, 0);
   VLXError::GetReturn(2, new CountedError("T_2", "TestCatalog"), nullptr, __FILE__, __LINE__);
   EXPECT_EQ(g_destroyed, 1) << "a new error replaces and releases the previous one";
   VLXError::VLXCleanLastError();
   EXPECT_EQ(g_destroyed, 2);
-  VLXError::VLXCleanLastError(); // nothing left: harmless
+  VLXError::VLXCleanLastError();  // nothing left: harmless
 }
 
 TEST_F(ErrorRegistry, LastErrorIsPerThreadAndReleasedAtThreadExit)
@@ -234,8 +242,7 @@ TEST_F(ErrorRegistry, LastErrorIsPerThreadAndReleasedAtThreadExit)
   EXPECT_EQ(g_destroyed, 1) << "the thread's last error was released when it exited";
   VLXError* still = VLXError::VLXGetLastError(0, nullptr);
   EXPECT_EQ(still, mine) << "the other thread did not replace this one's";
-  if (still != nullptr)
-    still->Release();
+  if (still != nullptr) still->Release();
 }
 
 // ---- fatal errors ----
@@ -274,8 +281,7 @@ TEST(Mutex, IsRecursiveAndExcludesOtherThreadsUntilFullyUnlocked)
   auto otherCanTake = [&mutex] {
     int got = 0;
     std::thread([&] {
-      if ((got = mutex.TryLock()) != 0)
-        mutex.Unlock();
+      if ((got = mutex.TryLock()) != 0) mutex.Unlock();
     }).join();
     return got;
   };
@@ -293,4 +299,4 @@ TEST(Mutex, IsRecursiveAndExcludesOtherThreadsUntilFullyUnlocked)
   EXPECT_EQ(FatalRecorder::Reports().size(), 1u) << "unlocked by a thread that does not hold it";
 }
 
-} // namespace
+}  // namespace

@@ -6,8 +6,7 @@
 #include <cstring>
 #include <string>
 
-namespace
-{
+namespace {
 
 std::string Bytes(const VLXUnicodeString& s)
 {
@@ -28,7 +27,7 @@ TEST(UnicodeString, NullInputsEmbeddedNulAndIndependentCopies)
   VLXUnicodeString original("h\xC3\xA9llo"), copy(original);
   original = "other";
   EXPECT_EQ(Bytes(copy), "h\xC3\xA9llo");
-  copy = copy.c_str() + 1; // a suffix of its own bytes
+  copy = copy.c_str() + 1;  // a suffix of its own bytes
   EXPECT_EQ(Bytes(copy), "\xC3\xA9llo");
   copy = static_cast<const char*>(nullptr);
   EXPECT_STREQ(copy.c_str(), "");
@@ -36,17 +35,36 @@ TEST(UnicodeString, NullInputsEmbeddedNulAndIndependentCopies)
 
 TEST(UnicodeString, FirstMalformedOffsetNamesTheFirstIllFormedSequenceAndWhy)
 {
-  const struct { std::string bytes; int offset /* -1: well-formed */; const char* reason; } cases[] = {
-      {"", -1, ""}, {std::string("a\0b", 3), -1, ""}, {"\xC2\x80\xDF\xBF", -1, ""},
-      {"\xE0\xA0\x80\xE2\x82\xAC\xEF\xBF\xBF", -1, ""}, {"\xED\x9F\xBF\xEE\x80\x80", -1, ""},
-      {"\xF0\x90\x80\x80\xF0\x9F\x98\x80", -1, ""}, {"\xF4\x8F\xBF\xBF", -1, ""},
-      {"ab\xC0\x80", 2, "overlong"}, {"\xC1\xBF", 0, "overlong"}, {"x\xE0\x9F\xBF", 1, "overlong"},
-      {"\xF0\x8F\xBF\xBF", 0, "overlong"}, {"\xED\xA0\x80", 0, "surrogate"}, {"ok\xED\xBF\xBF", 2, "surrogate"},
-      {"\xF4\x90\x80\x80", 0, "above U+10FFFF"}, {"\xF5\x80\x80\x80", 0, "above U+10FFFF"},
-      {"abc\xE2\x82", 3, "truncated"}, {"\xF0\x9F\x98", 0, "truncated"}, {"\xC3", 0, "truncated"},
-      {"\xE2\x28\xA1", 0, "truncated"}, {std::string("\xC3\0", 2), 0, "truncated"},
-      {"a\x80", 1, "continuation"}, {"\xC3\xA9\xA9", 2, "continuation"}, {"abc\xFF", 3, "never occurs"},
-      {"\xF8\x88\x80\x80\x80", 0, "never occurs"}, {"\xC3\xA9\x80\xFF", 2, "continuation"},
+  const struct {
+    std::string bytes;
+    int offset /* -1: well-formed */;
+    const char* reason;
+  } cases[] = {
+      {"", -1, ""},
+      {std::string("a\0b", 3), -1, ""},
+      {"\xC2\x80\xDF\xBF", -1, ""},
+      {"\xE0\xA0\x80\xE2\x82\xAC\xEF\xBF\xBF", -1, ""},
+      {"\xED\x9F\xBF\xEE\x80\x80", -1, ""},
+      {"\xF0\x90\x80\x80\xF0\x9F\x98\x80", -1, ""},
+      {"\xF4\x8F\xBF\xBF", -1, ""},
+      {"ab\xC0\x80", 2, "overlong"},
+      {"\xC1\xBF", 0, "overlong"},
+      {"x\xE0\x9F\xBF", 1, "overlong"},
+      {"\xF0\x8F\xBF\xBF", 0, "overlong"},
+      {"\xED\xA0\x80", 0, "surrogate"},
+      {"ok\xED\xBF\xBF", 2, "surrogate"},
+      {"\xF4\x90\x80\x80", 0, "above U+10FFFF"},
+      {"\xF5\x80\x80\x80", 0, "above U+10FFFF"},
+      {"abc\xE2\x82", 3, "truncated"},
+      {"\xF0\x9F\x98", 0, "truncated"},
+      {"\xC3", 0, "truncated"},
+      {"\xE2\x28\xA1", 0, "truncated"},
+      {std::string("\xC3\0", 2), 0, "truncated"},
+      {"a\x80", 1, "continuation"},
+      {"\xC3\xA9\xA9", 2, "continuation"},
+      {"abc\xFF", 3, "never occurs"},
+      {"\xF8\x88\x80\x80\x80", 0, "never occurs"},
+      {"\xC3\xA9\x80\xFF", 2, "continuation"},
   };
   for (const auto& c : cases) {
     SCOPED_TRACE(::testing::PrintToString(c.bytes));
@@ -61,4 +79,4 @@ TEST(UnicodeString, FirstMalformedOffsetNamesTheFirstIllFormedSequenceAndWhy)
   }
 }
 
-} // namespace
+}  // namespace

@@ -9,8 +9,7 @@
 #include <cstring>
 #include <limits>
 
-namespace
-{
+namespace {
 
 using Conv = VLXJBXJNIConverter;
 using ConverterTest = BridgeTest;
@@ -26,7 +25,7 @@ List One(V v)
 }
 
 const int kLarge = 100000;
-const std::u16string kPiece(8191, u'a'); // one unit short of the converter's 8192-unit piece
+const std::u16string kPiece(8191, u'a');  // one unit short of the converter's 8192-unit piece
 
 // ---- strings ----
 
@@ -38,15 +37,18 @@ TEST_F(ConverterTest, StringsCrossExactlyInBothDirections)
     longUtf8 += i % 3 == 0 ? "\xF0\x9F\x98\x80" : (i % 3 == 1 ? "\xC3\xA9" : "z");
     longUtf16 += i % 3 == 0 ? u"\U0001F600" : (i % 3 == 1 ? u"\u00E9" : u"z");
   }
-  const struct { std::string utf8; std::u16string utf16; } cases[] = {
+  const struct {
+    std::string utf8;
+    std::u16string utf16;
+  } cases[] = {
       {"", u""},
       {"plain", u"plain"},
       {"caf\xC3\xA9 \xE2\x82\xAC", u"caf\u00E9 \u20AC"},
-      {"\xF0\x9F\x98\x80", u"\U0001F600"}, // one surrogate pair
+      {"\xF0\x9F\x98\x80", u"\U0001F600"},  // one surrogate pair
       {"\xF4\x8F\xBF\xBF", u"\U0010FFFF"},
-      {std::string("a\0b", 3), std::u16string(u"a\0b", 3)}, // NUL stays one unit
+      {std::string("a\0b", 3), std::u16string(u"a\0b", 3)},  // NUL stays one unit
       {"\xEF\xBF\xBF\xEE\x80\x80\xED\x9F\xBF", u"\uFFFF\uE000\uD7FF"},
-      {std::string(8191, 'a') + "\xF0\x9F\x98\x80", kPiece + u"\U0001F600"}, // a pair across the piece boundary
+      {std::string(8191, 'a') + "\xF0\x9F\x98\x80", kPiece + u"\U0001F600"},  // a pair across the piece boundary
       {longUtf8, longUtf16},
   };
   for (const auto& c : cases) {
@@ -68,14 +70,17 @@ TEST_F(ConverterTest, StringsCrossExactlyInBothDirections)
 TEST_F(ConverterTest, UnpairedSurrogatesFromJavaAreRefusedNamingTheirIndex)
 {
   const std::u16string high(1, char16_t(0xD83D)), low(1, char16_t(0xDE00));
-  const struct { std::u16string text; const char* where; } cases[] = {
+  const struct {
+    std::u16string text;
+    const char* where;
+  } cases[] = {
       {high, "(U+D83D) at index 0"},
       {low + u"x", "(U+DE00) at index 0"},
       {low + high, "(U+DE00) at index 0"},
       {u"a" + high + u"\U0001F600", "(U+D83D) at index 1"},
       {std::u16string(300, u'b') + high, "(U+D83D) at index 300"},
       {kPiece + high + u"b", "(U+D83D) at index 8191"},
-      {kPiece + u"\U0001F600" + low, "(U+DE00) at index 8193"}, // right after a piece boundary
+      {kPiece + u"\U0001F600" + low, "(U+DE00) at index 8193"},  // right after a piece boundary
   };
   for (const auto& c : cases) {
     VLXUnicodeString out("kept");
@@ -90,10 +95,15 @@ TEST_F(ConverterTest, UnpairedSurrogatesFromJavaAreRefusedNamingTheirIndex)
 
 TEST_F(ConverterTest, MalformedUtf8IsRefusedWithItsByteOffsetAndTheOutputUntouched)
 {
-  const struct { std::string bytes; int offset; const char* reason; } cases[] = {
-      {"ab\xC0\x80", 2, "overlong"},    {"x\xE0\x80\xAF", 1, "overlong"},  {"\xED\xA0\x80", 0, "surrogate"},
-      {"okay\xF4\x90\x80\x80", 4, "above U+10FFFF"}, {"abc\xE2\x82", 3, "truncated"},
-      {"a\x80z", 1, "continuation"},    {"\xFF", 0, "never occurs"},
+  const struct {
+    std::string bytes;
+    int offset;
+    const char* reason;
+  } cases[] = {
+      {"ab\xC0\x80", 2, "overlong"},    {"x\xE0\x80\xAF", 1, "overlong"},
+      {"\xED\xA0\x80", 0, "surrogate"}, {"okay\xF4\x90\x80\x80", 4, "above U+10FFFF"},
+      {"abc\xE2\x82", 3, "truncated"},  {"a\x80z", 1, "continuation"},
+      {"\xFF", 0, "never occurs"},
   };
   for (const auto& c : cases) {
     jstring sentinel = reinterpret_cast<jstring>(0x5678), out = sentinel;
@@ -157,7 +167,7 @@ TEST_F(ConverterTest, StringListsCrossElementByElement)
   ASSERT_EQ(env->GetArrayLength(array), 4);
   jstring third = static_cast<jstring>(env->GetObjectArrayElement(array, 2));
   EXPECT_TRUE(Units(env, third) == u"\U0001F600");
-  env->SetObjectArrayElement(array, 0, nullptr); // a null element reads back as an empty string
+  env->SetObjectArrayElement(array, 0, nullptr);  // a null element reads back as an empty string
   VLXListValVLXUnicodeString back;
   back.Append("replaced");
   ASSERT_EQ(Conv::BuildFromJavaType(env, array, back), VLX_S_OK);
@@ -179,8 +189,7 @@ TEST_F(ConverterTest, StringListsCrossElementByElement)
   EXPECT_EQ(Conv::ConvertToJavaType(env, list, out), VLX_E_INVALIDARG);
   EXPECT_EQ(out, nullptr);
   const std::string text = TakeLastError().text;
-  EXPECT_NE(text.find("the byte at offset 3 of element 5 of the list is not valid UTF-8 (truncated"),
-            std::string::npos)
+  EXPECT_NE(text.find("the byte at offset 3 of element 5 of the list is not valid UTF-8 (truncated"), std::string::npos)
       << text;
 }
 
@@ -189,8 +198,7 @@ TEST_F(ConverterTest, LargeStringListsReleaseEachElementReferenceAtOnce)
   // -Xcheck:jni reports local reference growth beyond the frame's capacity: a converter that kept
   // one reference per element fails this test through the ctest output check.
   VLXListValVLXUnicodeString list(kLarge), back;
-  for (int i = 0; i < kLarge; ++i)
-    list.Append(U("element " + std::to_string(i)));
+  for (int i = 0; i < kLarge; ++i) list.Append(U("element " + std::to_string(i)));
   jobjectArray array = nullptr;
   ASSERT_EQ(Conv::ConvertToJavaType(env, list, array), VLX_S_OK);
   ASSERT_EQ(Conv::BuildFromJavaType(env, array, back), VLX_S_OK);
@@ -221,7 +229,7 @@ TEST_F(ConverterTest, PrimitiveArraysCrossInBulkAndBooleansAreNormalised)
   for (int i = 0; i < kLarge; ++i) {
     ints.Append(i * 7919 - 3);
     doubles.Append(i * 0.25 - 7.0);
-    booleans.Append(static_cast<VLXBoolean>(i % 4 == 3 ? 255 : i % 3)); // 0, 1, 2 and 255
+    booleans.Append(static_cast<VLXBoolean>(i % 4 == 3 ? 255 : i % 3));  // 0, 1, 2 and 255
     bytes.getData()[i] = static_cast<unsigned char>(i * 31);
   }
   ints[1] = INT_MIN;
@@ -241,8 +249,7 @@ TEST_F(ConverterTest, PrimitiveArraysCrossInBulkAndBooleansAreNormalised)
   EXPECT_EQ(std::memcmp(doublesBack.Data(), doubles.Data(), sizeof(double) * kLarge), 0);
   const VLXListValVLXBoolean booleansBack = RoundTrip(env, booleans, jz, VLXListValVLXBoolean());
   ASSERT_EQ(booleansBack.Size(), kLarge);
-  for (int i = 1; i <= kLarge; ++i)
-    ASSERT_EQ(booleansBack[i], booleans[i] != 0 ? 1 : 0) << i;
+  for (int i = 1; i <= kLarge; ++i) ASSERT_EQ(booleansBack[i], booleans[i] != 0 ? 1 : 0) << i;
   jint lastInts[2];
   jboolean z[4];
   env->GetIntArrayRegion(ja, kLarge - 2, 2, lastInts);
@@ -254,4 +261,4 @@ TEST_F(ConverterTest, PrimitiveArraysCrossInBulkAndBooleansAreNormalised)
   EXPECT_EQ(env->GetArrayLength(empty), 0);
 }
 
-} // namespace
+}  // namespace

@@ -3,8 +3,7 @@
 #include "VLXJBXException.h"
 #include "VLXJBXJNIHelper.h"
 
-namespace
-{
+namespace {
 
 using Util = VLXJBXJNIUtilities;
 using LookupTest = BridgeTest;
@@ -38,9 +37,12 @@ TEST_F(LookupTest, MemberLookupsNameTheMemberTheSignatureAndTheClass)
 {
   jclass string = Find("java/lang/String");
   enum Kind { Method, StaticMethod, StaticField };
-  const struct { Kind kind; const char *name, *signature, *failure /* null: found */; } cases[] = {
+  const struct {
+    Kind kind;
+    const char *name, *signature, *failure /* null: found */;
+  } cases[] = {
       {Method, "noSuchMethod", "()V", "method 'noSuchMethod' with signature '()V' of class 'java.lang.String'"},
-      {Method, "valueOf", "(I)Ljava/lang/String;", "NoSuchMethodError"}, // exists, but static
+      {Method, "valueOf", "(I)Ljava/lang/String;", "NoSuchMethodError"},  // exists, but static
       {StaticMethod, "valueOf", "(I)Ljava/lang/String;", nullptr},
       {StaticMethod, "valueOf", "(Z)I", "static method 'valueOf' with signature '(Z)I'"},
       {StaticField, "CASE_INSENSITIVE_ORDER", "Ljava/util/Comparator;", nullptr},
@@ -97,14 +99,21 @@ TEST_F(JavaErrorTest, PendingExceptionsAreClearedAndRecordedWithClassMessageAndC
   // A message outside the BMP, with an embedded NUL, crosses exactly (not as modified UTF-8).
   jstring unicode = JavaString(env, u"bad \U0001F600 value" + std::u16string(1, u'\0') + u"end");
   // thrown null: a real call throws; flag 1: printed to standard error first.
-  const struct { jthrowable thrown; int flag; std::vector<std::string> parameters; } cases[] = {
-      {NewThrowable(env, "java/lang/RuntimeException", env->NewStringUTF("outer text"), inner), 0,
+  const struct {
+    jthrowable thrown;
+    int flag;
+    std::vector<std::string> parameters;
+  } cases[] = {
+      {NewThrowable(env, "java/lang/RuntimeException", env->NewStringUTF("outer text"), inner),
+       0,
        {"ctx", "java.lang.RuntimeException", "outer text",
         "; caused by java.lang.IllegalStateException: inner reason"}},
       {nullptr, 1, {"ctx", "java.lang.NumberFormatException", "For input string: \"x1\"", ""}},
-      {NewThrowable(env, "java/lang/UnsupportedOperationException", nullptr, nullptr), 0,
+      {NewThrowable(env, "java/lang/UnsupportedOperationException", nullptr, nullptr),
+       0,
        {"ctx", "java.lang.UnsupportedOperationException", "(no message)", ""}},
-      {NewThrowable(env, "java/lang/IllegalArgumentException", unicode, nullptr), 0,
+      {NewThrowable(env, "java/lang/IllegalArgumentException", unicode, nullptr),
+       0,
        {"ctx", "java.lang.IllegalArgumentException", std::string("bad \xF0\x9F\x98\x80 value\0end", 18), ""}},
   };
   ASSERT_FALSE(env->ExceptionCheck());
@@ -148,8 +157,7 @@ TEST_F(JavaErrorTest, WithoutAnExceptionTheCodeDecidesAndTheOperationsOwnErrorIs
   EXPECT_EQ(Util::HandleJavaError(env, VLX_E_FAIL, "op", nullptr, 0), VLX_E_FAIL);
   VLXError* last = VLXError::VLXGetLastError(0, nullptr);
   EXPECT_EQ(last, own);
-  if (last != nullptr)
-    last->Release();
+  if (last != nullptr) last->Release();
   VLXError::MarkOperationStart();
   EXPECT_EQ(Util::HandleJavaError(env, VLX_E_FAIL, "later", nullptr, 0), VLX_E_FAIL);
   EXPECT_EQ(TakeLastError().parameters[0], "later");
@@ -159,8 +167,7 @@ TEST_F(JavaErrorTest, AGivenErrorObjectIsTakenOverInEveryCase)
 {
   const VLXUnicodeString p[] = {"mine", "why"};
   for (int pending = 0; pending < 2; ++pending) {
-    if (pending)
-      env->ThrowNew(Find("java/lang/IllegalStateException"), "described to stderr");
+    if (pending) env->ThrowNew(Find("java/lang/IllegalStateException"), "described to stderr");
     VLXJBXException* given = new VLXJBXException(VLXJBXMessages::OperationFailed);
     given->SetNLSRequestParams(2, p);
     EXPECT_EQ(Util::HandleJavaError(env, pending ? 0 : -1, "op", given, pending), VLX_E_FAIL);
@@ -174,20 +181,20 @@ TEST_F(JavaErrorTest, AGivenErrorObjectIsTakenOverInEveryCase)
 
 TEST(BridgeCatalog, EveryIdHasAnEnglishTextWithItsParameters)
 {
-  for (const char* id : {VLXJBXMessages::NoEnvironment, VLXJBXMessages::OperationFailed,
-                         VLXJBXMessages::JvmCreationFailed, VLXJBXMessages::JavaException,
-                         VLXJBXMessages::LookupFailed, VLXJBXMessages::ConversionFailed,
-                         VLXJBXMessages::ExceptionPending, VLXJBXMessages::InvalidArgument,
-                         VLXJBXMessages::BindingMissing}) {
+  for (const char* id :
+       {VLXJBXMessages::NoEnvironment, VLXJBXMessages::OperationFailed, VLXJBXMessages::JvmCreationFailed,
+        VLXJBXMessages::JavaException, VLXJBXMessages::LookupFailed, VLXJBXMessages::ConversionFailed,
+        VLXJBXMessages::ExceptionPending, VLXJBXMessages::InvalidArgument, VLXJBXMessages::BindingMissing}) {
     VLXUnicodeString text;
     EXPECT_EQ(VLXError::LookupMessage(VLXJBXMessages::Catalog, id, text), 1) << id;
   }
   VLXJBXException e(VLXJBXMessages::BindingMissing);
   const VLXUnicodeString p[] = {"ReplicaStubs::init", "class com/velmora/tessara/kdmreplica/Replica"};
   e.SetNLSRequestParams(2, p);
-  EXPECT_EQ(Str(e.GetMessageText()), "the Java side could not be bound for ReplicaStubs::init: class "
-                                     "com/velmora/tessara/kdmreplica/Replica is missing");
+  EXPECT_EQ(Str(e.GetMessageText()),
+            "the Java side could not be bound for ReplicaStubs::init: class "
+            "com/velmora/tessara/kdmreplica/Replica is missing");
   EXPECT_EQ(e.IsAKindOf("VLXError"), 1);
 }
 
-} // namespace
+}  // namespace

@@ -5,12 +5,10 @@
 
 #include <thread>
 
-namespace
-{
+namespace {
 
-class JavaObjectTest : public BridgeTest
-{
-protected:
+class JavaObjectTest : public BridgeTest {
+ protected:
   long Refs() const { return VLXJBXJNIUtilities::GetGlobalRefCount(); }
 
   jobject NewStringBuilder(const char* text)
@@ -46,19 +44,19 @@ TEST_F(JavaObjectTest, EveryCopyHoldsItsOwnReferenceAndDestructionReleasesIt)
       EXPECT_EQ(b.exchangedWithJava, 1);
       c = b;
       EXPECT_EQ(Refs(), base + 3);
-      c = c; // self-assignment keeps the reference
+      c = c;  // self-assignment keeps the reference
       EXPECT_EQ(Refs(), base + 3);
       EXPECT_TRUE(c == a);
-      c = VLXJBXJavaObject(); // assigning an empty object releases
+      c = VLXJBXJavaObject();  // assigning an empty object releases
       EXPECT_EQ(Refs(), base + 2);
       EXPECT_EQ(c.GetGlobalRef(), nullptr);
-      a = b; // same Java object: one reference replaced by another
+      a = b;  // same Java object: one reference replaced by another
       EXPECT_EQ(Refs(), base + 2);
     }
     EXPECT_EQ(Refs(), base + 1);
     EXPECT_TRUE(ToString(a.GetGlobalRef()) == u"kept alive") << "the Java object outlived its local references";
     VLXJBXJavaObject* heap = new VLXJBXJavaObject(a);
-    std::thread([heap] { VLXJBXJavaObject copy(*heap); }).join(); // on a thread the bridge attaches
+    std::thread([heap] { VLXJBXJavaObject copy(*heap); }).join();  // on a thread the bridge attaches
     EXPECT_EQ(Refs(), base + 2);
     heap->Release();
     EXPECT_EQ(Refs(), base + 1);
@@ -90,4 +88,4 @@ TEST_F(JavaObjectTest, SetGlobalRefReplacesOrReleasesAndEqualityIsJavaIdentity)
   EXPECT_TRUE(q != none1 && none1 != q);
 }
 
-} // namespace
+}  // namespace

@@ -4,8 +4,7 @@
 #include "VLXJBXException.h"
 #include "VLXJBXJavaObject.h"
 
-namespace
-{
+namespace {
 
 TEST(StartFailure, EveryCallFailsWithTheReasonAndTheEnvironmentNull)
 {
@@ -16,8 +15,8 @@ TEST(StartFailure, EveryCallFailsWithTheReasonAndTheEnvironmentNull)
   const ErrorView e = TakeLastError();
   const std::string why = e.text;
   EXPECT_EQ(e.id, VLXJBXMessages::JvmCreationFailed);
-  for (const char* part : {"the Java virtual machine could not be created", "-XX:+ThisOptionDoesNotExist",
-                           "JNI_CreateJavaVM returned"})
+  for (const char* part :
+       {"the Java virtual machine could not be created", "-XX:+ThisOptionDoesNotExist", "JNI_CreateJavaVM returned"})
     EXPECT_NE(why.find(part), std::string::npos) << why;
 
   // A later call, even with other options, does not try again.
@@ -46,4 +45,4 @@ TEST(StartFailure, ObjectsWithoutAHandleAndErrorTranslationNeedNoJvm)
             "VLXKDMReplica::Commit() failed: it returned the failure code -1 and recorded no cause");
 }
 
-} // namespace
+}  // namespace

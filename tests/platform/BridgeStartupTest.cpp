@@ -9,8 +9,7 @@
 #include <filesystem>
 #include <fstream>
 
-namespace
-{
+namespace {
 
 using StartupTest = BridgeTest;
 
@@ -41,7 +40,7 @@ TEST_F(StartupTest, TheProcessJvmWasCreatedOnceWithTheOptionsListAndTheClassPath
 
   JNIEnv* again = nullptr;
   VLXListValVLXUnicodeString ignored;
-  ignored.Append("-XX:+ThisOptionDoesNotExist"); // options matter only when the JVM is created
+  ignored.Append("-XX:+ThisOptionDoesNotExist");  // options matter only when the JVM is created
   EXPECT_EQ(VLXJBXJNIUtilities::GetJNIEnv(again, ignored), VLX_S_OK);
   EXPECT_EQ(again, env);
   JavaVM* vms[2] = {nullptr, nullptr};
@@ -75,4 +74,4 @@ TEST(StartupConfig, ClassPathPrefersTheSharedJarAndPutsTheVariableFirst)
             (std::vector<std::string>{"-Xcheck:jni", "-Xmx64m", "-Dk=v"}));
 }
 
-} // namespace
+}  // namespace

@@ -18,8 +18,7 @@ inline std::string Str(const VLXUnicodeString& s)
 }
 
 // The calling thread's last error, read and cleaned.
-struct ErrorView
-{
+struct ErrorView {
   bool present = false;
   std::string id, text;
   std::vector<std::string> parameters;
@@ -30,8 +29,7 @@ inline ErrorView TakeLastError()
   ErrorView view;
   if (VLXError* e = VLXError::VLXGetLastError(0, nullptr)) {
     view = {true, e->GetId(), Str(e->GetMessageText()), {}};
-    for (int i = 1; i <= e->GetNLSParameterCount(); ++i)
-      view.parameters.push_back(Str(e->GetNLSParameter(i)));
+    for (int i = 1; i <= e->GetNLSParameterCount(); ++i) view.parameters.push_back(Str(e->GetNLSParameter(i)));
     e->Release();
     VLXError::VLXCleanLastError();
   }
@@ -60,9 +58,8 @@ T Checked(JNIEnv* env, T value)
 }
 
 // Every test runs in a local frame of its own and must leave no exception pending.
-class BridgeTest : public ::testing::Test
-{
-protected:
+class BridgeTest : public ::testing::Test {
+ protected:
   JNIEnv* env = nullptr;
 
   void SetUp() override

@@ -8,12 +8,10 @@
 #include <atomic>
 #include <thread>
 
-namespace
-{
+namespace {
 
 // The calling thread as Java sees it; `thread` is a plain JNI global reference (not the bridge's).
-struct JavaThread
-{
+struct JavaThread {
   jobject thread = nullptr;
   std::u16string name;
   bool daemon = false;
@@ -24,8 +22,8 @@ JavaThread Current(JNIEnv* env)
   JavaThread facts;
   env->PushLocalFrame(8);
   jclass cls = env->FindClass("java/lang/Thread");
-  jobject current = Checked(env, env->CallStaticObjectMethod(
-                                     cls, env->GetStaticMethodID(cls, "currentThread", "()Ljava/lang/Thread;")));
+  jobject current = Checked(
+      env, env->CallStaticObjectMethod(cls, env->GetStaticMethodID(cls, "currentThread", "()Ljava/lang/Thread;")));
   facts.thread = env->NewGlobalRef(current);
   facts.daemon = Checked(env, env->CallBooleanMethod(current, env->GetMethodID(cls, "isDaemon", "()Z"))) == JNI_TRUE;
   facts.name = Units(env, Checked(env, static_cast<jstring>(env->CallObjectMethod(
@@ -60,7 +58,7 @@ TEST_F(ThreadsTest, EachNativeThreadIsAttachedOnceAsANamedDaemonConvertsAndIsDet
           first != nullptr) {
         ++sameEnv;
         seen[t] = Current(first);
-        for (int i = 0; i < 1000; ++i) { // conversions on many threads at once
+        for (int i = 0; i < 1000; ++i) {  // conversions on many threads at once
           const std::string text = "thread " + std::to_string(t) + " \xF0\x9F\x98\x80 #" + std::to_string(i);
           jstring js = nullptr;
           VLXUnicodeString back;
@@ -71,8 +69,7 @@ TEST_F(ThreadsTest, EachNativeThreadIsAttachedOnceAsANamedDaemonConvertsAndIsDet
         }
       }
     });
-  for (std::thread& t : threads)
-    t.join();
+  for (std::thread& t : threads) t.join();
   EXPECT_EQ(sameEnv, kThreads);
   EXPECT_EQ(mismatches, 0);
   for (JavaThread& j : seen) {
@@ -103,8 +100,7 @@ TEST_F(ThreadsTest, AThreadAttachedBySomeoneElseIsNeverDetachedByTheBridge)
   std::atomic<int> sameEnv{0};
   std::thread([&] {
     void* own = nullptr;
-    if (vm->AttachCurrentThread(&own, nullptr) != JNI_OK)
-      return;
+    if (vm->AttachCurrentThread(&own, nullptr) != JNI_OK) return;
     pthread_setspecific(g_ownerKey, vm);
     JNIEnv* bridged = nullptr;
     sameEnv += VLXJBXJNIUtilities::GetJNIEnv(bridged, VLXListValVLXUnicodeString()) == VLX_S_OK && bridged == own;
@@ -124,15 +120,12 @@ TEST_F(ThreadsTest, AThreadTheApplicationDetachedIsAttachedAgainByTheBridge)
   std::thread([&] {
     void* own = nullptr;
     JNIEnv* e = nullptr;
-    if (vm->AttachCurrentThread(&own, nullptr) != JNI_OK)
-      return;
+    if (vm->AttachCurrentThread(&own, nullptr) != JNI_OK) return;
     for (int round = 0; round < 2; ++round) {
-      if (VLXJBXJNIUtilities::GetJNIEnv(e, VLXListValVLXUnicodeString()) != VLX_S_OK)
-        return;
+      if (VLXJBXJNIUtilities::GetJNIEnv(e, VLXListValVLXUnicodeString()) != VLX_S_OK) return;
       vm->DetachCurrentThread();
-      if (VLXJBXJNIUtilities::GetJNIEnv(e, VLXListValVLXUnicodeString()) != VLX_S_OK || e == nullptr)
-        return;
-      jstring js = nullptr; // a real call through the new environment
+      if (VLXJBXJNIUtilities::GetJNIEnv(e, VLXListValVLXUnicodeString()) != VLX_S_OK || e == nullptr) return;
+      jstring js = nullptr;  // a real call through the new environment
       ok += VLXJBXJNIConverter::ConvertToJavaType(e, VLXUnicodeString("works \xE2\x9C\x93"), js) == VLX_S_OK &&
             e->GetStringLength(js) == 7;
       e->DeleteLocalRef(js);
@@ -145,4 +138,4 @@ TEST_F(ThreadsTest, AThreadTheApplicationDetachedIsAttachedAgainByTheBridge)
   EXPECT_FALSE(IsAlive(env, last.thread)) << "the bridge's own attachment ended with the thread";
 }
 
-} // namespace
+}  // namespace

@@ -7,15 +7,13 @@
 #include <string>
 #include <vector>
 
-struct FatalReport
-{
+struct FatalReport {
   std::string message, file;
   int line;
 };
 
-class FatalRecorder
-{
-public:
+class FatalRecorder {
+ public:
   FatalRecorder() : _previous(VLXSetFatalErrorHandler(&Record)) { Reports().clear(); }
   ~FatalRecorder() { VLXSetFatalErrorHandler(_previous); }
   FatalRecorder(const FatalRecorder&) = delete;
@@ -27,7 +25,7 @@ public:
     return reports;
   }
 
-private:
+ private:
   static void Record(const char* message, const char* file, int line)
   {
     Reports().push_back({message ? message : "", file ? file : "", line});

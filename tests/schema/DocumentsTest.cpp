@@ -53,7 +53,11 @@ TEST(XmlDocuments, RelativePathsFollowTheCurrentDirectory)
     ASSERT_EQ(0, mkdir(dir.c_str(), 0700));
     ASSERT_EQ(VLX_S_OK, sample.SetName(VLXUnicodeString(name)));
     std::ofstream(dir + "/doc.xml") << Xml(sample, 1, 0);
-    std::ofstream(dir + "/schema.xsd") << [&] { VLXUnicodeString x; sample.GetXsd(x); return Text(x); }();
+    std::ofstream(dir + "/schema.xsd") << [&] {
+      VLXUnicodeString x;
+      sample.GetXsd(x);
+      return Text(x);
+    }();
   }
   ASSERT_EQ(0, chdir((root + "/elsewhere").c_str()));
   VLXKDMReplica read, schema;

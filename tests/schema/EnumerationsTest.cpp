@@ -33,7 +33,8 @@ TEST(Enumerations, EveryEnumeratorCrossesBothWays)
 {
   VLXKDMAttributeDef attribute;
   ASSERT_EQ(VLX_S_OK, attribute.Build(VLXUnicodeString("weight"), VLXKDMAttributeType::Double));
-  RoundTrip<VLXKDMAccessMode::Mode>(attribute, 3, &VLXKDMAttributeDef::SetAccessMode, &VLXKDMAttributeDef::GetAccessMode);
+  RoundTrip<VLXKDMAccessMode::Mode>(attribute, 3, &VLXKDMAttributeDef::SetAccessMode,
+                                    &VLXKDMAttributeDef::GetAccessMode);
   RoundTrip<VLXKDMAggregationType::Type>(attribute, 2, &VLXKDMAttributeDef::SetAggregationType,
                                          &VLXKDMAttributeDef::GetAggregationType);
   RoundTrip<VLXKDMVisibility::Mode>(attribute, 3, &VLXKDMAttributeDef::SetSoftwareVisibility,
@@ -113,7 +114,8 @@ TEST(Enumerations, ValuesOutOfRangeAreReportedAndNeverReachJava)
   const std::vector<OutOfRange> cases = {
       {"SetAccessMode(3)", [&] { return attribute.SetAccessMode(static_cast<VLXKDMAccessMode::Mode>(3)); },
        "AssertionFailed:mode != NULL", kAttributeDefSource, 245},
-      {"SetAggregationType(-1)", [&] { return attribute.SetAggregationType(static_cast<VLXKDMAggregationType::Type>(-1)); },
+      {"SetAggregationType(-1)",
+       [&] { return attribute.SetAggregationType(static_cast<VLXKDMAggregationType::Type>(-1)); },
        "AssertionFailed:agg != NULL", kAttributeDefSource, 139},
       {"AttributeDef SetSoftwareVisibility(3)",
        [&] { return attribute.SetSoftwareVisibility(static_cast<VLXKDMVisibility::Mode>(3)); },

@@ -67,16 +67,16 @@ std::string JavaThreads()
   jclass thread = checked(env->FindClass("java/lang/Thread"));
   jclass map = checked(env->FindClass("java/util/Map"));
   jclass object = checked(env->FindClass("java/lang/Object"));
-  jobject all = checked(env->CallStaticObjectMethod(
-      thread, env->GetStaticMethodID(thread, "getAllStackTraces", "()Ljava/util/Map;")));
+  jobject all = checked(
+      env->CallStaticObjectMethod(thread, env->GetStaticMethodID(thread, "getAllStackTraces", "()Ljava/util/Map;")));
   jobject keys = checked(env->CallObjectMethod(all, env->GetMethodID(map, "keySet", "()Ljava/util/Set;")));
   jstring text = static_cast<jstring>(
       checked(env->CallObjectMethod(keys, env->GetMethodID(object, "toString", "()Ljava/lang/String;"))));
   const char* chars = env->GetStringUTFChars(text, nullptr);
   const std::string result = chars;
   env->ReleaseStringUTFChars(text, chars);
-  for (jobject local : {static_cast<jobject>(thread), static_cast<jobject>(map), static_cast<jobject>(object), all, keys,
-                        static_cast<jobject>(text)})
+  for (jobject local : {static_cast<jobject>(thread), static_cast<jobject>(map), static_cast<jobject>(object), all,
+                        keys, static_cast<jobject>(text)})
     env->DeleteLocalRef(local);
   return result;
 }
@@ -125,7 +125,8 @@ TEST(StartupNoJvm, AJvmThatCannotBeCreatedRaisesTheNoEnvironmentError)
   const long second = replica.GetName(name);
   EXPECT_EQ("", out.Finish());
   const std::string diagnostics = err.Finish();
-  EXPECT_NE(std::string::npos, diagnostics.find("Error VLXJBXJNIUtilities::GetJNIEnv\nError VLXJBXJNIUtilities::GetJNIEnv\n"))
+  EXPECT_NE(std::string::npos,
+            diagnostics.find("Error VLXJBXJNIUtilities::GetJNIEnv\nError VLXJBXJNIUtilities::GetJNIEnv\n"))
       << diagnostics;
   EXPECT_LT(first, 0);
   EXPECT_LT(second, 0);

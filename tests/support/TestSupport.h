@@ -137,8 +137,10 @@ J CallOn(jobject object, const char* name, const char* signature)
   Local cls(env->GetObjectClass(object));
   const jmethodID method = env->GetMethodID(static_cast<jclass>(cls.get()), name, signature);
   J value{};
-  if constexpr (std::is_same_v<J, jlong>) value = env->CallLongMethod(object, method);
-  else value = env->CallBooleanMethod(object, method);
+  if constexpr (std::is_same_v<J, jlong>)
+    value = env->CallLongMethod(object, method);
+  else
+    value = env->CallBooleanMethod(object, method);
   return NoPending(name) ? value : J{};
 }
 inline jlong TimeOf(jobject date) { return CallOn<jlong>(date, "getTime", "()J"); }
@@ -166,12 +168,16 @@ inline jobjectArray NewArray(const char* elementClass, const std::vector<jobject
 {
   JNIEnv* env = Env();
   Local cls(env->FindClass(elementClass));
-  jobjectArray array = env->NewObjectArray(static_cast<jsize>(elements.size()), static_cast<jclass>(cls.get()), nullptr);
+  jobjectArray array =
+      env->NewObjectArray(static_cast<jsize>(elements.size()), static_cast<jclass>(cls.get()), nullptr);
   for (size_t i = 0; i < elements.size() && NoPending("making an array"); ++i)
     env->SetObjectArrayElement(array, static_cast<jsize>(i), elements[i]);
   return NoPending("filling an array") ? array : nullptr;
 }
-inline jobject Element(jobject array, int index) { return Env()->GetObjectArrayElement(static_cast<jobjectArray>(array), index); }
+inline jobject Element(jobject array, int index)
+{
+  return Env()->GetObjectArrayElement(static_cast<jobjectArray>(array), index);
+}
 inline int Length(jobject array) { return array ? Env()->GetArrayLength(static_cast<jarray>(array)) : -1; }
 inline bool Same(jobject a, jobject b) { return Env()->IsSameObject(a, b) == JNI_TRUE; }
 
@@ -220,8 +226,8 @@ struct LocalRootCount {
   jlong threadId;
   long count;
 };
-inline jint JNICALL CountLocalRoot(jvmtiHeapReferenceKind kind, const jvmtiHeapReferenceInfo* info, jlong, jlong,
-                                   jlong, jlong*, jlong*, jint, void* data)
+inline jint JNICALL CountLocalRoot(jvmtiHeapReferenceKind kind, const jvmtiHeapReferenceInfo* info, jlong, jlong, jlong,
+                                   jlong*, jlong*, jint, void* data)
 {
   LocalRootCount* counter = static_cast<LocalRootCount*>(data);
   if (kind == JVMTI_HEAP_REFERENCE_JNI_LOCAL && info && info->jni_local.thread_id == counter->threadId)
@@ -247,7 +253,8 @@ inline long LocalRefCount()
   {
     Local threadClass(env->FindClass("java/lang/Thread"));
     const jclass cls = static_cast<jclass>(threadClass.get());
-    Local thread(env->CallStaticObjectMethod(cls, env->GetStaticMethodID(cls, "currentThread", "()Ljava/lang/Thread;")));
+    Local thread(
+        env->CallStaticObjectMethod(cls, env->GetStaticMethodID(cls, "currentThread", "()Ljava/lang/Thread;")));
     if (!NoPending("Thread.currentThread")) return -1;
     counter.threadId = CallOn<jlong>(thread.get(), "getId", "()J");
   }
@@ -275,13 +282,19 @@ struct AttributeShape {
 inline const std::vector<AttributeShape>& SampleAttributes()
 {
   static const std::vector<AttributeShape> attributes = {
-      {"integer", VLXKDMAttributeType::Integer, false},   {"double", VLXKDMAttributeType::Double, false},
-      {"string", VLXKDMAttributeType::String, false},     {"date", VLXKDMAttributeType::Date, false},
-      {"boolean", VLXKDMAttributeType::Boolean, false},   {"binary", VLXKDMAttributeType::Binary, false},
+      {"integer", VLXKDMAttributeType::Integer, false},
+      {"double", VLXKDMAttributeType::Double, false},
+      {"string", VLXKDMAttributeType::String, false},
+      {"date", VLXKDMAttributeType::Date, false},
+      {"boolean", VLXKDMAttributeType::Boolean, false},
+      {"binary", VLXKDMAttributeType::Binary, false},
       {"instance", VLXKDMAttributeType::Relationship, false},
-      {"integers", VLXKDMAttributeType::Integer, true},   {"doubles", VLXKDMAttributeType::Double, true},
-      {"strings", VLXKDMAttributeType::String, true},     {"dates", VLXKDMAttributeType::Date, true},
-      {"booleans", VLXKDMAttributeType::Boolean, true},   {"binaries", VLXKDMAttributeType::Binary, true},
+      {"integers", VLXKDMAttributeType::Integer, true},
+      {"doubles", VLXKDMAttributeType::Double, true},
+      {"strings", VLXKDMAttributeType::String, true},
+      {"dates", VLXKDMAttributeType::Date, true},
+      {"booleans", VLXKDMAttributeType::Boolean, true},
+      {"binaries", VLXKDMAttributeType::Binary, true},
       {"instances", VLXKDMAttributeType::Relationship, true},
   };
   return attributes;

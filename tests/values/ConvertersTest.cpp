@@ -49,9 +49,20 @@ TEST_F(Converters, DateMillisecondsRoundToSecondsAtTheBoundaries)
   const struct {
     jlong ms;
     time_t seconds;
-  } cases[] = {{1499, 1},    {1500, 2},   {-1, 0},       {-1500, -1},      {-1501, -2},
-               {-2500, -2},  {0, 0},      {-499, 0},     {-500, 0},        {-501, -1},
-               {-1400, -1},  {999, 1},    {-86400000, -86400},             {LLONG_MAX, LLONG_MAX / 1000 + 1},
+  } cases[] = {{1499, 1},
+               {1500, 2},
+               {-1, 0},
+               {-1500, -1},
+               {-1501, -2},
+               {-2500, -2},
+               {0, 0},
+               {-499, 0},
+               {-500, 0},
+               {-501, -1},
+               {-1400, -1},
+               {999, 1},
+               {-86400000, -86400},
+               {LLONG_MAX, LLONG_MAX / 1000 + 1},
                {LLONG_MIN, LLONG_MIN / 1000 - 1}};
   std::vector<jobject> dates;
   for (const auto& c : cases) {
@@ -92,9 +103,16 @@ TEST_F(Converters, SecondsBecomeMillisecondsAndComeBackUnchanged)
   const struct {
     time_t seconds;
     jlong ms;
-  } cases[] = {{1, 1000},   {2, 2000},   {0, 0}, {-1, -1000}, {-2, -2000}, {-86400, -86400000},
-               {-305942400, -305942400000LL}, {1700000000, 1700000000000LL},
-               {LLONG_MAX / 1000, LLONG_MAX / 1000 * 1000}, {LLONG_MIN / 1000, LLONG_MIN / 1000 * 1000}};
+  } cases[] = {{1, 1000},
+               {2, 2000},
+               {0, 0},
+               {-1, -1000},
+               {-2, -2000},
+               {-86400, -86400000},
+               {-305942400, -305942400000LL},
+               {1700000000, 1700000000000LL},
+               {LLONG_MAX / 1000, LLONG_MAX / 1000 * 1000},
+               {LLONG_MIN / 1000, LLONG_MIN / 1000 * 1000}};
   VLXListValVLXTime list;
   for (const auto& c : cases) {
     SCOPED_TRACE(c.seconds);

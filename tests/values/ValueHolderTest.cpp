@@ -324,8 +324,9 @@ TEST(ValuePreconditions, AValueWithoutTypeMakesNoJavaObject)
   EXPECT_EQ(nullptr, value.GetHandle());
   EXPECT_EQ("VLXKDMInstanceValue::InternalBuild(jobject&)", PeekLastError().parameters.at(0));
   EXPECT_LT(value.BuildRemote(), 0);  // tried again: a failure leaves the value unsynchronized
-  EXPECT_EQ((std::vector<std::string>{"AssertionFailed:_type != (Type) -1@380", "AssertionFailed:_type != (Type) -1@380"}),
-            Reports());
+  EXPECT_EQ(
+      (std::vector<std::string>{"AssertionFailed:_type != (Type) -1@380", "AssertionFailed:_type != (Type) -1@380"}),
+      Reports());
 }
 
 TEST(ValuePreconditions, AFailedBuildRemoteIsTriedAgain)
@@ -356,15 +357,23 @@ TEST(ValuePreconditions, EachGetterReportsAValueOfAnotherTypeOrKind)
   const std::vector<VLXKDMInstance> instances = NewInstances(1);
   const std::vector<Case> cases = Cases(1, instances);
   const std::function<void(const VLXKDMInstanceValue&)> getters[] = {
-      [](const VLXKDMInstanceValue& v) { v.GetInteger(); },       [](const VLXKDMInstanceValue& v) { v.GetDouble(); },
-      [](const VLXKDMInstanceValue& v) { v.GetBoolean(); },       [](const VLXKDMInstanceValue& v) { v.GetString(); },
-      [](const VLXKDMInstanceValue& v) { v.GetDate(); },          [](const VLXKDMInstanceValue& v) { v.GetBinary(); },
-      [](const VLXKDMInstanceValue& v) { v.GetInstance(); },      [](const VLXKDMInstanceValue& v) { v.GetListOfInteger(); },
-      [](const VLXKDMInstanceValue& v) { v.GetListOfDouble(); },  [](const VLXKDMInstanceValue& v) { v.GetListOfBoolean(); },
-      [](const VLXKDMInstanceValue& v) { v.GetListOfString(); },  [](const VLXKDMInstanceValue& v) { v.GetListOfDate(); },
-      [](const VLXKDMInstanceValue& v) { v.GetListOfBinary(); },  [](const VLXKDMInstanceValue& v) { v.GetListOfInstance(); },
+      [](const VLXKDMInstanceValue& v) { v.GetInteger(); },
+      [](const VLXKDMInstanceValue& v) { v.GetDouble(); },
+      [](const VLXKDMInstanceValue& v) { v.GetBoolean(); },
+      [](const VLXKDMInstanceValue& v) { v.GetString(); },
+      [](const VLXKDMInstanceValue& v) { v.GetDate(); },
+      [](const VLXKDMInstanceValue& v) { v.GetBinary(); },
+      [](const VLXKDMInstanceValue& v) { v.GetInstance(); },
+      [](const VLXKDMInstanceValue& v) { v.GetListOfInteger(); },
+      [](const VLXKDMInstanceValue& v) { v.GetListOfDouble(); },
+      [](const VLXKDMInstanceValue& v) { v.GetListOfBoolean(); },
+      [](const VLXKDMInstanceValue& v) { v.GetListOfString(); },
+      [](const VLXKDMInstanceValue& v) { v.GetListOfDate(); },
+      [](const VLXKDMInstanceValue& v) { v.GetListOfBinary(); },
+      [](const VLXKDMInstanceValue& v) { v.GetListOfInstance(); },
   };
-  const char* types[] = {"IntegerType", "DoubleType", "BooleanType", "StringType", "DateType", "BinaryType", "InstanceType"};
+  const char* types[] = {"IntegerType", "DoubleType", "BooleanType", "StringType",
+                         "DateType",    "BinaryType", "InstanceType"};
   // The getters are declared single first, then lists, each in the order of the texts above.
   for (size_t g = 0; g < std::size(getters); ++g) {
     const bool list = g >= 7;

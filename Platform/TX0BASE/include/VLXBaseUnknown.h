@@ -20,8 +20,7 @@
 #include <typeinfo>
 
 // An interface identifier.
-struct VLXIID
-{
+struct VLXIID {
   unsigned int Data1;
   unsigned short Data2;
   unsigned short Data3;
@@ -34,9 +33,8 @@ inline bool operator!=(const VLXIID& a, const VLXIID& b) { return !(a == b); }
 // The identifier of the VLXBaseUnknown interface, which every object answers.
 extern const VLXIID IID_VLXBaseUnknown;
 
-class VLXBaseUnknown
-{
-public:
+class VLXBaseUnknown {
+ public:
   VLXBaseUnknown() = default;
   // A copy has its own reference count (1); the implementation pointer and component state are copied.
   VLXBaseUnknown(const VLXBaseUnknown& other);
@@ -95,7 +93,7 @@ public:
   // The state last given to ChangeComponentState.
   int GetComponentState() const { return _componentState; }
 
-private:
+ private:
   std::atomic<unsigned long> _refCount{1};
   void* _impl = nullptr;
   int _componentState = 0;

@@ -4,9 +4,8 @@
 
 #include <vector>
 
-class VLXBinary
-{
-public:
+class VLXBinary {
+ public:
   VLXBinary() = default;
   // `length` zero bytes (a length below 1 gives the empty buffer).
   explicit VLXBinary(int length);
@@ -26,7 +25,7 @@ public:
   int operator==(const VLXBinary& other) const { return _bytes == other._bytes; }
   int operator!=(const VLXBinary& other) const { return _bytes != other._bytes; }
 
-private:
+ private:
   std::vector<unsigned char> _bytes;
 };
 

@@ -17,15 +17,13 @@
 #include <vector>
 
 // One row of a message catalog.
-struct VLXMessageEntry
-{
+struct VLXMessageEntry {
   const char* id;
   const char* text;
 };
 
-class VLXError : public VLXBaseUnknown
-{
-public:
+class VLXError : public VLXBaseUnknown {
+ public:
   // Kinds of GetReturn.
   static const int ReturnSuccess = 1;
   static const int ReturnError = 2;
@@ -83,7 +81,7 @@ public:
   // since the thread's last MarkOperationStart (or ever, if there was none); otherwise null.
   static VLXError* VLXGetOperationError();
 
-private:
+ private:
   std::string _id;
   std::string _catalog;
   std::vector<VLXUnicodeString> _parameters;

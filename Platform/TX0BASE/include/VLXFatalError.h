@@ -12,8 +12,8 @@ typedef void (*VLXFatalErrorHandler)(const char* message, const char* file, int 
 // Reports a fatal error. `message` may be null. The three texts after it are optional details
 // (null when absent); when present they are appended to the message, separated by blanks, before
 // the handler sees it. `file` may be null.
-void VLXFatalError(const char* message, const char* detail1, const char* detail2, const char* detail3,
-                   const char* file, int line);
+void VLXFatalError(const char* message, const char* detail1, const char* detail2, const char* detail3, const char* file,
+                   int line);
 
 // Installs `handler` (null restores the default one) and returns the handler that was installed
 // before (never null). Safe to call from any thread.

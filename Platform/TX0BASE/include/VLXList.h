@@ -15,16 +15,14 @@
 #include <vector>
 
 template <class T>
-class VLXList
-{
-public:
+class VLXList {
+ public:
   typedef T ElementType;
 
   // An empty list; a positive `sizeHint` reserves room for that many elements.
   explicit VLXList(int sizeHint = 0)
   {
-    if (sizeHint > 0)
-      _items.reserve(static_cast<std::size_t>(sizeHint));
+    if (sizeHint > 0) _items.reserve(static_cast<std::size_t>(sizeHint));
   }
   VLXList(const VLXList&) = default;
   VLXList(VLXList&&) noexcept = default;
@@ -37,14 +35,12 @@ public:
 
   T& operator[](int position)
   {
-    if (!InRange(position))
-      return OutOfRange(__LINE__);
+    if (!InRange(position)) return OutOfRange(__LINE__);
     return _items[static_cast<std::size_t>(position - 1)];
   }
   const T& operator[](int position) const
   {
-    if (!InRange(position))
-      return OutOfRange(__LINE__);
+    if (!InRange(position)) return OutOfRange(__LINE__);
     return _items[static_cast<std::size_t>(position - 1)];
   }
 
@@ -72,11 +68,9 @@ public:
   // A `from` below 1 counts as 1; a `from` beyond Size() gives 0.
   int Locate(const T& value, int from = 1) const
   {
-    if (from < 1)
-      from = 1;
+    if (from < 1) from = 1;
     for (int p = from; p <= Size(); ++p)
-      if (_items[static_cast<std::size_t>(p - 1)] == value)
-        return p;
+      if (_items[static_cast<std::size_t>(p - 1)] == value) return p;
     return 0;
   }
 
@@ -98,13 +92,12 @@ public:
   int operator==(const VLXList& other) const { return this == &other || _items == other._items; }
   int operator!=(const VLXList& other) const { return !(*this == other); }
 
-private:
+ private:
   bool InRange(int position) const { return position >= 1 && position <= Size(); }
 
   static T& OutOfRange(int line)
   {
-    VLXFatalError("AssertionFailed: position >= 1 && position <= Size()", nullptr, nullptr, nullptr,
-                  __FILE__, line);
+    VLXFatalError("AssertionFailed: position >= 1 && position <= Size()", nullptr, nullptr, nullptr, __FILE__, line);
     static thread_local T scratch;
     scratch = T();
     return scratch;
@@ -115,14 +108,13 @@ private:
 
 // Declares the named list class `Name` of elements `Type` and its typedef `OfName`. A named class
 // (rather than a bare typedef) lets other headers forward-declare the list.
-#define VLX_DECLARE_VALUE_LIST(Name, Type, OfName)                                                \
-  class Name : public VLXList<Type>                                                              \
-  {                                                                                              \
-  public:                                                                                        \
-    Name() = default;                                                                            \
-    explicit Name(int sizeHint) : VLXList<Type>(sizeHint) {}                                     \
-    Name(const VLXList<Type>& other) : VLXList<Type>(other) {}                                   \
-  };                                                                                             \
+#define VLX_DECLARE_VALUE_LIST(Name, Type, OfName)             \
+  class Name : public VLXList<Type> {                          \
+   public:                                                     \
+    Name() = default;                                          \
+    explicit Name(int sizeHint) : VLXList<Type>(sizeHint) {}   \
+    Name(const VLXList<Type>& other) : VLXList<Type>(other) {} \
+  };                                                           \
   typedef Name OfName;
 
 #endif

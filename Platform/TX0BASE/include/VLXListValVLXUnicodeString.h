@@ -1,4 +1,5 @@
-// VLXListValVLXUnicodeString (also VLXListOfVLXUnicodeString): value list of VLXUnicodeString, positions from 1. See VLXList.h.
+// VLXListValVLXUnicodeString (also VLXListOfVLXUnicodeString): value list of VLXUnicodeString, positions from 1. See
+// VLXList.h.
 #ifndef VLXListValVLXUnicodeString_h
 #define VLXListValVLXUnicodeString_h
 

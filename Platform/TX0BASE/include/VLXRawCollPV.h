@@ -11,29 +11,25 @@
 #include <cstddef>
 #include <vector>
 
-namespace VLXCollec
-{
+namespace VLXCollec {
 // What RemoveAll does with the storage.
-enum MemoryHandling
-{
-  KeepMemory = 0, // keep the storage's capacity for later appends
-  FreeMemory = 1  // free the storage
+enum MemoryHandling {
+  KeepMemory = 0,  // keep the storage's capacity for later appends
+  FreeMemory = 1   // free the storage
 };
-}
+}  // namespace VLXCollec
 
 // The root of the collection classes; it holds nothing.
-class VLXCollecRoot
-{
-public:
+class VLXCollecRoot {
+ public:
   VLXCollecRoot() = default;
   VLXCollecRoot(const VLXCollecRoot&) = default;
   VLXCollecRoot& operator=(const VLXCollecRoot&) = default;
   virtual ~VLXCollecRoot();
 };
 
-class VLXRawCollPV : public VLXCollecRoot
-{
-public:
+class VLXRawCollPV : public VLXCollecRoot {
+ public:
   // An empty list; a positive `sizeHint` reserves room for that many pointers.
   explicit VLXRawCollPV(int sizeHint = 0);
   VLXRawCollPV(const VLXRawCollPV&) = default;
@@ -81,8 +77,7 @@ public:
     for (int i = 0; i < n; ++i) {
       const int r = compare(static_cast<E*>(a._items[static_cast<std::size_t>(i)]),
                             static_cast<E*>(b._items[static_cast<std::size_t>(i)]));
-      if (r != 0)
-        return r;
+      if (r != 0) return r;
     }
     return a.Size() < b.Size() ? -1 : (a.Size() > b.Size() ? 1 : 0);
   }
@@ -90,7 +85,7 @@ public:
   // The number of pointers the current storage can hold without growing (0: no storage).
   int Capacity() const { return static_cast<int>(_items.capacity()); }
 
-private:
+ private:
   template <class Less>
   void SortWith(Less less)
   {

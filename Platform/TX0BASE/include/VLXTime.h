@@ -4,9 +4,8 @@
 
 #include <ctime>
 
-class VLXTime
-{
-public:
+class VLXTime {
+ public:
   VLXTime() = default;
   VLXTime(const VLXTime&) = default;
   VLXTime& operator=(const VLXTime&) = default;
@@ -17,7 +16,7 @@ public:
   int operator==(const VLXTime& other) const { return _seconds == other._seconds; }
   int operator!=(const VLXTime& other) const { return _seconds != other._seconds; }
 
-private:
+ private:
   time_t _seconds = 0;
 };
 

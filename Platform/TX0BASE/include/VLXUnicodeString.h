@@ -9,9 +9,8 @@
 
 #include <string>
 
-class VLXUnicodeString
-{
-public:
+class VLXUnicodeString {
+ public:
   VLXUnicodeString() = default;
   // The NUL-terminated text; null gives the empty string.
   VLXUnicodeString(const char* utf8);
@@ -47,7 +46,7 @@ public:
   int operator==(const VLXUnicodeString& other) const { return _bytes == other._bytes; }
   int operator!=(const VLXUnicodeString& other) const { return _bytes != other._bytes; }
 
-private:
+ private:
   std::string _bytes;
 };
 

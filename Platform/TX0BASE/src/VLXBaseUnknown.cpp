@@ -16,8 +16,7 @@ bool operator==(const VLXIID& a, const VLXIID& b)
          std::memcmp(a.Data4, b.Data4, sizeof a.Data4) == 0;
 }
 
-namespace
-{
+namespace {
 std::string Demangle(const std::type_info& type)
 {
   int status = 0;
@@ -30,21 +29,17 @@ std::string Demangle(const std::type_info& type)
 // Walks the class and its bases (Itanium C++ ABI type information) looking for `name`.
 bool IsKindOf(const std::type_info& type, const char* name)
 {
-  if (Demangle(type) == name)
-    return true;
-  if (auto* single = dynamic_cast<const abi::__si_class_type_info*>(&type))
-    return IsKindOf(*single->__base_type, name);
+  if (Demangle(type) == name) return true;
+  if (auto* single = dynamic_cast<const abi::__si_class_type_info*>(&type)) return IsKindOf(*single->__base_type, name);
   if (auto* multiple = dynamic_cast<const abi::__vmi_class_type_info*>(&type)) {
     for (unsigned int i = 0; i < multiple->__base_count; ++i)
-      if (IsKindOf(*multiple->__base_info[i].__base_type, name))
-        return true;
+      if (IsKindOf(*multiple->__base_info[i].__base_type, name)) return true;
   }
   return false;
 }
-}
+}  // namespace
 
-VLXBaseUnknown::VLXBaseUnknown(const VLXBaseUnknown& other)
-    : _impl(other._impl), _componentState(other._componentState)
+VLXBaseUnknown::VLXBaseUnknown(const VLXBaseUnknown& other) : _impl(other._impl), _componentState(other._componentState)
 {
 }
 
@@ -57,30 +52,20 @@ VLXBaseUnknown& VLXBaseUnknown::operator=(const VLXBaseUnknown& other)
 
 VLXBaseUnknown::~VLXBaseUnknown() = default;
 
-void* VLXBaseUnknown::operator new(std::size_t size) noexcept
-{
-  return std::malloc(size != 0 ? size : 1);
-}
+void* VLXBaseUnknown::operator new(std::size_t size) noexcept { return std::malloc(size != 0 ? size : 1); }
 
 void* VLXBaseUnknown::operator new(std::size_t size, const std::nothrow_t&) noexcept
 {
   return std::malloc(size != 0 ? size : 1);
 }
 
-void VLXBaseUnknown::operator delete(void* memory) noexcept
-{
-  std::free(memory);
-}
+void VLXBaseUnknown::operator delete(void* memory) noexcept { std::free(memory); }
 
-void VLXBaseUnknown::operator delete(void* memory, const std::nothrow_t&) noexcept
-{
-  std::free(memory);
-}
+void VLXBaseUnknown::operator delete(void* memory, const std::nothrow_t&) noexcept { std::free(memory); }
 
 long VLXBaseUnknown::QueryInterface(const VLXIID& iid, void** object)
 {
-  if (object == nullptr)
-    return VLX_E_INVALIDARG;
+  if (object == nullptr) return VLX_E_INVALIDARG;
   if (iid != IID_VLXBaseUnknown) {
     *object = nullptr;
     return VLX_E_NOINTERFACE;
@@ -90,38 +75,29 @@ long VLXBaseUnknown::QueryInterface(const VLXIID& iid, void** object)
   return VLX_S_OK;
 }
 
-unsigned long VLXBaseUnknown::AddRef()
-{
-  return _refCount.fetch_add(1, std::memory_order_relaxed) + 1;
-}
+unsigned long VLXBaseUnknown::AddRef() { return _refCount.fetch_add(1, std::memory_order_relaxed) + 1; }
 
 unsigned long VLXBaseUnknown::Release()
 {
   const unsigned long count = _refCount.fetch_sub(1, std::memory_order_acq_rel) - 1;
-  if (count == 0)
-    delete this;
+  if (count == 0) delete this;
   return count;
 }
 
 long VLXBaseUnknown::GetTypeInfoCount(unsigned int* count)
 {
-  if (count == nullptr)
-    return VLX_E_INVALIDARG;
+  if (count == nullptr) return VLX_E_INVALIDARG;
   *count = 0;
   return VLX_S_OK;
 }
 
 long VLXBaseUnknown::GetTypeInfo(unsigned int, unsigned long, void** typeInfo)
 {
-  if (typeInfo != nullptr)
-    *typeInfo = nullptr;
+  if (typeInfo != nullptr) *typeInfo = nullptr;
   return VLX_E_NOTIMPL;
 }
 
-long VLXBaseUnknown::GetIDsOfNames(const VLXIID&, char**, unsigned int, unsigned long, long*)
-{
-  return VLX_E_NOTIMPL;
-}
+long VLXBaseUnknown::GetIDsOfNames(const VLXIID&, char**, unsigned int, unsigned long, long*) { return VLX_E_NOTIMPL; }
 
 long VLXBaseUnknown::Invoke(long, const VLXIID&, unsigned long, unsigned short, void*, void*, void*, unsigned int*)
 {
@@ -130,8 +106,7 @@ long VLXBaseUnknown::Invoke(long, const VLXIID&, unsigned long, unsigned short, 
 
 long VLXBaseUnknown::QueryInterface(const char* interfaceName, void** object)
 {
-  if (object == nullptr)
-    return VLX_E_INVALIDARG;
+  if (object == nullptr) return VLX_E_INVALIDARG;
   if (interfaceName == nullptr || !IsAKindOf(interfaceName)) {
     *object = nullptr;
     return VLX_E_NOINTERFACE;
@@ -141,10 +116,7 @@ long VLXBaseUnknown::QueryInterface(const char* interfaceName, void** object)
   return VLX_S_OK;
 }
 
-const std::type_info& VLXBaseUnknown::GetMetaObject() const
-{
-  return typeid(*this);
-}
+const std::type_info& VLXBaseUnknown::GetMetaObject() const { return typeid(*this); }
 
 int VLXBaseUnknown::IsA(const char* className) const
 {
@@ -156,25 +128,13 @@ int VLXBaseUnknown::IsAKindOf(const char* className) const
   return className != nullptr && IsKindOf(typeid(*this), className);
 }
 
-void* VLXBaseUnknown::GetImpl() const
-{
-  return _impl;
-}
+void* VLXBaseUnknown::GetImpl() const { return _impl; }
 
-void VLXBaseUnknown::SetImpl(void* impl)
-{
-  _impl = impl;
-}
+void VLXBaseUnknown::SetImpl(void* impl) { _impl = impl; }
 
-int VLXBaseUnknown::IsNull() const
-{
-  return 0;
-}
+int VLXBaseUnknown::IsNull() const { return 0; }
 
-int VLXBaseUnknown::IsEqual(const VLXBaseUnknown* other) const
-{
-  return other == this;
-}
+int VLXBaseUnknown::IsEqual(const VLXBaseUnknown* other) const { return other == this; }
 
 long VLXBaseUnknown::ChangeComponentState(int state)
 {

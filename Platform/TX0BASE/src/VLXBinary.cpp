@@ -4,8 +4,7 @@
 
 VLXBinary::VLXBinary(int length)
 {
-  if (length > 0)
-    _bytes.assign(static_cast<size_t>(length), 0);
+  if (length > 0) _bytes.assign(static_cast<size_t>(length), 0);
 }
 
 VLXBinary::VLXBinary(const void* data, int length)

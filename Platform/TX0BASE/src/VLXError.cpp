@@ -7,12 +7,10 @@
 #include <mutex>
 #include <string>
 
-namespace
-{
+namespace {
 // The catalogs registered in the process. Never destroyed: error objects may be read during
 // process exit, after static destructors have started.
-struct CatalogRegistry
-{
+struct CatalogRegistry {
   std::mutex mutex;
   std::map<std::string, std::map<std::string, std::string>> catalogs;
 };
@@ -24,15 +22,13 @@ CatalogRegistry& Catalogs()
 }
 
 // The calling thread's last error; the slot owns one reference, released when the thread exits.
-struct LastErrorSlot
-{
+struct LastErrorSlot {
   VLXError* error = nullptr;
   ~LastErrorSlot()
   {
     VLXError* e = error;
     error = nullptr;
-    if (e != nullptr)
-      e->Release();
+    if (e != nullptr) e->Release();
   }
 };
 
@@ -41,7 +37,7 @@ thread_local LastErrorSlot t_lastError;
 // which has a destructor: a trivial thread-local is reached without an initialisation check, and
 // the mark is made at the start of every operation.
 thread_local bool t_lastErrorFresh = false;
-}
+}  // namespace
 
 VLXError::VLXError(const char* messageId, const char* catalog)
     : _id(messageId ? messageId : ""), _catalog(catalog ? catalog : "")
@@ -57,8 +53,8 @@ VLXError::~VLXError() = default;
 const VLXUnicodeString& VLXError::GetNLSParameter(int position) const
 {
   if (position < 1 || position > GetNLSParameterCount()) {
-    VLXFatalError("AssertionFailed: position >= 1 && position <= GetNLSParameterCount()", nullptr, nullptr,
-                  nullptr, __FILE__, __LINE__);
+    VLXFatalError("AssertionFailed: position >= 1 && position <= GetNLSParameterCount()", nullptr, nullptr, nullptr,
+                  __FILE__, __LINE__);
     static const VLXUnicodeString empty;
     return empty;
   }
@@ -68,8 +64,7 @@ const VLXUnicodeString& VLXError::GetNLSParameter(int position) const
 void VLXError::SetNLSRequestParams(int count, const VLXUnicodeString* params)
 {
   _parameters.clear();
-  if (count > 0 && params != nullptr)
-    _parameters.assign(params, params + count);
+  if (count > 0 && params != nullptr) _parameters.assign(params, params + count);
 }
 
 void VLXError::SetSource(const char* file, int line)
@@ -80,28 +75,23 @@ void VLXError::SetSource(const char* file, int line)
 
 void VLXError::RegisterCatalog(const char* catalog, const VLXMessageEntry* entries, int count)
 {
-  if (catalog == nullptr || entries == nullptr)
-    return;
+  if (catalog == nullptr || entries == nullptr) return;
   CatalogRegistry& registry = Catalogs();
   std::lock_guard<std::mutex> lock(registry.mutex);
   auto& texts = registry.catalogs[catalog];
   for (int i = 0; i < count; ++i)
-    if (entries[i].id != nullptr)
-      texts[entries[i].id] = entries[i].text ? entries[i].text : "";
+    if (entries[i].id != nullptr) texts[entries[i].id] = entries[i].text ? entries[i].text : "";
 }
 
 int VLXError::LookupMessage(const char* catalog, const char* id, VLXUnicodeString& text)
 {
-  if (catalog == nullptr || id == nullptr)
-    return 0;
+  if (catalog == nullptr || id == nullptr) return 0;
   CatalogRegistry& registry = Catalogs();
   std::lock_guard<std::mutex> lock(registry.mutex);
   auto c = registry.catalogs.find(catalog);
-  if (c == registry.catalogs.end())
-    return 0;
+  if (c == registry.catalogs.end()) return 0;
   auto t = c->second.find(id);
-  if (t == c->second.end())
-    return 0;
+  if (t == c->second.end()) return 0;
   text = VLXUnicodeString(t->second.data(), static_cast<int>(t->second.size()));
   return 1;
 }
@@ -115,8 +105,7 @@ VLXUnicodeString VLXError::GetMessageText() const
     if (!_parameters.empty()) {
       out += " (";
       for (size_t i = 0; i < _parameters.size(); ++i) {
-        if (i > 0)
-          out += ", ";
+        if (i > 0) out += ", ";
         out.append(_parameters[i].c_str(), static_cast<size_t>(_parameters[i].GetLengthInByte()));
       }
       out += ")";
@@ -129,8 +118,7 @@ VLXUnicodeString VLXError::GetMessageText() const
     if (t[i] == '/' && i + 2 < n && t[i + 1] == 'p' && t[i + 2] >= '0' && t[i + 2] <= '9') {
       int j = i + 2;
       long number = 0;
-      while (j < n && t[j] >= '0' && t[j] <= '9' && number < 1000000)
-        number = number * 10 + (t[j++] - '0');
+      while (j < n && t[j] >= '0' && t[j] <= '9' && number < 1000000) number = number * 10 + (t[j++] - '0');
       if (number >= 1 && number <= static_cast<long>(_parameters.size())) {
         const VLXUnicodeString& p = _parameters[static_cast<size_t>(number - 1)];
         out.append(p.c_str(), static_cast<size_t>(p.GetLengthInByte()));
@@ -146,8 +134,7 @@ VLXUnicodeString VLXError::GetMessageText() const
 VLXError* VLXError::VLXGetLastError(long, void*)
 {
   VLXError* e = t_lastError.error;
-  if (e != nullptr)
-    e->AddRef();
+  if (e != nullptr) e->AddRef();
   return e;
 }
 
@@ -155,34 +142,24 @@ void VLXError::VLXCleanLastError()
 {
   VLXError* e = t_lastError.error;
   t_lastError.error = nullptr;
-  if (e != nullptr)
-    e->Release();
+  if (e != nullptr) e->Release();
 }
 
 long VLXError::GetReturn(int kind, VLXError* error, void*, const char* file, int line)
 {
-  if (kind == ReturnSuccess)
-    return VLX_S_OK;
-  if (kind != ReturnError)
-    return VLX_E_INVALIDARG;
+  if (kind == ReturnSuccess) return VLX_S_OK;
+  if (kind != ReturnError) return VLX_E_INVALIDARG;
   if (error != nullptr) {
     error->SetSource(file, line);
     VLXError* previous = t_lastError.error;
     t_lastError.error = error;
     t_lastErrorFresh = true;
     // Released after the swap: `previous` may be `error` itself (a re-raise without a clean).
-    if (previous != nullptr)
-      previous->Release();
+    if (previous != nullptr) previous->Release();
   }
   return VLX_E_FAIL;
 }
 
-void VLXError::MarkOperationStart()
-{
-  t_lastErrorFresh = false;
-}
+void VLXError::MarkOperationStart() { t_lastErrorFresh = false; }
 
-VLXError* VLXError::VLXGetOperationError()
-{
-  return t_lastErrorFresh ? VLXGetLastError(0, nullptr) : nullptr;
-}
+VLXError* VLXError::VLXGetOperationError() { return t_lastErrorFresh ? VLXGetLastError(0, nullptr) : nullptr; }

@@ -5,8 +5,7 @@
 #include <cstdlib>
 #include <string>
 
-namespace
-{
+namespace {
 void DefaultHandler(const char* message, const char* file, int line)
 {
   std::fprintf(stderr, "Fatal error: %s (%s:%d)\n", message ? message : "", file ? file : "?", line);
@@ -15,10 +14,10 @@ void DefaultHandler(const char* message, const char* file, int line)
 }
 
 std::atomic<VLXFatalErrorHandler> g_handler{&DefaultHandler};
-}
+}  // namespace
 
-void VLXFatalError(const char* message, const char* detail1, const char* detail2, const char* detail3,
-                   const char* file, int line)
+void VLXFatalError(const char* message, const char* detail1, const char* detail2, const char* detail3, const char* file,
+                   int line)
 {
   const VLXFatalErrorHandler handler = g_handler.load(std::memory_order_acquire);
   if (detail1 == nullptr && detail2 == nullptr && detail3 == nullptr) {
@@ -28,8 +27,7 @@ void VLXFatalError(const char* message, const char* detail1, const char* detail2
   std::string text = message ? message : "";
   for (const char* detail : {detail1, detail2, detail3})
     if (detail != nullptr) {
-      if (!text.empty())
-        text += ' ';
+      if (!text.empty()) text += ' ';
       text += detail;
     }
   handler(text.c_str(), file, line);

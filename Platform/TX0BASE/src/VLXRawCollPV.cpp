@@ -8,14 +8,12 @@ VLXCollecRoot::~VLXCollecRoot() = default;
 
 VLXRawCollPV::VLXRawCollPV(int sizeHint)
 {
-  if (sizeHint > 0)
-    _items.reserve(static_cast<size_t>(sizeHint));
+  if (sizeHint > 0) _items.reserve(static_cast<size_t>(sizeHint));
 }
 
 VLXRawCollPV::~VLXRawCollPV() = default;
 
-namespace
-{
+namespace {
 void*& Scratch(int line)
 {
   VLXFatalError("AssertionFailed: position >= 1 && position <= Size()", nullptr, nullptr, nullptr, __FILE__, line);
@@ -23,26 +21,21 @@ void*& Scratch(int line)
   scratch = nullptr;
   return scratch;
 }
-}
+}  // namespace
 
 void*& VLXRawCollPV::operator[](int position)
 {
-  if (position < 1 || position > Size())
-    return Scratch(__LINE__);
+  if (position < 1 || position > Size()) return Scratch(__LINE__);
   return _items[static_cast<size_t>(position - 1)];
 }
 
 void* const& VLXRawCollPV::operator[](int position) const
 {
-  if (position < 1 || position > Size())
-    return Scratch(__LINE__);
+  if (position < 1 || position > Size()) return Scratch(__LINE__);
   return _items[static_cast<size_t>(position - 1)];
 }
 
-void VLXRawCollPV::Append(void* pointer)
-{
-  _items.push_back(pointer);
-}
+void VLXRawCollPV::Append(void* pointer) { _items.push_back(pointer); }
 
 void VLXRawCollPV::RemovePosition(int position)
 {
@@ -72,18 +65,15 @@ void VLXRawCollPV::Size(int newSize)
 
 int VLXRawCollPV::Locate(void* pointer, int from) const
 {
-  if (from < 1)
-    from = 1;
+  if (from < 1) from = 1;
   for (int p = from; p <= Size(); ++p)
-    if (_items[static_cast<size_t>(p - 1)] == pointer)
-      return p;
+    if (_items[static_cast<size_t>(p - 1)] == pointer) return p;
   return 0;
 }
 
 void VLXRawCollPV::QuickSort(int (*compare)(const void*, const void*))
 {
-  if (compare == nullptr)
-    compare = &VLXRawCollPV::Compare;
+  if (compare == nullptr) compare = &VLXRawCollPV::Compare;
   SortWith([compare](void* a, void* b) { return compare(a, b) < 0; });
 }
 
@@ -96,7 +86,6 @@ int VLXRawCollPV::Compare(const void* a, const void* b)
 
 int VLXRawCollPV::Compare(const VLXRawCollPV& a, const VLXRawCollPV& b, int (*compare)(const void*, const void*))
 {
-  if (compare == nullptr)
-    compare = &VLXRawCollPV::Compare;
+  if (compare == nullptr) compare = &VLXRawCollPV::Compare;
   return Compare<const void>(a, b, compare);
 }

@@ -6,8 +6,7 @@ VLXUnicodeString::VLXUnicodeString(const char* utf8) : _bytes(utf8 ? utf8 : "") 
 
 VLXUnicodeString::VLXUnicodeString(const char* bytes, int length)
 {
-  if (bytes != nullptr && length > 0)
-    _bytes.assign(bytes, static_cast<size_t>(length));
+  if (bytes != nullptr && length > 0) _bytes.assign(bytes, static_cast<size_t>(length));
 }
 
 VLXUnicodeString& VLXUnicodeString::operator=(const char* utf8)
@@ -20,20 +19,16 @@ VLXUnicodeString& VLXUnicodeString::operator=(const char* utf8)
   return *this;
 }
 
-int VLXUnicodeString::IsWellFormed() const
-{
-  return FirstMalformedOffset(nullptr) < 0 ? 1 : 0;
-}
+int VLXUnicodeString::IsWellFormed() const { return FirstMalformedOffset(nullptr) < 0 ? 1 : 0; }
 
 int VLXUnicodeString::FirstMalformedOffset(const char** reason) const
 {
   return FirstMalformedOffset(_bytes.data(), GetLengthInByte(), reason);
 }
 
-namespace
-{
+namespace {
 bool IsContinuation(unsigned char b) { return (b & 0xC0) == 0x80; }
-}
+}  // namespace
 
 // Well-formed sequences (Unicode, table "Well-Formed UTF-8 Byte Sequences"):
 //   00..7F | C2..DF 80..BF | E0 A0..BF 80..BF | E1..EC 80..BF 80..BF | ED 80..9F 80..BF
@@ -49,9 +44,9 @@ int VLXUnicodeString::FirstMalformedOffset(const char* bytes, int length, const 
       ++i;
       continue;
     }
-    int need;             // continuation bytes after the lead byte
-    unsigned char lo = 0x80, hi = 0xBF; // allowed range of the second byte
-    const char* secondFault = nullptr;  // what a second byte outside [lo, hi] means
+    int need;                            // continuation bytes after the lead byte
+    unsigned char lo = 0x80, hi = 0xBF;  // allowed range of the second byte
+    const char* secondFault = nullptr;   // what a second byte outside [lo, hi] means
     if (IsContinuation(b)) {
       why = "unexpected continuation byte";
       break;
@@ -95,11 +90,9 @@ int VLXUnicodeString::FirstMalformedOffset(const char* bytes, int length, const 
         break;
       }
     }
-    if (why != nullptr)
-      break;
+    if (why != nullptr) break;
     i += need + 1;
   }
-  if (reason != nullptr)
-    *reason = why;
+  if (reason != nullptr) *reason = why;
   return why != nullptr ? i : -1;
 }

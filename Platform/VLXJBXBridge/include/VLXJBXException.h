@@ -8,8 +8,7 @@
 #include <initializer_list>
 #include <string>
 
-namespace VLXJBXMessages
-{
+namespace VLXJBXMessages {
 // The catalog name.
 inline constexpr const char Catalog[] = "VLXJBXInfraErrorMessages";
 // "no Java environment could be obtained for /p1: /p2" (/p1 the operation, /p2 the cause)
@@ -30,11 +29,10 @@ inline constexpr const char ExceptionPending[] = "VLXJBXInfraERR_1008";
 inline constexpr const char InvalidArgument[] = "VLXJBXInfraERR_1009";
 // "the Java side could not be bound for /p1: /p2 is missing"
 inline constexpr const char BindingMissing[] = "VLXJBXInfraERR_1010";
-}
+}  // namespace VLXJBXMessages
 
-class VLXJBXException : public VLXError
-{
-public:
+class VLXJBXException : public VLXError {
+ public:
   // An error with id `messageId` of `catalog` (normally VLXJBXMessages::Catalog). Parameters are
   // set with SetNLSRequestParams.
   VLXJBXException(const char* messageId, const char* catalog = VLXJBXMessages::Catalog);

@@ -27,9 +27,8 @@
 
 #include <jni.h>
 
-class VLXJBXJNIConverter
-{
-public:
+class VLXJBXJNIConverter {
+ public:
   // VLXUnicodeString <-> java.lang.String
   static long ConvertToJavaType(JNIEnv* env, const VLXUnicodeString& input, jstring& output);
   // The same for a caller that knows no exception is pending (not checked again); failures and

@@ -7,9 +7,8 @@
 
 #include <jni.h>
 
-class VLXJBXJNIHelper
-{
-public:
+class VLXJBXJNIHelper {
+ public:
   template <class... A>
   static jobject CallObjectMethod(JNIEnv* env, jobject obj, jmethodID method, A... args)
   {

@@ -14,9 +14,8 @@
 
 class VLXError;
 
-class VLXJBXJNIUtilities
-{
-public:
+class VLXJBXJNIUtilities {
+ public:
   // Writes the calling thread's JNIEnv into `env`.
   //
   // The first call of the process uses the JVM the process already has, or creates one. The class

@@ -7,9 +7,8 @@
 
 #include <jni.h>
 
-class VLXJBXJavaObject : public VLXBaseUnknown
-{
-public:
+class VLXJBXJavaObject : public VLXBaseUnknown {
+ public:
   // No handle; exchangedWithJava 0.
   VLXJBXJavaObject();
   // Refers to the same Java object as `other` through a global reference of its own, so it stays
@@ -39,7 +38,7 @@ public:
   // Set by the proxies when their Java object was handed to or received from Java code.
   unsigned char exchangedWithJava;
 
-protected:
+ protected:
   // Decides whether this object may hold `object` (not null; no Java exception pending). A derived
   // class bound to one Java class answers a negative code, with a last error naming the expected
   // and the actual class, for an object of any other. This one accepts every object.

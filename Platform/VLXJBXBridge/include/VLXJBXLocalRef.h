@@ -6,9 +6,8 @@
 
 #include <jni.h>
 
-class VLXJBXLocalRef
-{
-public:
+class VLXJBXLocalRef {
+ public:
   VLXJBXLocalRef() = default;
   // Takes over `ref` (may be null), a local reference made on `env`.
   VLXJBXLocalRef(JNIEnv* env, jobject ref) : _env(env), _ref(ref) {}
@@ -37,12 +36,11 @@ public:
   // Deletes the reference now (deleting is allowed with a Java exception pending).
   void reset()
   {
-    if (_ref != nullptr)
-      _env->DeleteLocalRef(_ref);
+    if (_ref != nullptr) _env->DeleteLocalRef(_ref);
     _ref = nullptr;
   }
 
-private:
+ private:
   JNIEnv* _env = nullptr;
   jobject _ref = nullptr;
 };

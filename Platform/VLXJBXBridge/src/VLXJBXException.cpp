@@ -4,8 +4,7 @@
 
 #include <mutex>
 
-namespace
-{
+namespace {
 const VLXMessageEntry kMessages[] = {
     {VLXJBXMessages::NoEnvironment, "no Java environment could be obtained for /p1: /p2"},
     {VLXJBXMessages::OperationFailed, "/p1 failed: /p2"},
@@ -28,7 +27,7 @@ void RegisterMessages()
 
 // The catalog is there as soon as the library is loaded.
 const bool kRegistered = (RegisterMessages(), true);
-}
+}  // namespace
 
 VLXJBXException::VLXJBXException(const char* messageId, const char* catalog) : VLXError(messageId, catalog)
 {
@@ -44,16 +43,15 @@ long VLXJBXDetail::Raise(long code, const char* id, std::initializer_list<std::s
   return VLXJBXException::Raise(code, id, parameters, file, line);
 }
 
-long VLXJBXException::Raise(long code, const char* id, std::initializer_list<std::string> parameters,
-                            const char* file, int line)
+long VLXJBXException::Raise(long code, const char* id, std::initializer_list<std::string> parameters, const char* file,
+                            int line)
 {
   VLXJBXException* error = new VLXJBXException(id, VLXJBXMessages::Catalog);
-  if (error == nullptr) // out of memory: the code alone must do
+  if (error == nullptr)  // out of memory: the code alone must do
     return code;
   std::vector<VLXUnicodeString> texts;
   texts.reserve(parameters.size());
-  for (const std::string& p : parameters)
-    texts.emplace_back(p.data(), static_cast<int>(p.size()));
+  for (const std::string& p : parameters) texts.emplace_back(p.data(), static_cast<int>(p.size()));
   error->SetNLSRequestParams(static_cast<int>(texts.size()), texts.data());
   VLXError::GetReturn(VLXError::ReturnError, error, nullptr, file, line);
   return code;

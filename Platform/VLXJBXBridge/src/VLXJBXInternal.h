@@ -11,23 +11,21 @@
 #include <string>
 #include <vector>
 
-namespace VLXJBXDetail
-{
+namespace VLXJBXDetail {
 using LocalRef = VLXJBXLocalRef;
 
 // Java classes and members of java.lang the bridge itself uses, resolved once per process through
 // uncounted global references that are never released. A member is null when its lookup failed.
-struct JavaLang
-{
+struct JavaLang {
   jclass stringClass = nullptr;
   jclass objectArrayClass = nullptr;
   jclass booleanArrayClass = nullptr;
   jclass byteArrayClass = nullptr;
   jclass intArrayClass = nullptr;
   jclass doubleArrayClass = nullptr;
-  jmethodID classGetName = nullptr;        // java.lang.Class.getName()
-  jmethodID throwableGetMessage = nullptr; // java.lang.Throwable.getMessage()
-  jmethodID throwableGetCause = nullptr;   // java.lang.Throwable.getCause()
+  jmethodID classGetName = nullptr;         // java.lang.Class.getName()
+  jmethodID throwableGetMessage = nullptr;  // java.lang.Throwable.getMessage()
+  jmethodID throwableGetCause = nullptr;    // java.lang.Throwable.getCause()
 };
 // Needs no pending exception.
 const JavaLang& Lang(JNIEnv* env);
@@ -43,11 +41,10 @@ JNIEnv* CurrentEnv();
 void CountGlobalRefs(long delta);
 
 // A Java exception in words.
-struct JavaExceptionText
-{
-  std::string className; // "java.lang.IllegalStateException"
-  std::string message;   // its getMessage(), "(no message)" when null
-  std::string cause;     // "; caused by <class>: <message>", or empty when it has no cause
+struct JavaExceptionText {
+  std::string className;  // "java.lang.IllegalStateException"
+  std::string message;    // its getMessage(), "(no message)" when null
+  std::string cause;      // "; caused by <class>: <message>", or empty when it has no cause
   // "class: message" followed by the cause.
   std::string Describe() const { return className + ": " + message + cause; }
 };
@@ -94,15 +91,13 @@ long WithUtf8(JNIEnv* env, jstring text, const char* operation, Use use)
     char bytes[3 * 256];
     env->GetStringRegion(text, 0, count, units);
     const long length = Utf16ToUtf8(units, count, bytes, false);
-    if (length < 0)
-      return RejectUnpairedSurrogate(operation, static_cast<jsize>(-1 - length), units[-1 - length]);
+    if (length < 0) return RejectUnpairedSurrogate(operation, static_cast<jsize>(-1 - length), units[-1 - length]);
     use(bytes, static_cast<int>(length));
     return 0;
   }
   std::string bytes;
   const long rc = LongTextToUtf8(env, text, count, operation, false, bytes);
-  if (rc < 0)
-    return rc;
+  if (rc < 0) return rc;
   use(bytes.data(), static_cast<int>(bytes.size()));
   return 0;
 }
@@ -116,6 +111,6 @@ std::string LibraryDirectory();
 std::string BuildClassPath(const char* classPathVariable, const std::string& libraryDirectory);
 // The whitespace-separated words of `text` (may be null).
 std::vector<std::string> SplitOptions(const char* text);
-}
+}  // namespace VLXJBXDetail
 
 #endif

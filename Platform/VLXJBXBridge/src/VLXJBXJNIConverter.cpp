@@ -10,8 +10,7 @@
 using VLXJBXDetail::LocalRef;
 using VLXJBXDetail::Raise;
 
-namespace
-{
+namespace {
 // Checks the environment and the pending-exception state shared by every conversion.
 long Enter(JNIEnv* env, const char* operation)
 {
@@ -28,15 +27,14 @@ long JavaFailed(JNIEnv* env, const char* operation, const char* step)
 {
   const std::string exception =
       env->ExceptionCheck() ? VLXJBXDetail::TakeException(env).Describe() : std::string("no exception");
-  return Raise(VLX_E_FAIL, VLXJBXMessages::ConversionFailed,
-               {operation, std::string(step) + " failed: " + exception}, __FILE__, __LINE__);
+  return Raise(VLX_E_FAIL, VLXJBXMessages::ConversionFailed, {operation, std::string(step) + " failed: " + exception},
+               __FILE__, __LINE__);
 }
 
 // `input` must be null or an instance of `cls` (when that class could be resolved).
 long CheckClass(JNIEnv* env, jobject input, jclass cls, const char* operation, const char* expected)
 {
-  if (input == nullptr || cls == nullptr || env->IsInstanceOf(input, cls))
-    return VLX_S_OK;
+  if (input == nullptr || cls == nullptr || env->IsInstanceOf(input, cls)) return VLX_S_OK;
   return Raise(VLX_E_INVALIDARG, VLXJBXMessages::InvalidArgument,
                {operation, std::string("the Java value is not a ") + expected}, __FILE__, __LINE__);
 }
@@ -57,8 +55,7 @@ long NewJavaString(JNIEnv* env, const char* bytes, int length, const char* opera
   const unsigned char* s = reinterpret_cast<const unsigned char*>(bytes);
   // An ASCII start is copied as it is; the rest, from the first other byte, is checked, then decoded.
   int i = 0;
-  for (; i < length && s[i] < 0x80; ++i)
-    units[i] = s[i];
+  for (; i < length && s[i] < 0x80; ++i) units[i] = s[i];
   jsize n = i;
   if (i < length) {
     const char* reason = nullptr;
@@ -95,8 +92,7 @@ long NewJavaString(JNIEnv* env, const char* bytes, int length, const char* opera
   }
   // NewString fails only with a null result (and an OutOfMemoryError pending).
   jstring result = env->NewString(units, n);
-  if (result == nullptr)
-    return JavaFailed(env, operation, "NewString");
+  if (result == nullptr) return JavaFailed(env, operation, "NewString");
   output = result;
   return VLX_S_OK;
 }
@@ -116,15 +112,12 @@ long ToJavaArray(JNIEnv* env, const Element* data, int size, JArray (JNIEnv::*ma
 {
   static_assert(sizeof(JElement) == sizeof(Element), "element layouts differ");
   const long rc = Enter(env, operation);
-  if (VLX_FAILED(rc))
-    return rc;
+  if (VLX_FAILED(rc)) return rc;
   LocalRef array(env, (env->*make)(size));
-  if (array.get() == nullptr || env->ExceptionCheck())
-    return JavaFailed(env, operation, "creating the array");
+  if (array.get() == nullptr || env->ExceptionCheck()) return JavaFailed(env, operation, "creating the array");
   if (size > 0) {
     (env->*set)(static_cast<JArray>(array.get()), 0, size, reinterpret_cast<const JElement*>(data));
-    if (env->ExceptionCheck())
-      return JavaFailed(env, operation, "filling the array");
+    if (env->ExceptionCheck()) return JavaFailed(env, operation, "filling the array");
   }
   output = static_cast<JArray>(array.release());
   return VLX_S_OK;
@@ -138,37 +131,31 @@ long FromJavaArray(JNIEnv* env, jobject input, jclass VLXJBXDetail::JavaLang::*c
 {
   static_assert(sizeof(JElement) == sizeof(Element), "element layouts differ");
   long rc = Enter(env, operation);
-  if (VLX_SUCCEEDED(rc))
-    rc = CheckClass(env, input, VLXJBXDetail::Lang(env).*cls, operation, javaName);
-  if (VLX_FAILED(rc))
-    return rc;
+  if (VLX_SUCCEEDED(rc)) rc = CheckClass(env, input, VLXJBXDetail::Lang(env).*cls, operation, javaName);
+  if (VLX_FAILED(rc)) return rc;
   buffer.clear();
-  if (input == nullptr)
-    return VLX_S_OK;
+  if (input == nullptr) return VLX_S_OK;
   JArray array = static_cast<JArray>(input);
   const jsize length = env->GetArrayLength(array);
   if (length > 0) {
     buffer.resize(static_cast<size_t>(length));
     (env->*get)(array, 0, length, reinterpret_cast<JElement*>(buffer.data()));
-    if (env->ExceptionCheck())
-      return JavaFailed(env, operation, "reading the array");
+    if (env->ExceptionCheck()) return JavaFailed(env, operation, "reading the array");
   }
   return VLX_S_OK;
 }
-}
+}  // namespace
 
 // ---- strings ----
 
-namespace
-{
+namespace {
 const char kStringOperation[] = "VLXJBXJNIConverter::ConvertToJavaType(const VLXUnicodeString&, jstring&)";
 }
 
 long VLXJBXJNIConverter::ConvertToJavaType(JNIEnv* env, const VLXUnicodeString& input, jstring& output)
 {
   const long rc = Enter(env, kStringOperation);
-  if (VLX_FAILED(rc))
-    return rc;
+  if (VLX_FAILED(rc)) return rc;
   return ConvertToJavaString(env, input, output);
 }
 
@@ -182,8 +169,7 @@ long VLXJBXJNIConverter::BuildFromJavaType(JNIEnv* env, jobject input, VLXUnicod
   long rc = Enter(env, kFromJavaString);
   if (VLX_SUCCEEDED(rc))
     rc = CheckClass(env, input, VLXJBXDetail::Lang(env).stringClass, kFromJavaString, "java.lang.String");
-  if (VLX_FAILED(rc))
-    return rc;
+  if (VLX_FAILED(rc)) return rc;
   return StringFromJava(env, input, output);
 }
 
@@ -194,34 +180,29 @@ long VLXJBXJNIConverter::BuildFromJavaString(JNIEnv* env, jstring input, VLXUnic
 
 // ---- string lists ----
 
-long VLXJBXJNIConverter::ConvertToJavaType(JNIEnv* env, const VLXListValVLXUnicodeString& input,
-                                           jobjectArray& output)
+long VLXJBXJNIConverter::ConvertToJavaType(JNIEnv* env, const VLXListValVLXUnicodeString& input, jobjectArray& output)
 {
   static const char kOperation[] =
       "VLXJBXJNIConverter::ConvertToJavaType(const VLXListValVLXUnicodeString&, jobjectArray&)";
   const long rc = Enter(env, kOperation);
-  if (VLX_FAILED(rc))
-    return rc;
+  if (VLX_FAILED(rc)) return rc;
   jclass stringClass = VLXJBXDetail::Lang(env).stringClass;
   if (stringClass == nullptr)
     return Raise(VLX_E_FAIL, VLXJBXMessages::ConversionFailed, {kOperation, "class java.lang.String not found"},
                  __FILE__, __LINE__);
   const int size = input.Size();
   LocalRef array(env, env->NewObjectArray(size, stringClass, nullptr));
-  if (array.get() == nullptr || env->ExceptionCheck())
-    return JavaFailed(env, kOperation, "creating the array");
+  if (array.get() == nullptr || env->ExceptionCheck()) return JavaFailed(env, kOperation, "creating the array");
   jobjectArray result = static_cast<jobjectArray>(array.get());
   for (int i = 1; i <= size; ++i) {
     const VLXUnicodeString& text = input[i];
     jstring element = nullptr;
     const long converted = NewJavaString(env, text.c_str(), text.GetLengthInByte(), kOperation,
                                          "element " + std::to_string(i) + " of the list", element);
-    if (VLX_FAILED(converted))
-      return converted;
+    if (VLX_FAILED(converted)) return converted;
     const LocalRef owned(env, element);
     env->SetObjectArrayElement(result, i - 1, element);
-    if (env->ExceptionCheck())
-      return JavaFailed(env, kOperation, "storing an element");
+    if (env->ExceptionCheck()) return JavaFailed(env, kOperation, "storing an element");
   }
   output = static_cast<jobjectArray>(array.release());
   return VLX_S_OK;
@@ -231,12 +212,10 @@ long VLXJBXJNIConverter::BuildFromJavaType(JNIEnv* env, jobject input, VLXListVa
 {
   static const char kOperation[] = "VLXJBXJNIConverter::BuildFromJavaType(jobject, VLXListValVLXUnicodeString&)";
   long rc = Enter(env, kOperation);
-  if (VLX_FAILED(rc))
-    return rc;
+  if (VLX_FAILED(rc)) return rc;
   const VLXJBXDetail::JavaLang& lang = VLXJBXDetail::Lang(env);
   rc = CheckClass(env, input, lang.objectArrayClass, kOperation, "object array");
-  if (VLX_FAILED(rc))
-    return rc;
+  if (VLX_FAILED(rc)) return rc;
   if (input == nullptr) {
     output.RemoveAll(1);
     return VLX_S_OK;
@@ -246,17 +225,15 @@ long VLXJBXJNIConverter::BuildFromJavaType(JNIEnv* env, jobject input, VLXListVa
   VLXListValVLXUnicodeString result(length);
   for (jsize i = 0; i < length; ++i) {
     LocalRef element(env, env->GetObjectArrayElement(array, i));
-    if (env->ExceptionCheck())
-      return JavaFailed(env, kOperation, "reading an element");
+    if (env->ExceptionCheck()) return JavaFailed(env, kOperation, "reading an element");
     if (element.get() != nullptr && lang.stringClass != nullptr && !env->IsInstanceOf(element.get(), lang.stringClass))
       return Raise(VLX_E_INVALIDARG, VLXJBXMessages::InvalidArgument,
                    {kOperation, "element " + std::to_string(i) + " of the Java array is not a java.lang.String"},
                    __FILE__, __LINE__);
-    const long converted =
-        VLXJBXDetail::WithUtf8(env, static_cast<jstring>(element.get()), kOperation,
-                               [&result](const char* bytes, int length) { result.Append(VLXUnicodeString(bytes, length)); });
-    if (VLX_FAILED(converted))
-      return converted;
+    const long converted = VLXJBXDetail::WithUtf8(
+        env, static_cast<jstring>(element.get()), kOperation,
+        [&result](const char* bytes, int length) { result.Append(VLXUnicodeString(bytes, length)); });
+    if (VLX_FAILED(converted)) return converted;
   }
   output = std::move(result);
   return VLX_S_OK;
@@ -269,8 +246,7 @@ long VLXJBXJNIConverter::ConvertToJavaType(JNIEnv* env, const VLXListValVLXBoole
   // Any non-zero byte is true: Java sees only 0 or 1.
   const int size = input.Size();
   std::vector<VLXBoolean> normalised(static_cast<size_t>(size));
-  for (int i = 0; i < size; ++i)
-    normalised[static_cast<size_t>(i)] = input.Data()[i] != 0;
+  for (int i = 0; i < size; ++i) normalised[static_cast<size_t>(i)] = input.Data()[i] != 0;
   return ToJavaArray<jbooleanArray, jboolean>(
       env, normalised.data(), size, &JNIEnv::NewBooleanArray, &JNIEnv::SetBooleanArrayRegion,
       "VLXJBXJNIConverter::ConvertToJavaType(const VLXListValVLXBoolean&, jbooleanArray&)", output);
@@ -282,8 +258,7 @@ long VLXJBXJNIConverter::BuildFromJavaType(JNIEnv* env, jobject input, VLXListVa
   const long rc = FromJavaArray<jbooleanArray, jboolean>(
       env, input, &VLXJBXDetail::JavaLang::booleanArrayClass, "boolean[]", &JNIEnv::GetBooleanArrayRegion,
       "VLXJBXJNIConverter::BuildFromJavaType(jobject, VLXListValVLXBoolean&)", buffer);
-  if (VLX_SUCCEEDED(rc))
-    output.Assign(buffer.data(), static_cast<int>(buffer.size()));
+  if (VLX_SUCCEEDED(rc)) output.Assign(buffer.data(), static_cast<int>(buffer.size()));
   return rc;
 }
 
@@ -297,28 +272,27 @@ long VLXJBXJNIConverter::ConvertToJavaType(JNIEnv* env, const VLXBinary& input, 
 long VLXJBXJNIConverter::BuildFromJavaType(JNIEnv* env, jobject input, VLXBinary& output)
 {
   std::vector<unsigned char> buffer;
-  const long rc = FromJavaArray<jbyteArray, jbyte>(env, input, &VLXJBXDetail::JavaLang::byteArrayClass,
-                                                   "byte[]", &JNIEnv::GetByteArrayRegion,
-                                                   "VLXJBXJNIConverter::BuildFromJavaType(jobject, VLXBinary&)", buffer);
-  if (VLX_SUCCEEDED(rc))
-    output = VLXBinary(buffer.data(), static_cast<int>(buffer.size()));
+  const long rc = FromJavaArray<jbyteArray, jbyte>(
+      env, input, &VLXJBXDetail::JavaLang::byteArrayClass, "byte[]", &JNIEnv::GetByteArrayRegion,
+      "VLXJBXJNIConverter::BuildFromJavaType(jobject, VLXBinary&)", buffer);
+  if (VLX_SUCCEEDED(rc)) output = VLXBinary(buffer.data(), static_cast<int>(buffer.size()));
   return rc;
 }
 
 long VLXJBXJNIConverter::ConvertToJavaType(JNIEnv* env, const VLXRawCollint& input, jintArray& output)
 {
   return ToJavaArray<jintArray, jint>(env, input.Data(), input.Size(), &JNIEnv::NewIntArray, &JNIEnv::SetIntArrayRegion,
-                                      "VLXJBXJNIConverter::ConvertToJavaType(const VLXRawCollint&, jintArray&)", output);
+                                      "VLXJBXJNIConverter::ConvertToJavaType(const VLXRawCollint&, jintArray&)",
+                                      output);
 }
 
 long VLXJBXJNIConverter::BuildFromJavaType(JNIEnv* env, jobject input, VLXRawCollint& output)
 {
   std::vector<int> buffer;
-  const long rc = FromJavaArray<jintArray, jint>(env, input, &VLXJBXDetail::JavaLang::intArrayClass,
-                                                 "int[]", &JNIEnv::GetIntArrayRegion,
-                                                 "VLXJBXJNIConverter::BuildFromJavaType(jobject, VLXRawCollint&)", buffer);
-  if (VLX_SUCCEEDED(rc))
-    output.Assign(buffer.data(), static_cast<int>(buffer.size()));
+  const long rc = FromJavaArray<jintArray, jint>(
+      env, input, &VLXJBXDetail::JavaLang::intArrayClass, "int[]", &JNIEnv::GetIntArrayRegion,
+      "VLXJBXJNIConverter::BuildFromJavaType(jobject, VLXRawCollint&)", buffer);
+  if (VLX_SUCCEEDED(rc)) output.Assign(buffer.data(), static_cast<int>(buffer.size()));
   return rc;
 }
 
@@ -335,25 +309,22 @@ long VLXJBXJNIConverter::BuildFromJavaType(JNIEnv* env, jobject input, VLXRawCol
   const long rc = FromJavaArray<jdoubleArray, jdouble>(
       env, input, &VLXJBXDetail::JavaLang::doubleArrayClass, "double[]", &JNIEnv::GetDoubleArrayRegion,
       "VLXJBXJNIConverter::BuildFromJavaType(jobject, VLXRawColldouble&)", buffer);
-  if (VLX_SUCCEEDED(rc))
-    output.Assign(buffer.data(), static_cast<int>(buffer.size()));
+  if (VLX_SUCCEEDED(rc)) output.Assign(buffer.data(), static_cast<int>(buffer.size()));
   return rc;
 }
 
 // ---- jobject forms ----
 
-namespace
-{
+namespace {
 template <class Native, class JOut>
 long AsObject(JNIEnv* env, const Native& input, jobject& output)
 {
   JOut typed = nullptr;
   const long rc = VLXJBXJNIConverter::ConvertToJavaType(env, input, typed);
-  if (VLX_SUCCEEDED(rc))
-    output = typed;
+  if (VLX_SUCCEEDED(rc)) output = typed;
   return rc;
 }
-}
+}  // namespace
 
 long VLXJBXJNIConverter::ConvertToJavaType(JNIEnv* env, const VLXUnicodeString& input, jobject& output)
 {

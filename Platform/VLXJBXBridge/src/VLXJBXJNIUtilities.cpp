@@ -18,8 +18,7 @@
 using VLXJBXDetail::LocalRef;
 using VLXJBXDetail::Raise;
 
-namespace
-{
+namespace {
 const char kReplicaJar[] = "corvexa-replica.jar";
 const char kAttachedThreadPrefix[] = "VLXJBX-attached-";
 
@@ -53,26 +52,27 @@ void DetachAtThreadExit(void* value)
 
 void MakeDetachKey()
 {
-  std::call_once(g_detachKeyOnce, [] { g_detachKeyReady = pthread_key_create(&g_detachKey, &DetachAtThreadExit) == 0; });
+  std::call_once(g_detachKeyOnce,
+                 [] { g_detachKeyReady = pthread_key_create(&g_detachKey, &DetachAtThreadExit) == 0; });
 }
 
 const char* JniCodeText(jint code)
 {
   switch (code) {
-  case JNI_ERR:
-    return "unknown error";
-  case JNI_EDETACHED:
-    return "thread detached";
-  case JNI_EVERSION:
-    return "JNI version not supported";
-  case JNI_ENOMEM:
-    return "not enough memory";
-  case JNI_EEXIST:
-    return "a Java virtual machine already exists";
-  case JNI_EINVAL:
-    return "invalid arguments, such as an unrecognised option";
-  default:
-    return "unexpected code";
+    case JNI_ERR:
+      return "unknown error";
+    case JNI_EDETACHED:
+      return "thread detached";
+    case JNI_EVERSION:
+      return "JNI version not supported";
+    case JNI_ENOMEM:
+      return "not enough memory";
+    case JNI_EEXIST:
+      return "a Java virtual machine already exists";
+    case JNI_EINVAL:
+      return "invalid arguments, such as an unrecognised option";
+    default:
+      return "unexpected code";
   }
 }
 
@@ -81,10 +81,9 @@ const char* JniCodeText(jint code)
 long CreateJavaVM(const VLXListValVLXUnicodeString& extraOptions, JavaVM*& vm, JNIEnv*& env)
 {
   std::vector<std::string> texts;
-  const std::string classPath = VLXJBXDetail::BuildClassPath(std::getenv("VLXJBX_CLASSPATH"),
-                                                            VLXJBXDetail::LibraryDirectory());
-  if (!classPath.empty())
-    texts.push_back("-Djava.class.path=" + classPath);
+  const std::string classPath =
+      VLXJBXDetail::BuildClassPath(std::getenv("VLXJBX_CLASSPATH"), VLXJBXDetail::LibraryDirectory());
+  if (!classPath.empty()) texts.push_back("-Djava.class.path=" + classPath);
   for (std::string& word : VLXJBXDetail::SplitOptions(std::getenv("VLXJBX_JVM_OPTIONS")))
     texts.push_back(std::move(word));
   for (int i = 1; i <= extraOptions.Size(); ++i)
@@ -109,8 +108,7 @@ long CreateJavaVM(const VLXListValVLXUnicodeString& extraOptions, JavaVM*& vm, J
     return VLX_S_OK;
   }
   std::string why = "JNI_CreateJavaVM returned " + std::to_string(rc) + " (" + JniCodeText(rc) + ") for the options [";
-  for (size_t i = 0; i < texts.size(); ++i)
-    why += (i ? " " : "") + texts[i];
+  for (size_t i = 0; i < texts.size(); ++i) why += (i ? " " : "") + texts[i];
   why += "]";
   g_startFailed = true;
   g_startFailure = why;
@@ -140,8 +138,7 @@ long SlowGetJNIEnv(JNIEnv*& env, const VLXListValVLXUnicodeString& options)
         g_vm.store(vm, std::memory_order_release);
         // The creating thread is detached at its exit like every thread the bridge attached (the
         // process's main thread runs no key destructor at exit, so it stays with the JVM).
-        if (g_detachKeyReady)
-          pthread_setspecific(g_detachKey, vm);
+        if (g_detachKeyReady) pthread_setspecific(g_detachKey, vm);
         t_env = created;
         env = created;
         return VLX_S_OK;
@@ -155,16 +152,15 @@ long SlowGetJNIEnv(JNIEnv*& env, const VLXListValVLXUnicodeString& options)
   if (rc == JNI_OK) {
     // Attached by someone else (perhaps after detaching a thread the bridge had attached): not
     // cached, and never detached by the bridge.
-    if (g_detachKeyReady)
-      pthread_setspecific(g_detachKey, nullptr);
+    if (g_detachKeyReady) pthread_setspecific(g_detachKey, nullptr);
     env = static_cast<JNIEnv*>(found);
     return VLX_S_OK;
   }
   if (rc != JNI_EDETACHED)
-    return Raise(VLX_E_FAIL, VLXJBXMessages::NoEnvironment,
-                 {"VLXJBXJNIUtilities::GetJNIEnv",
-                  "GetEnv returned " + std::to_string(rc) + " (" + JniCodeText(rc) + ")"},
-                 __FILE__, __LINE__);
+    return Raise(
+        VLX_E_FAIL, VLXJBXMessages::NoEnvironment,
+        {"VLXJBXJNIUtilities::GetJNIEnv", "GetEnv returned " + std::to_string(rc) + " (" + JniCodeText(rc) + ")"},
+        __FILE__, __LINE__);
   if (!g_detachKeyReady)
     return Raise(VLX_E_FAIL, VLXJBXMessages::NoEnvironment,
                  {"VLXJBXJNIUtilities::GetJNIEnv", "no thread-exit hook could be installed to detach the thread"},
@@ -194,11 +190,9 @@ long SlowGetJNIEnv(JNIEnv*& env, const VLXListValVLXUnicodeString& options)
 // Names a class for error texts: its Java name when it can be obtained, else "(unknown class)".
 std::string ClassName(JNIEnv* env, jclass cls)
 {
-  if (cls == nullptr)
-    return "(null class)";
+  if (cls == nullptr) return "(null class)";
   const jmethodID getName = VLXJBXDetail::Lang(env).classGetName;
-  if (getName == nullptr)
-    return "(unknown class)";
+  if (getName == nullptr) return "(unknown class)";
   LocalRef name(env, env->CallObjectMethod(cls, getName));
   if (env->ExceptionCheck()) {
     env->ExceptionClear();
@@ -213,8 +207,8 @@ long LookupMember(JNIEnv* env, jclass cls, const char* kind, const char* name, c
 {
   if (env == nullptr || cls == nullptr || name == nullptr || signature == nullptr)
     return Raise(VLX_E_INVALIDARG, VLXJBXMessages::InvalidArgument,
-                 {operation, env == nullptr ? "null environment"
-                             : cls == nullptr ? "null class"
+                 {operation, env == nullptr    ? "null environment"
+                             : cls == nullptr  ? "null class"
                              : name == nullptr ? "null member name"
                                                : "null signature"},
                  __FILE__, __LINE__);
@@ -232,15 +226,14 @@ long LookupMember(JNIEnv* env, jclass cls, const char* kind, const char* name, c
   id = found;
   return VLX_S_OK;
 }
-}
+}  // namespace
 
 // The cached environment of the calling thread while the thread is still attached with it: the
 // application may have detached the thread (and attached it again) since the cache was filled.
 static JNIEnv* CachedEnv()
 {
   JNIEnv* cached = t_env;
-  if (cached == nullptr)
-    return nullptr;
+  if (cached == nullptr) return nullptr;
   void* current = nullptr;
   if (g_vm.load(std::memory_order_relaxed)->GetEnv(&current, JNI_VERSION_1_8) == JNI_OK && current == cached)
     return cached;
@@ -257,15 +250,11 @@ long VLXJBXJNIUtilities::GetJNIEnv(JNIEnv*& env, VLXListValVLXUnicodeString opti
   return SlowGetJNIEnv(env, options);
 }
 
-JavaVM* VLXJBXJNIUtilities::GetJavaVM()
-{
-  return g_vm.load(std::memory_order_acquire);
-}
+JavaVM* VLXJBXJNIUtilities::GetJavaVM() { return g_vm.load(std::memory_order_acquire); }
 
 JNIEnv* VLXJBXDetail::CurrentEnv()
 {
-  if (JNIEnv* cached = CachedEnv())
-    return cached;
+  if (JNIEnv* cached = CachedEnv()) return cached;
   JNIEnv* env = nullptr;
   SlowGetJNIEnv(env, VLXListValVLXUnicodeString());
   return env;
@@ -288,8 +277,8 @@ long VLXJBXJNIUtilities::NewGlobalRefForClass(JNIEnv* env, const char* classPath
   jobject global = env->NewGlobalRef(local.get());
   if (global == nullptr)
     return Raise(VLX_E_OUTOFMEMORY, VLXJBXMessages::OperationFailed,
-                 {kOperation, std::string("no global reference could be made for class '") + classPath + "'"},
-                 __FILE__, __LINE__);
+                 {kOperation, std::string("no global reference could be made for class '") + classPath + "'"}, __FILE__,
+                 __LINE__);
   VLXJBXDetail::CountGlobalRefs(1);
   cls = static_cast<jclass>(global);
   return VLX_S_OK;
@@ -335,20 +324,18 @@ long VLXJBXJNIUtilities::HandleJavaError(JNIEnv* env, long code, const char* con
                  {operation, exception.className, exception.message, exception.cause}, __FILE__, __LINE__);
   }
   if (code >= 0) {
-    if (error != nullptr)
-      error->Release();
+    if (error != nullptr) error->Release();
     return VLX_S_OK;
   }
-  if (error != nullptr)
-    return VLXError::GetReturn(VLXError::ReturnError, error, nullptr, __FILE__, __LINE__);
+  if (error != nullptr) return VLXError::GetReturn(VLXError::ReturnError, error, nullptr, __FILE__, __LINE__);
   // The failure's own error, if it recorded one since the operation started; never an older one.
   if (VLXError* own = VLXError::VLXGetOperationError()) {
     own->Release();
     return VLX_E_FAIL;
   }
   return Raise(VLX_E_FAIL, VLXJBXMessages::OperationFailed,
-               {operation, "it returned the failure code " + std::to_string(code) + " and recorded no cause"},
-               __FILE__, __LINE__);
+               {operation, "it returned the failure code " + std::to_string(code) + " and recorded no cause"}, __FILE__,
+               __LINE__);
 }
 
 long VLXJBXJNIUtilities::GetClassName(JNIEnv* env, jobject object, VLXUnicodeString& name)
@@ -359,21 +346,14 @@ long VLXJBXJNIUtilities::GetClassName(JNIEnv* env, jobject object, VLXUnicodeStr
                  {kOperation, env == nullptr ? "null environment" : "null object"}, __FILE__, __LINE__);
   std::string text;
   if (!VLXJBXDetail::ClassName(env, object, text))
-    return Raise(VLX_E_FAIL, VLXJBXMessages::OperationFailed, {kOperation, "Class.getName failed"},
-                 __FILE__, __LINE__);
+    return Raise(VLX_E_FAIL, VLXJBXMessages::OperationFailed, {kOperation, "Class.getName failed"}, __FILE__, __LINE__);
   name = VLXUnicodeString(text.data(), static_cast<int>(text.size()));
   return VLX_S_OK;
 }
 
-long VLXJBXJNIUtilities::GetGlobalRefCount()
-{
-  return g_globalRefs.load(std::memory_order_relaxed);
-}
+long VLXJBXJNIUtilities::GetGlobalRefCount() { return g_globalRefs.load(std::memory_order_relaxed); }
 
-void VLXJBXDetail::CountGlobalRefs(long delta)
-{
-  g_globalRefs.fetch_add(delta, std::memory_order_relaxed);
-}
+void VLXJBXDetail::CountGlobalRefs(long delta) { g_globalRefs.fetch_add(delta, std::memory_order_relaxed); }
 
 // ---- start-up configuration ----
 
@@ -384,28 +364,24 @@ std::string VLXJBXDetail::LibraryDirectory()
     return std::string();
   std::string path = info.dli_fname;
   const size_t slash = path.rfind('/');
-  if (slash == std::string::npos)
-    return ".";
+  if (slash == std::string::npos) return ".";
   return slash == 0 ? "/" : path.substr(0, slash);
 }
 
-namespace
-{
+namespace {
 bool IsRegularFile(const std::string& path)
 {
   struct stat st;
   return stat(path.c_str(), &st) == 0 && S_ISREG(st.st_mode);
 }
-}
+}  // namespace
 
 std::string VLXJBXDetail::BuildClassPath(const char* classPathVariable, const std::string& libraryDirectory)
 {
   std::string classPath;
   auto add = [&classPath](const std::string& entry) {
-    if (entry.empty())
-      return;
-    if (!classPath.empty())
-      classPath += ':';
+    if (entry.empty()) return;
+    if (!classPath.empty()) classPath += ':';
     classPath += entry;
   };
   if (classPathVariable != nullptr) {
@@ -413,8 +389,7 @@ std::string VLXJBXDetail::BuildClassPath(const char* classPathVariable, const st
     size_t start = 0;
     while (start <= entries.size()) {
       size_t end = entries.find(':', start);
-      if (end == std::string::npos)
-        end = entries.size();
+      if (end == std::string::npos) end = entries.size();
       add(entries.substr(start, end - start));
       start = end + 1;
     }
@@ -433,16 +408,13 @@ std::string VLXJBXDetail::BuildClassPath(const char* classPathVariable, const st
 std::vector<std::string> VLXJBXDetail::SplitOptions(const char* text)
 {
   std::vector<std::string> words;
-  if (text == nullptr)
-    return words;
+  if (text == nullptr) return words;
   std::string word;
   for (const char* p = text;; ++p) {
     if (*p == '\0' || std::isspace(static_cast<unsigned char>(*p))) {
-      if (!word.empty())
-        words.push_back(word);
+      if (!word.empty()) words.push_back(word);
       word.clear();
-      if (*p == '\0')
-        break;
+      if (*p == '\0') break;
     } else {
       word += *p;
     }

@@ -11,8 +11,7 @@
 
 using VLXJBXDetail::LocalRef;
 
-namespace
-{
+namespace {
 jclass GlobalClass(JNIEnv* env, const char* name)
 {
   const LocalRef local(env, env->FindClass(name));
@@ -25,8 +24,7 @@ jclass GlobalClass(JNIEnv* env, const char* name)
 
 jmethodID Method(JNIEnv* env, jclass cls, const char* name, const char* signature)
 {
-  if (cls == nullptr)
-    return nullptr;
+  if (cls == nullptr) return nullptr;
   jmethodID id = env->GetMethodID(cls, name, signature);
   if (env->ExceptionCheck()) {
     env->ExceptionClear();
@@ -44,19 +42,17 @@ std::string DescribeClass(JNIEnv* env, jobject object)
 std::string DescribeMessage(JNIEnv* env, jobject throwable)
 {
   const jmethodID getMessage = VLXJBXDetail::Lang(env).throwableGetMessage;
-  if (getMessage == nullptr)
-    return "(message unavailable)";
+  if (getMessage == nullptr) return "(message unavailable)";
   VLXJBXDetail::LocalRef message(env, env->CallObjectMethod(throwable, getMessage));
   if (env->ExceptionCheck()) {
     // getMessage may be overridden and throw itself.
     env->ExceptionClear();
     return "(message unavailable: getMessage failed)";
   }
-  if (message.get() == nullptr)
-    return "(no message)";
+  if (message.get() == nullptr) return "(no message)";
   return VLXJBXDetail::JavaToUtf8(env, static_cast<jstring>(message.get()));
 }
-}
+}  // namespace
 
 const VLXJBXDetail::JavaLang& VLXJBXDetail::Lang(JNIEnv* env)
 {
@@ -70,12 +66,10 @@ const VLXJBXDetail::JavaLang& VLXJBXDetail::Lang(JNIEnv* env)
     lang.intArrayClass = GlobalClass(env, "[I");
     lang.doubleArrayClass = GlobalClass(env, "[D");
     const LocalRef classClass(env, env->FindClass("java/lang/Class"));
-    if (env->ExceptionCheck())
-      env->ExceptionClear();
+    if (env->ExceptionCheck()) env->ExceptionClear();
     lang.classGetName = Method(env, static_cast<jclass>(classClass.get()), "getName", "()Ljava/lang/String;");
     const LocalRef throwable(env, env->FindClass("java/lang/Throwable"));
-    if (env->ExceptionCheck())
-      env->ExceptionClear();
+    if (env->ExceptionCheck()) env->ExceptionClear();
     const jclass throwableClass = static_cast<jclass>(throwable.get());
     lang.throwableGetMessage = Method(env, throwableClass, "getMessage", "()Ljava/lang/String;");
     lang.throwableGetCause = Method(env, throwableClass, "getCause", "()Ljava/lang/Throwable;");
@@ -110,8 +104,7 @@ VLXJBXDetail::JavaExceptionText VLXJBXDetail::TakeException(JNIEnv* env)
 bool VLXJBXDetail::ClassName(JNIEnv* env, jobject object, std::string& name)
 {
   const jmethodID getName = Lang(env).classGetName;
-  if (getName == nullptr)
-    return false;
+  if (getName == nullptr) return false;
   LocalRef cls(env, env->GetObjectClass(object));
   LocalRef text(env, env->CallObjectMethod(cls.get(), getName));
   if (env->ExceptionCheck()) {
@@ -131,8 +124,7 @@ long VLXJBXDetail::Utf16ToUtf8(const jchar* units, jsize count, char* out, bool 
       c = 0x10000 + ((c - 0xD800) << 10) + (units[i + 1] - 0xDC00);
       ++i;
     } else if (c >= 0xD800 && c <= 0xDFFF) {
-      if (!lossy)
-        return -1 - static_cast<long>(i);
+      if (!lossy) return -1 - static_cast<long>(i);
       c = 0xFFFD;
     }
     if (c < 0x80) {
@@ -177,14 +169,12 @@ long VLXJBXDetail::LongTextToUtf8(JNIEnv* env, jstring text, jsize count, const 
     jsize n = count - start < kPiece ? count - start : kPiece;
     env->GetStringRegion(text, start, n, units);
     // A high surrogate ending a piece is encoded with the unit after it, in the next piece.
-    if (start + n < count && units[n - 1] >= 0xD800 && units[n - 1] <= 0xDBFF)
-      --n;
+    if (start + n < count && units[n - 1] >= 0xD800 && units[n - 1] <= 0xDBFF) --n;
     const long length = Utf16ToUtf8(units, n, encoded, lossy);
     if (length < 0)
       return RejectUnpairedSurrogate(operation, start + static_cast<jsize>(-1 - length), units[-1 - length]);
     if (bytes.size() + static_cast<size_t>(length) > kMax) {
-      if (lossy)
-        return VLX_S_OK;
+      if (lossy) return VLX_S_OK;
       return Raise(VLX_E_FAIL, VLXJBXMessages::ConversionFailed,
                    {operation, "the Java text of " + std::to_string(count) +
                                    " characters is longer than 2147483647 bytes in UTF-8"},
@@ -200,8 +190,7 @@ std::string VLXJBXDetail::JavaToUtf8(JNIEnv* env, jstring text)
 {
   const jsize count = text == nullptr ? 0 : env->GetStringLength(text);
   std::string bytes;
-  if (count <= 0)
-    return bytes;
+  if (count <= 0) return bytes;
   LongTextToUtf8(env, text, count, "VLXJBXDetail::JavaToUtf8", true, bytes);
   return bytes;
 }

@@ -5,9 +5,8 @@
 
 #include <pthread.h>
 
-class VLXMutex
-{
-public:
+class VLXMutex {
+ public:
   // The three integers are accepted for compatibility and not used: every VLXMutex is a
   // process-private recursive mutex.
   VLXMutex(int = 0, int = 0, int = 0);
@@ -20,7 +19,7 @@ public:
   // Takes the mutex when it is free or held by the calling thread and returns 1; else returns 0 at once.
   int TryLock();
 
-private:
+ private:
   pthread_mutex_t _mutex;
 };
 

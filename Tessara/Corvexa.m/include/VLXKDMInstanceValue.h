@@ -55,9 +55,9 @@ class CORVEXA_API VLXKDMInstanceValue : public VLXKDMJavaObject {
   // BuildLocal fails. Whenever it fails, the value is left exactly as it was.
   long BuildLocal();
   // Makes the Java object of the local form and attaches the value to it (Synchronized). In the
-  // Synchronized state, with its Java object still held, it does nothing and succeeds. A value without type is a broken precondition,
-  // reported through VLXFatalError; if the report returns, BuildRemote fails. A failure leaves the
-  // value as it was: not Synchronized, its former Java object (if any) kept.
+  // Synchronized state, with its Java object still held, it does nothing and succeeds. A value without type is a broken
+  // precondition, reported through VLXFatalError; if the report returns, BuildRemote fails. A failure leaves the value
+  // as it was: not Synchronized, its former Java object (if any) kept.
   long BuildRemote();
 
   // The value's type, or (Type) -1.

@@ -119,14 +119,14 @@ extern "C" CORVEXA_API int VELMORA_QKA2_INTERNAL_Corvexa();
 // attached only to a Java object of its own class (SetHandle, assignment through the base, or an
 // exchange with Java fail with VLX_E_INVALIDARG for any other, naming both classes). A proxy class
 // adds no data.
-#define VLXKDM_PROXY_SPECIAL_MEMBERS(Class)                      \
- public:                                                         \
-  Class();                                                       \
-  Class(const Class& other);                                     \
-  Class& operator=(const Class& other);                          \
-  virtual ~Class();                                              \
-                                                                 \
- protected:                                                      \
-  long AcceptObject(JNIEnv* env, jobject object) override;       \
-                                                                 \
+#define VLXKDM_PROXY_SPECIAL_MEMBERS(Class)                \
+ public:                                                   \
+  Class();                                                 \
+  Class(const Class& other);                               \
+  Class& operator=(const Class& other);                    \
+  virtual ~Class();                                        \
+                                                           \
+ protected:                                                \
+  long AcceptObject(JNIEnv* env, jobject object) override; \
+                                                           \
  public:

@@ -42,7 +42,8 @@ enum class Target { Handle, Class, Constructor };
 // A binding-table slot known at compile time: slot<Replica_getName>. The frame checks the slot's
 // JNI signature against the C++ types that cross at the call (SignatureFits below).
 template <Slot S>
-struct SlotTag {};
+struct SlotTag {
+};
 template <Slot S>
 inline constexpr SlotTag<S> slot{};
 
@@ -51,7 +52,8 @@ inline constexpr SlotTag<S> slot{};
 // binding table and a call site fails the build instead of the user's process.
 
 // The length of the JNI type at the start of t ("I", "[B", "Ljava/lang/String;").
-constexpr std::size_t JniTypeLength(std::string_view t) {
+constexpr std::size_t JniTypeLength(std::string_view t)
+{
   std::size_t i = 0;
   while (i < t.size() && t[i] == '[') ++i;
   if (i < t.size() && t[i] == 'L')
@@ -61,25 +63,37 @@ constexpr std::size_t JniTypeLength(std::string_view t) {
 
 // Whether a value of the JNI type J passes for the JNI type t (any reference passes for an Object).
 template <class J>
-constexpr bool JniFits(std::string_view t) {
+constexpr bool JniFits(std::string_view t)
+{
   if constexpr (std::is_pointer_v<J>)
     if (t == "Ljava/lang/Object;") return true;
-  if constexpr (std::is_void_v<J>) return t == "V";
-  else if constexpr (std::is_same_v<J, jint>) return t == "I";
-  else if constexpr (std::is_same_v<J, jboolean>) return t == "Z";
-  else if constexpr (std::is_same_v<J, jdouble>) return t == "D";
-  else if constexpr (std::is_same_v<J, jlong>) return t == "J";
-  else if constexpr (std::is_same_v<J, jstring>) return t == "Ljava/lang/String;";
-  else if constexpr (std::is_same_v<J, jbyteArray>) return t == "[B";
-  else if constexpr (std::is_same_v<J, jobjectArray>) return t.size() > 1 && t[0] == '[' && (t[1] == 'L' || t[1] == '[');
-  else if constexpr (std::is_same_v<J, jobject>) return !t.empty() && (t[0] == 'L' || t[0] == '[');
-  else return false;
+  if constexpr (std::is_void_v<J>)
+    return t == "V";
+  else if constexpr (std::is_same_v<J, jint>)
+    return t == "I";
+  else if constexpr (std::is_same_v<J, jboolean>)
+    return t == "Z";
+  else if constexpr (std::is_same_v<J, jdouble>)
+    return t == "D";
+  else if constexpr (std::is_same_v<J, jlong>)
+    return t == "J";
+  else if constexpr (std::is_same_v<J, jstring>)
+    return t == "Ljava/lang/String;";
+  else if constexpr (std::is_same_v<J, jbyteArray>)
+    return t == "[B";
+  else if constexpr (std::is_same_v<J, jobjectArray>)
+    return t.size() > 1 && t[0] == '[' && (t[1] == 'L' || t[1] == '[');
+  else if constexpr (std::is_same_v<J, jobject>)
+    return !t.empty() && (t[0] == 'L' || t[0] == '[');
+  else
+    return false;
 }
 
 // Whether the row of slot S is a method whose parameters are J... and whose result is Raw (a
 // constructor's is its new object).
 template <Slot S, class Raw, class... J>
-constexpr bool SignatureFits() {
+constexpr bool SignatureFits()
+{
   const BindingRow row = kBindingRows[S];
   if (row.signature == nullptr) return false;
   const std::string_view signature(row.signature);
@@ -110,21 +124,27 @@ class Call {
  public:
   // An instance method of a built proxy.
   Call(VLXKDMJavaObject& self, const char* name, SlotTag<S>)
-      : _self(&self), _name(name), _class(SlotCount), _target(Target::Handle) {}
+      : _self(&self), _name(name), _class(SlotCount), _target(Target::Handle)
+  {
+  }
   // A static method of the class in slot cls (CallStatic), or a constructor of that class whose new
   // object is attached to created (Construct).
   Call(const char* name, Slot cls, Target target, VLXKDMJavaObject* created)
-      : _self(nullptr), _created(created), _name(name), _class(cls), _target(target) {}
+      : _self(nullptr), _created(created), _name(name), _class(cls), _target(target)
+  {
+  }
 
   // The rest of a frame that an operation forwarding here has started on env (steps 1 to 3 done
   // for the same proxy, no exception pending); null runs the whole frame.
-  Call& startedOn(JNIEnv* env) {
+  Call& startedOn(JNIEnv* env)
+  {
     _started = env;
     return *this;
   }
 
   // A failed argument conversion returns the converter's code as it is, untranslated.
-  Call& rawConversionCode() {
+  Call& rawConversionCode()
+  {
     _rawConversionCode = true;
     return *this;
   }
@@ -153,13 +173,15 @@ class Call {
 
 // A static method of the class in slot cls; no proxy is needed.
 template <Slot S>
-Call<S> CallStatic(const char* name, Slot cls, SlotTag<S>) {
+Call<S> CallStatic(const char* name, Slot cls, SlotTag<S>)
+{
   return Call<S>(name, cls, Target::Class, nullptr);
 }
 // A new Java object of the class in slot cls, made by constructor S and attached to self; self
 // need not be built.
 template <Slot S>
-Call<S> Construct(VLXKDMJavaObject& self, const char* name, Slot cls, SlotTag<S>) {
+Call<S> Construct(VLXKDMJavaObject& self, const char* name, Slot cls, SlotTag<S>)
+{
   return Call<S>(name, cls, Target::Constructor, &self);
 }
 
@@ -170,11 +192,13 @@ class Bound {
 
   // The method returns a value that lands in out.
   template <class Out>
-  long returning(Out&& out) {
+  long returning(Out&& out)
+  {
     return Execute<ResultOf<std::decay_t<Out>>>(out);
   }
   // The method returns nothing.
-  long run() {
+  long run()
+  {
     NoResult none;
     return Execute<ResultOf<NoResult>>(none);
   }
@@ -184,7 +208,8 @@ class Bound {
   // Java call through an operation of the library (usually started on that environment); its result
   // is the status that step 9 translates under this operation's name.
   template <class Next>
-  long forwardTo(Next&& next) {
+  long forwardTo(Next&& next)
+  {
     return Execute<Forwarded>(next);
   }
 
@@ -193,57 +218,58 @@ class Bound {
   static constexpr std::size_t kArity = sizeof...(A);
 
   template <class Result, class Out>
-  long Execute(Out& out) {
+  long Execute(Out& out)
+  {
     // A forwarded operation makes its Java call through another, which is checked there.
-    static_assert(std::is_same_v<Result, Forwarded> ||
-                      SignatureFits<S, typename Result::Raw, typename ArgOf<A>::J...>(),
-                  "the binding table's signature of this slot does not fit the types the call passes");
+    static_assert(
+        std::is_same_v<Result, Forwarded> || SignatureFits<S, typename Result::Raw, typename ArgOf<A>::J...>(),
+        "the binding table's signature of this slot does not fit the types the call passes");
     const char* const name = _call._name;
-    JNIEnv* env = _call._started;                                                   // 1
+    JNIEnv* env = _call._started;  // 1
     long status = VLX_S_OK;
     if (!env) {
-      status = FrameAccess::Start(_call._self, env, name);                          // 2
+      status = FrameAccess::Start(_call._self, env, name);                             // 2
       if (status < 0) return VLXKDMJavaObject::HandleReplicaError(env, status, name);  // 3
     }
-    ReplicaStubs* st = FrameAccess::Table();                                        // 4
+    ReplicaStubs* st = FrameAccess::Table();  // 4
     if (!st) return VLX_E_FAIL;
     if (!st->IsBound()) return st->ReportUnbound(name);
 
-    JArgs jargs{};                                                                  // 5
+    JArgs jargs{};  // 5
     const long converted = ConvertAll(env, jargs, std::index_sequence_for<A...>{});
     if (converted < 0) {
       ReleaseAll(env, jargs, std::index_sequence_for<A...>{});
-      return _call._rawConversionCode ? converted
-                                      : VLXKDMJavaObject::HandleReplicaError(env, converted, name);
+      return _call._rawConversionCode ? converted : VLXKDMJavaObject::HandleReplicaError(env, converted, name);
     }
     if (kArity > 0) status = converted;
 
-    using Raw = typename Result::Raw;                                               // 6
+    using Raw = typename Result::Raw;  // 6
     if constexpr (std::is_same_v<Result, Forwarded>) {
       status = std::apply([&](auto... j) { return out(env, j...); }, jargs);
-      ReleaseAll(env, jargs, std::index_sequence_for<A...>{});                      // 7
+      ReleaseAll(env, jargs, std::index_sequence_for<A...>{});  // 7
       // The other operation ran the whole frame: its success leaves no exception pending.
       if (status >= 0) return VLX_S_OK;
     } else if constexpr (std::is_void_v<Raw>) {
       Invoke<void>(env, *st, jargs);
-      ReleaseAll(env, jargs, std::index_sequence_for<A...>{});                      // 7
+      ReleaseAll(env, jargs, std::index_sequence_for<A...>{});  // 7
     } else {
       const Raw result = Invoke<Raw>(env, *st, jargs);
-      ReleaseAll(env, jargs, std::index_sequence_for<A...>{});                      // 7
-      if (!VLXJBXJNIHelper::ExceptionCheck(env)) {                                  // 8
+      ReleaseAll(env, jargs, std::index_sequence_for<A...>{});  // 7
+      if (!VLXJBXJNIHelper::ExceptionCheck(env)) {              // 8
         status = Result::Land(env, result, out, status);
         // A landing that succeeds leaves no exception behind: the converters and the value
         // holder fail on any exception they meet.
         if (status >= 0) return VLX_S_OK;
       }
     }
-    return VLXKDMJavaObject::HandleReplicaError(env, status, name);                 // 9
+    return VLXKDMJavaObject::HandleReplicaError(env, status, name);  // 9
   }
 
   // Converts the arguments, enumeration constants first; stops at the first failure. Returns the
   // last conversion's code.
   template <std::size_t... I>
-  long ConvertAll(JNIEnv* env, JArgs& jargs, std::index_sequence<I...>) {
+  long ConvertAll(JNIEnv* env, JArgs& jargs, std::index_sequence<I...>)
+  {
     long status = VLX_S_OK;
     [[maybe_unused]] auto one = [&](auto& jarg, const auto& arg) {
       using T = std::decay_t<decltype(arg)>;
@@ -256,7 +282,8 @@ class Bound {
   }
 
   template <std::size_t... I>
-  static void ReleaseAll(JNIEnv* env, JArgs& jargs, std::index_sequence<I...>) {
+  static void ReleaseAll(JNIEnv* env, JArgs& jargs, std::index_sequence<I...>)
+  {
     [[maybe_unused]] auto one = [env](auto& jarg, bool owns) {
       if constexpr (std::is_pointer_v<std::decay_t<decltype(jarg)>>) {
         if (owns) LocalRef(env, jarg);  // taken over and deleted here
@@ -268,7 +295,8 @@ class Bound {
 
   // Step 6: the Call*Method that fits the target and the Java return type.
   template <class Raw>
-  Raw Invoke(JNIEnv* env, const ReplicaStubs& st, JArgs& jargs) {
+  Raw Invoke(JNIEnv* env, const ReplicaStubs& st, JArgs& jargs)
+  {
     const jmethodID method = st.Method(S);
     return std::apply(
         [&](auto... j) -> Raw {
@@ -307,18 +335,25 @@ class Bound {
 
 template <Slot S>
 template <class... A>
-Bound<S, A...> Call<S>::with(const A&... args) const {
+Bound<S, A...> Call<S>::with(const A&... args) const
+{
   return Bound<S, A...>(*this, args...);
 }
 template <Slot S>
 template <class Out>
-long Call<S>::returning(Out&& out) const {
+long Call<S>::returning(Out&& out) const
+{
   return with().returning(std::forward<Out>(out));
 }
 template <Slot S>
-long Call<S>::run() const { return with().run(); }
+long Call<S>::run() const
+{
+  return with().run();
+}
 template <Slot S>
-long Call<S>::construct() const { return with().construct(); }
+long Call<S>::construct() const
+{
+  return with().construct();
+}
 
 }  // namespace corvexa
-

@@ -32,13 +32,15 @@ using LocalRef = VLXJBXLocalRef;
 class FrameAccess {
  public:
   // Steps 1 to 3: the environment, the start of the Java side and, for a proxy, the built test.
-  static long Start(VLXKDMJavaObject* self, JNIEnv*& env, const char* name) {
+  static long Start(VLXKDMJavaObject* self, JNIEnv*& env, const char* name)
+  {
     return self ? self->InitJavaAndTestIsBuilt(env, name) : VLXKDMJavaObject::InitJava(env, name);
   }
   static ReplicaStubs* Table() { return VLXKDMJavaObject::_st.load(std::memory_order_acquire); }
   // The bound table for an object attached outside any operation (the Java side is started if no
   // operation has started it); null with the failure in status.
-  static const ReplicaStubs* BoundTable(const char* operation, long& status) {
+  static const ReplicaStubs* BoundTable(const char* operation, long& status)
+  {
     const ReplicaStubs* st = Table();
     if (!st || !st->IsBound()) {
       JNIEnv* started = nullptr;
@@ -51,7 +53,8 @@ class FrameAccess {
     return st;
   }
   // Attaches proxy to object, whose Java class the binding table's method signature establishes.
-  static long Attach(VLXKDMJavaObject& proxy, JNIEnv* env, jobject object) {
+  static long Attach(VLXKDMJavaObject& proxy, JNIEnv* env, jobject object)
+  {
     return proxy.ReplaceGlobalRef(env, object);
   }
   // Attaches value to object (not null) and reads its local form; a failure leaves value as it was.
@@ -59,12 +62,15 @@ class FrameAccess {
 
   // The start of an operation that Java code calls with its own environment: env is replaced by
   // the calling thread's. Returns the bound table, or null with the operation's result in result.
-  static const ReplicaStubs* StartJavaFacing(JNIEnv*& env, const char* name, long& result) {
+  static const ReplicaStubs* StartJavaFacing(JNIEnv*& env, const char* name, long& result)
+  {
     result = VLXKDMJavaObject::InitJava(env, name);
     if (result < 0) return nullptr;
     const ReplicaStubs* st = Table();
-    if (!st) result = VLX_E_FAIL;
-    else if (!st->IsBound()) result = st->ReportUnbound(name);
+    if (!st)
+      result = VLX_E_FAIL;
+    else if (!st->IsBound())
+      result = st->ReportUnbound(name);
     return st && st->IsBound() ? st : nullptr;
   }
 };
@@ -81,7 +87,8 @@ struct ConvertedArg {  // converted by the platform converter into a new local r
   using J = Java;
   static constexpr bool kOwnsRef = true;
   static constexpr bool kEarly = false;
-  static long To(JNIEnv* env, const Native& value, J& out) {
+  static long To(JNIEnv* env, const Native& value, J& out)
+  {
     return VLXJBXJNIConverter::ConvertToJavaType(env, value, out);
   }
 };
@@ -91,35 +98,48 @@ struct PassedArg {  // passed as it is
   using J = T;
   static constexpr bool kOwnsRef = false;
   static constexpr bool kEarly = false;
-  static long To(JNIEnv*, T value, J& out) {
+  static long To(JNIEnv*, T value, J& out)
+  {
     out = value;
     return VLX_S_OK;
   }
 };
 
 // A text: steps 2 and 3 (or the conversion before it) have found no exception pending.
-template <> struct ArgOf<VLXUnicodeString> {
+template <>
+struct ArgOf<VLXUnicodeString> {
   using J = jstring;
   static constexpr bool kOwnsRef = true;
   static constexpr bool kEarly = false;
-  static long To(JNIEnv* env, const VLXUnicodeString& value, J& out) {
+  static long To(JNIEnv* env, const VLXUnicodeString& value, J& out)
+  {
     return VLXJBXJNIConverter::ConvertToJavaString(env, value, out);
   }
 };
-template <> struct ArgOf<VLXListValVLXUnicodeString> : ConvertedArg<VLXListValVLXUnicodeString, jobjectArray> {};
-template <> struct ArgOf<VLXBinary> : ConvertedArg<VLXBinary, jbyteArray> {};
-template <> struct ArgOf<int> : PassedArg<jint> {};
+template <>
+struct ArgOf<VLXListValVLXUnicodeString> : ConvertedArg<VLXListValVLXUnicodeString, jobjectArray> {
+};
+template <>
+struct ArgOf<VLXBinary> : ConvertedArg<VLXBinary, jbyteArray> {
+};
+template <>
+struct ArgOf<int> : PassedArg<jint> {
+};
 // Any non-zero byte is true: Java sees only 0 or 1.
-template <> struct ArgOf<VLXBoolean> {
+template <>
+struct ArgOf<VLXBoolean> {
   using J = jboolean;
   static constexpr bool kOwnsRef = false;
   static constexpr bool kEarly = false;
-  static long To(JNIEnv*, VLXBoolean value, J& out) {
+  static long To(JNIEnv*, VLXBoolean value, J& out)
+  {
     out = value != 0 ? JNI_TRUE : JNI_FALSE;
     return VLX_S_OK;
   }
 };
-template <> struct ArgOf<jobject> : PassedArg<jobject> {};
+template <>
+struct ArgOf<jobject> : PassedArg<jobject> {
+};
 
 // A proxy argument goes as its handle, without a built test.
 template <class P>
@@ -127,7 +147,8 @@ struct ArgOf<P, std::enable_if_t<std::is_base_of_v<VLXKDMJavaObject, P>>> {
   using J = jobject;
   static constexpr bool kOwnsRef = false;
   static constexpr bool kEarly = false;
-  static long To(JNIEnv*, const P& proxy, J& out) {
+  static long To(JNIEnv*, const P& proxy, J& out)
+  {
     out = proxy.GetHandle();
     return VLX_S_OK;
   }
@@ -143,7 +164,8 @@ struct ResultOf;
 template <class Native>
 struct ConvertedResult {  // read by the platform converter
   using Raw = jobject;
-  static long Land(JNIEnv* env, jobject result, Native& out, long) {
+  static long Land(JNIEnv* env, jobject result, Native& out, long)
+  {
     LocalRef owned(env, result);
     return VLXJBXJNIConverter::BuildFromJavaType(env, result, out);
   }
@@ -152,7 +174,8 @@ struct ConvertedResult {  // read by the platform converter
 template <class Native, class Java>
 struct PrimitiveResult {  // written as it came; the status stays
   using Raw = Java;
-  static long Land(JNIEnv*, Java result, Native& out, long status) {
+  static long Land(JNIEnv*, Java result, Native& out, long status)
+  {
     out = result;
     return status;
   }
@@ -160,23 +183,34 @@ struct PrimitiveResult {  // written as it came; the status stays
 
 // Every method answering a VLXUnicodeString is declared to return a java.lang.String, and step 8
 // has found no exception: the text is read without checking either again.
-template <> struct ResultOf<VLXUnicodeString> {
+template <>
+struct ResultOf<VLXUnicodeString> {
   using Raw = jobject;
-  static long Land(JNIEnv* env, jobject result, VLXUnicodeString& out, long) {
+  static long Land(JNIEnv* env, jobject result, VLXUnicodeString& out, long)
+  {
     LocalRef owned(env, result);
     return VLXJBXJNIConverter::BuildFromJavaString(env, static_cast<jstring>(result), out);
   }
 };
-template <> struct ResultOf<VLXListValVLXUnicodeString> : ConvertedResult<VLXListValVLXUnicodeString> {};
-template <> struct ResultOf<VLXBinary> : ConvertedResult<VLXBinary> {};
-template <> struct ResultOf<int> : PrimitiveResult<int, jint> {};
-template <> struct ResultOf<VLXBoolean> : PrimitiveResult<VLXBoolean, jboolean> {};
+template <>
+struct ResultOf<VLXListValVLXUnicodeString> : ConvertedResult<VLXListValVLXUnicodeString> {
+};
+template <>
+struct ResultOf<VLXBinary> : ConvertedResult<VLXBinary> {
+};
+template <>
+struct ResultOf<int> : PrimitiveResult<int, jint> {
+};
+template <>
+struct ResultOf<VLXBoolean> : PrimitiveResult<VLXBoolean, jboolean> {
+};
 
 // A returned Java object is attached to the out-proxy, even when it is null.
 template <class P>
 struct ResultOf<P, std::enable_if_t<std::is_base_of_v<VLXKDMJavaObject, P>>> {
   using Raw = jobject;
-  static long Land(JNIEnv* env, jobject result, P& out, long) {
+  static long Land(JNIEnv* env, jobject result, P& out, long)
+  {
     LocalRef owned(env, result);
     return FrameAccess::Attach(out, env, result);
   }
@@ -184,7 +218,8 @@ struct ResultOf<P, std::enable_if_t<std::is_base_of_v<VLXKDMJavaObject, P>>> {
 
 // A void method: nothing lands, the status stays.
 struct NoResult {};
-template <> struct ResultOf<NoResult> {
+template <>
+struct ResultOf<NoResult> {
   using Raw = void;
 };
 
@@ -197,7 +232,8 @@ struct Forwarded {
 // ---- Refusals ---------------------------------------------------------------------------------
 
 // The Java class of object (not null) for an error text: "a java.lang.Long".
-inline std::string ClassText(JNIEnv* env, jobject object) {
+inline std::string ClassText(JNIEnv* env, jobject object)
+{
   VLXUnicodeString name;
   return VLXJBXJNIUtilities::GetClassName(env, object, name) < 0 ? std::string("of a class whose name cannot be read")
                                                                  : std::string("a ") + name.c_str();
@@ -205,8 +241,10 @@ inline std::string ClassText(JNIEnv* env, jobject object) {
 
 // Records that operation was given a value it cannot take (why says which and why) as the thread's
 // last error; returns VLX_E_INVALIDARG.
-inline long RejectValue(const char* operation, const std::string& why) {
-  return VLXJBXException::Raise(VLX_E_INVALIDARG, VLXJBXMessages::InvalidArgument, {operation, why}, __FILE__, __LINE__);
+inline long RejectValue(const char* operation, const std::string& why)
+{
+  return VLXJBXException::Raise(VLX_E_INVALIDARG, VLXJBXMessages::InvalidArgument, {operation, why}, __FILE__,
+                                __LINE__);
 }
 
 }  // namespace corvexa

@@ -17,35 +17,40 @@ namespace corvexa {
 
 template <class E>
 struct EnumTable;
-template <> struct EnumTable<VLXKDMAttributeType::Type> {
+template <>
+struct EnumTable<VLXKDMAttributeType::Type> {
   static constexpr const char* kName = "VLXKDMAttributeType::Type";
   static constexpr Slot kFirst = AttributeType_Integer;
   static constexpr int kCount = 7;
   static constexpr bool kHasDefault = true;
   static constexpr VLXKDMAttributeType::Type kDefault = VLXKDMAttributeType::String;
 };
-template <> struct EnumTable<VLXKDMAccessMode::Mode> {
+template <>
+struct EnumTable<VLXKDMAccessMode::Mode> {
   static constexpr const char* kName = "VLXKDMAccessMode::Mode";
   static constexpr Slot kFirst = AccessMode_Read;
   static constexpr int kCount = 3;
   static constexpr bool kHasDefault = true;
   static constexpr VLXKDMAccessMode::Mode kDefault = VLXKDMAccessMode::Read;
 };
-template <> struct EnumTable<VLXKDMAggregationType::Type> {
+template <>
+struct EnumTable<VLXKDMAggregationType::Type> {
   static constexpr const char* kName = "VLXKDMAggregationType::Type";
   static constexpr Slot kFirst = AggregationType_Composition;
   static constexpr int kCount = 2;
   static constexpr bool kHasDefault = false;
   static constexpr VLXKDMAggregationType::Type kDefault = VLXKDMAggregationType::Composition;
 };
-template <> struct EnumTable<VLXKDMClassType::Type> {
+template <>
+struct EnumTable<VLXKDMClassType::Type> {
   static constexpr const char* kName = "VLXKDMClassType::Type";
   static constexpr Slot kFirst = ClassType_Class;
   static constexpr int kCount = 2;
   static constexpr bool kHasDefault = true;
   static constexpr VLXKDMClassType::Type kDefault = VLXKDMClassType::Class;
 };
-template <> struct EnumTable<VLXKDMVisibility::Mode> {
+template <>
+struct EnumTable<VLXKDMVisibility::Mode> {
   static constexpr const char* kName = "VLXKDMVisibility::Mode";
   static constexpr Slot kFirst = Visibility_Public;
   static constexpr int kCount = 3;
@@ -69,14 +74,18 @@ struct EnumArg {
   Assertion assertion;
 };
 template <class E>
-EnumArg<E> Enum(E value, Assertion assertion) { return EnumArg<E>{value, assertion}; }
+EnumArg<E> Enum(E value, Assertion assertion)
+{
+  return EnumArg<E>{value, assertion};
+}
 
 // Records that value is none of the enumerators of the enumeration name; returns VLX_E_INVALIDARG.
-inline long RejectEnumerator(const char* name, int value) {
-  return VLXJBXException::Raise(VLX_E_INVALIDARG, VLXJBXMessages::InvalidArgument,
-                                {std::string("the enumeration ") + name,
-                                 "the value " + std::to_string(value) + " is none of its enumerators"},
-                                __FILE__, __LINE__);
+inline long RejectEnumerator(const char* name, int value)
+{
+  return VLXJBXException::Raise(
+      VLX_E_INVALIDARG, VLXJBXMessages::InvalidArgument,
+      {std::string("the enumeration ") + name, "the value " + std::to_string(value) + " is none of its enumerators"},
+      __FILE__, __LINE__);
 }
 
 template <class E>
@@ -84,12 +93,12 @@ struct ArgOf<EnumArg<E>> {
   using J = jobject;
   static constexpr bool kOwnsRef = false;
   static constexpr bool kEarly = true;
-  static long To(JNIEnv*, const EnumArg<E>& arg, J& out) {
+  static long To(JNIEnv*, const EnumArg<E>& arg, J& out)
+  {
     using Table = EnumTable<E>;
     const int value = static_cast<int>(arg.value);
-    out = value >= 0 && value < Table::kCount
-              ? FrameAccess::Table()->Constant(static_cast<Slot>(Table::kFirst + value))
-              : nullptr;
+    out = value >= 0 && value < Table::kCount ? FrameAccess::Table()->Constant(static_cast<Slot>(Table::kFirst + value))
+                                              : nullptr;
     if (out) return VLX_S_OK;
     VLXFatalError(arg.assertion.message, nullptr, nullptr, nullptr, arg.assertion.file, arg.assertion.line);
     return RejectEnumerator(Table::kName, value);
@@ -102,12 +111,16 @@ struct EnumOut {
   E& value;
 };
 template <class E>
-EnumOut<E> Enum(E& value) { return EnumOut<E>{value}; }
+EnumOut<E> Enum(E& value)
+{
+  return EnumOut<E>{value};
+}
 
 template <class E>
 struct ResultOf<EnumOut<E>> {
   using Raw = jobject;
-  static long Land(JNIEnv* env, jobject result, EnumOut<E>& out, long status) {
+  static long Land(JNIEnv* env, jobject result, EnumOut<E>& out, long status)
+  {
     using Table = EnumTable<E>;
     const LocalRef owned(env, result);
     if (!result) {

@@ -15,7 +15,6 @@ using namespace corvexa;
 
 namespace {
 
-
 const char* const kMethodName = "ReplicaStubs::init()";
 // Fixed report path (and lines): callers and their tests match on them; keep them as they are.
 const char* const kSourcePath = "Tessara\\Corvexa.m\\src\\ReplicaStubs.cpp";
@@ -34,7 +33,8 @@ JNIEnv* ReplicaStubs::_env = nullptr;
 
 const char* ReplicaStubs::ClassPath(Slot slot)
 {
-  return slot >= 0 && slot < SlotCount && kBindingRows[slot].kind == BindingKind::Class ? kBindingRows[slot].name : nullptr;
+  return slot >= 0 && slot < SlotCount && kBindingRows[slot].kind == BindingKind::Class ? kBindingRows[slot].name
+                                                                                        : nullptr;
 }
 
 ReplicaStubs::ReplicaStubs() : _state(kFilling) { _missing[0] = '\0'; }
@@ -44,10 +44,11 @@ long ReplicaStubs::init(JNIEnv* env)
   _env = env;
   for (int i = 0; i < SlotCount; ++i) {
     const BindingKind kind = kBindingRows[i].kind;
-    if (kind == BindingKind::Class || kind == BindingKind::Constant || kind == BindingKind::Reserved) _slot[i] = nullptr;
+    if (kind == BindingKind::Class || kind == BindingKind::Constant || kind == BindingKind::Reserved)
+      _slot[i] = nullptr;
   }
 
-  jclass owner = nullptr;          // the class whose members follow
+  jclass owner = nullptr;  // the class whose members follow
   const char* ownerPath = nullptr;
   for (int step = 0; step < SlotCount; ++step) {
     const int slot = SlotAtStep(step);

@@ -6,7 +6,6 @@
 #include <atomic>
 #include <jni.h>
 
-
 namespace corvexa {
 
 // Named slot numbers, in table order.

@@ -10,14 +10,14 @@ using namespace corvexa;
 namespace {
 // Fixed report path (and lines): callers and their tests match on them; keep them as they are.
 const char* const kSource = "Tessara\\Corvexa.m\\src\\VLXKDMAttributeDef.cpp";
-}
+}  // namespace
 
 VLXKDM_PROXY_DEFINITIONS(VLXKDMAttributeDef, AttributeDef)
 
 long VLXKDMAttributeDef::Build(const VLXUnicodeString& name, VLXKDMAttributeType::Type type)
 {
-  return Construct(*this, "VLXKDMAttributeDef::Build(const VLXUnicodeString&, VLXKDMAttributeType::Type)",
-                         AttributeDef, slot<AttributeDef_new_name_type>)
+  return Construct(*this, "VLXKDMAttributeDef::Build(const VLXUnicodeString&, VLXKDMAttributeType::Type)", AttributeDef,
+                   slot<AttributeDef_new_name_type>)
       .rawConversionCode()
       .with(name, Enum(type, {"AssertionFailed:type != NULL", kSource, 41}))
       .construct();
@@ -31,7 +31,8 @@ long VLXKDMAttributeDef::GetAttributeName(VLXUnicodeString& name)
 
 long VLXKDMAttributeDef::GetAttributeType(VLXKDMAttributeType::Type& type)
 {
-  return Call(*this, "VLXKDMAttributeDef::GetAttributeType(VLXKDMAttributeType::Type&)", slot<AttributeDef_getAttributeType>)
+  return Call(*this, "VLXKDMAttributeDef::GetAttributeType(VLXKDMAttributeType::Type&)",
+              slot<AttributeDef_getAttributeType>)
       .returning(Enum(type));
 }
 
@@ -42,7 +43,9 @@ long VLXKDMAttributeDef::GetUuid(VLXUnicodeString& uuid)
 
 long VLXKDMAttributeDef::SetUuid(const VLXUnicodeString& uuid)
 {
-  return Call(*this, "VLXKDMAttributeDef::SetUuid(const VLXUnicodeString&)", slot<AttributeDef_setUuid>).with(uuid).run();
+  return Call(*this, "VLXKDMAttributeDef::SetUuid(const VLXUnicodeString&)", slot<AttributeDef_setUuid>)
+      .with(uuid)
+      .run();
 }
 
 long VLXKDMAttributeDef::GetQKAComment(VLXUnicodeString& comment)
@@ -61,7 +64,8 @@ long VLXKDMAttributeDef::SetQKAComment(const VLXUnicodeString& comment)
 
 long VLXKDMAttributeDef::GetTargetNames(VLXListOfVLXUnicodeString& names)
 {
-  return Call(*this, "VLXKDMAttributeDef::GetTargetNames(VLXListOfVLXUnicodeString&)", slot<AttributeDef_getTargetNames>)
+  return Call(*this, "VLXKDMAttributeDef::GetTargetNames(VLXListOfVLXUnicodeString&)",
+              slot<AttributeDef_getTargetNames>)
       .returning(names);
 }
 
@@ -88,7 +92,8 @@ long VLXKDMAttributeDef::GetTargetRefs(VLXListOfVLXUnicodeString& refs)
 
 long VLXKDMAttributeDef::SetTargetRefs(const VLXListOfVLXUnicodeString& refs)
 {
-  return Call(*this, "VLXKDMAttributeDef::SetTargetRefs(const VLXListOfVLXUnicodeString&)", slot<AttributeDef_setTargetRefs>)
+  return Call(*this, "VLXKDMAttributeDef::SetTargetRefs(const VLXListOfVLXUnicodeString&)",
+              slot<AttributeDef_setTargetRefs>)
       .with(refs)
       .run();
 }
@@ -154,12 +159,15 @@ long VLXKDMAttributeDef::SetLength(int length)
 
 long VLXKDMAttributeDef::IsMandatory(VLXBoolean& isMandatory)
 {
-  return Call(*this, "VLXKDMAttributeDef::IsMandatory(VLXBoolean&)", slot<AttributeDef_isMandatory>).returning(isMandatory);
+  return Call(*this, "VLXKDMAttributeDef::IsMandatory(VLXBoolean&)", slot<AttributeDef_isMandatory>)
+      .returning(isMandatory);
 }
 
 long VLXKDMAttributeDef::SetMandatory(VLXBoolean isMandatory)
 {
-  return Call(*this, "VLXKDMAttributeDef::SetMandatory(VLXBoolean)", slot<AttributeDef_setMandatory>).with(isMandatory).run();
+  return Call(*this, "VLXKDMAttributeDef::SetMandatory(VLXBoolean)", slot<AttributeDef_setMandatory>)
+      .with(isMandatory)
+      .run();
 }
 
 long VLXKDMAttributeDef::IsMultiValuated(VLXBoolean& isMultiValuated)
@@ -187,7 +195,8 @@ long VLXKDMAttributeDef::SetUnicity(VLXBoolean isUnique)
 
 long VLXKDMAttributeDef::GetClassDef(VLXKDMClassDef& classDef)
 {
-  return Call(*this, "VLXKDMAttributeDef::GetClassDef(VLXKDMClassDef&)", slot<AttributeDef_getClassDef>).returning(classDef);
+  return Call(*this, "VLXKDMAttributeDef::GetClassDef(VLXKDMClassDef&)", slot<AttributeDef_getClassDef>)
+      .returning(classDef);
 }
 
 long VLXKDMAttributeDef::ToString(VLXUnicodeString& text)

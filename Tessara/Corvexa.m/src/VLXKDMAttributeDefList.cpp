@@ -44,14 +44,17 @@ long VLXKDMAttributeDefList::IndexOf(const VLXKDMAttributeDef& item, int& positi
 
 long VLXKDMAttributeDefList::IndexOf(const VLXUnicodeString& name, int& position)
 {
-  return Call(*this, "VLXKDMAttributeDefList::IndexOf(const VLXUnicodeString&, int&)", slot<AttributeDefList_indexOfNamed>)
+  return Call(*this, "VLXKDMAttributeDefList::IndexOf(const VLXUnicodeString&, int&)",
+              slot<AttributeDefList_indexOfNamed>)
       .with(name)
       .returning(position);
 }
 
 long VLXKDMAttributeDefList::Add(const VLXKDMAttributeDef& item)
 {
-  return Call(*this, "VLXKDMAttributeDefList::Add(const VLXKDMAttributeDef&)", slot<AttributeDefList_add>).with(item).run();
+  return Call(*this, "VLXKDMAttributeDefList::Add(const VLXKDMAttributeDef&)", slot<AttributeDefList_add>)
+      .with(item)
+      .run();
 }
 
 long VLXKDMAttributeDefList::Remove(const VLXKDMAttributeDef& item)

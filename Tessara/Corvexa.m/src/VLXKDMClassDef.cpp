@@ -9,7 +9,7 @@ using namespace corvexa;
 namespace {
 // Fixed report path (and lines): callers and their tests match on them; keep them as they are.
 const char* const kSource = "Tessara\\Corvexa.m\\src\\VLXKDMClassDef.cpp";
-}
+}  // namespace
 
 VLXKDM_PROXY_DEFINITIONS(VLXKDMClassDef, ClassDef)
 
@@ -32,7 +32,9 @@ long VLXKDMClassDef::GetClassName(VLXUnicodeString& name)
 
 long VLXKDMClassDef::SetClassName(const VLXUnicodeString& name)
 {
-  return Call(*this, "VLXKDMClassDef::SetClassName(const VLXUnicodeString&)", slot<ClassDef_setClassName>).with(name).run();
+  return Call(*this, "VLXKDMClassDef::SetClassName(const VLXUnicodeString&)", slot<ClassDef_setClassName>)
+      .with(name)
+      .run();
 }
 
 long VLXKDMClassDef::GetSuperName(VLXUnicodeString& name)
@@ -42,7 +44,9 @@ long VLXKDMClassDef::GetSuperName(VLXUnicodeString& name)
 
 long VLXKDMClassDef::SetSuperName(const VLXUnicodeString& name)
 {
-  return Call(*this, "VLXKDMClassDef::SetSuperName(const VLXUnicodeString&)", slot<ClassDef_setSuperName>).with(name).run();
+  return Call(*this, "VLXKDMClassDef::SetSuperName(const VLXUnicodeString&)", slot<ClassDef_setSuperName>)
+      .with(name)
+      .run();
 }
 
 long VLXKDMClassDef::GetUuid(VLXUnicodeString& uuid)
@@ -57,7 +61,8 @@ long VLXKDMClassDef::SetUuid(const VLXUnicodeString& uuid)
 
 long VLXKDMClassDef::GetQKAComment(VLXUnicodeString& comment)
 {
-  return Call(*this, "VLXKDMClassDef::GetQKAComment(VLXUnicodeString&)", slot<ClassDef_getQKAComment>).returning(comment);
+  return Call(*this, "VLXKDMClassDef::GetQKAComment(VLXUnicodeString&)", slot<ClassDef_getQKAComment>)
+      .returning(comment);
 }
 
 long VLXKDMClassDef::SetQKAComment(const VLXUnicodeString& comment)
@@ -95,8 +100,7 @@ long VLXKDMClassDef::SetScopeNames(const VLXListOfVLXUnicodeString& names)
 
 long VLXKDMClassDef::SetScopeNames(int count, ...)
 {
-  VLXKDM_GATHER_THEN(VLXListValVLXUnicodeString, GatherTexts, "VLXKDMClassDef::SetScopeNames(int, ...)",
-                     SetScopeNames);
+  VLXKDM_GATHER_THEN(VLXListValVLXUnicodeString, GatherTexts, "VLXKDMClassDef::SetScopeNames(int, ...)", SetScopeNames);
 }
 
 long VLXKDMClassDef::IsAbstract(VLXBoolean& isAbstract)
@@ -128,7 +132,9 @@ long VLXKDMClassDef::IsPersistent(VLXBoolean& isPersistent)
 
 long VLXKDMClassDef::SetPersistency(VLXBoolean isPersistent)
 {
-  return Call(*this, "VLXKDMClassDef::SetPersistency(VLXBoolean)", slot<ClassDef_setPersistency>).with(isPersistent).run();
+  return Call(*this, "VLXKDMClassDef::SetPersistency(VLXBoolean)", slot<ClassDef_setPersistency>)
+      .with(isPersistent)
+      .run();
 }
 
 long VLXKDMClassDef::GetClassType(VLXKDMClassType::Type& type)
@@ -146,13 +152,15 @@ long VLXKDMClassDef::SetClassType(VLXKDMClassType::Type type)
 
 long VLXKDMClassDef::GetSoftwareVisibility(VLXKDMVisibility::Mode& visibility)
 {
-  return Call(*this, "VLXKDMClassDef::GetSoftwareVisibility(VLXKDMVisibility::Mode&)", slot<ClassDef_getSoftwareVisibility>)
+  return Call(*this, "VLXKDMClassDef::GetSoftwareVisibility(VLXKDMVisibility::Mode&)",
+              slot<ClassDef_getSoftwareVisibility>)
       .returning(Enum(visibility));
 }
 
 long VLXKDMClassDef::SetSoftwareVisibility(VLXKDMVisibility::Mode visibility)
 {
-  return Call(*this, "VLXKDMClassDef::SetSoftwareVisibility(VLXKDMVisibility::Mode)", slot<ClassDef_setSoftwareVisibility>)
+  return Call(*this, "VLXKDMClassDef::SetSoftwareVisibility(VLXKDMVisibility::Mode)",
+              slot<ClassDef_setSoftwareVisibility>)
       .with(Enum(visibility, {"AssertionFailed:vis != NULL", kSource, 211}))
       .run();
 }

@@ -36,7 +36,8 @@ inline long RejectIdentifier(JNIEnv* env, jobject identifier, const char* name)
 template <>
 struct ResultOf<IdentifierOut> {
   using Raw = jobject;
-  static long Land(JNIEnv* env, jobject result, IdentifierOut& out, long status) {
+  static long Land(JNIEnv* env, jobject result, IdentifierOut& out, long status)
+  {
     LocalRef owned(env, result);
     if (!result) {
       out.noID = 1;
@@ -76,7 +77,8 @@ inline std::string AttributeText(int position) { return "at position " + std::to
 template <class Attribute>
 struct ResultOf<ValueOut<Attribute>> {
   using Raw = jobject;
-  static long Land(JNIEnv* env, jobject result, ValueOut<Attribute>& out, long) {
+  static long Land(JNIEnv* env, jobject result, ValueOut<Attribute>& out, long)
+  {
     LocalRef owned(env, result);
     if (result) return FrameAccess::Read(out.value, env, result);
     VLXUnicodeString instance;
@@ -87,8 +89,8 @@ struct ResultOf<ValueOut<Attribute>> {
       VLXJBXJNIHelper::ExceptionClear(env);
       instance = VLXUnicodeString("the instance");
     }
-    return RejectValue(out.operation, "the attribute " + AttributeText(out.attribute) + " of " + instance.c_str() +
-                                          " has no value");
+    return RejectValue(out.operation,
+                       "the attribute " + AttributeText(out.attribute) + " of " + instance.c_str() + " has no value");
   }
 };
 
@@ -103,7 +105,8 @@ long VLXKDMInstance::GetClassDef(VLXKDMClassDef& classDef)
 
 long VLXKDMInstance::GetID(VLXBoolean& noID, VLXBoolean& isText, VLXUnicodeString& text, VLXBinary& bytes)
 {
-  return Call(*this, "VLXKDMInstance::GetID(VLXBoolean&, VLXBoolean&, VLXUnicodeString&, VLXBinary&)", slot<Instance_getID>)
+  return Call(*this, "VLXKDMInstance::GetID(VLXBoolean&, VLXBoolean&, VLXUnicodeString&, VLXBinary&)",
+              slot<Instance_getID>)
       .returning(IdentifierOut{noID, isText, text, bytes});
 }
 
@@ -149,7 +152,9 @@ long VLXKDMInstance::IsValuated(int position, VLXBoolean& valuated)
 
 long VLXKDMInstance::ClearValue(const VLXUnicodeString& name)
 {
-  return Call(*this, "VLXKDMInstance::ClearValue(const VLXUnicodeString&)", slot<Instance_clearValueNamed>).with(name).run();
+  return Call(*this, "VLXKDMInstance::ClearValue(const VLXUnicodeString&)", slot<Instance_clearValueNamed>)
+      .with(name)
+      .run();
 }
 
 long VLXKDMInstance::ClearValue(int position)
@@ -190,7 +195,8 @@ long VLXKDMInstance::GetValue(int position, VLXKDMInstanceValue& value)
 
 long VLXKDMInstance::SetValue(const VLXUnicodeString& name, VLXKDMInstanceValue& value)
 {
-  return Call(*this, "VLXKDMInstance::SetValue(const VLXUnicodeString&, VLXKDMInstanceValue&)", slot<Instance_setValueNamed>)
+  return Call(*this, "VLXKDMInstance::SetValue(const VLXUnicodeString&, VLXKDMInstanceValue&)",
+              slot<Instance_setValueNamed>)
       .with(name, Remote(value))
       .run();
 }
@@ -207,7 +213,9 @@ long VLXKDMInstance::SetObject(JNIEnv* started, const Attribute& attribute, jobj
 {
   constexpr bool kAt = std::is_same_v<Attribute, int>;
   constexpr Slot kSetValue = kAt ? Instance_setValueAt : Instance_setValueNamed;
-  return Call(*this, kAt ? "VLXKDMInstance::SetValue(int, jobject)" : "VLXKDMInstance::SetValue(const VLXUnicodeString&, jobject)",
+  return Call(*this,
+              kAt ? "VLXKDMInstance::SetValue(int, jobject)"
+                  : "VLXKDMInstance::SetValue(const VLXUnicodeString&, jobject)",
               slot<kSetValue>)
       .startedOn(started)
       .with(attribute, object)
@@ -364,8 +372,7 @@ long VLXKDMInstance::SetValue(int position, const VLXListOfVLXBinary& value)
 
 long VLXKDMInstance::SetValue(const VLXUnicodeString& name, const VLXListOfVLXKDMInstance& value)
 {
-  return SetConverted("VLXKDMInstance::SetValue(const VLXUnicodeString&, const VLXListOfVLXKDMInstance&)", name,
-                      value);
+  return SetConverted("VLXKDMInstance::SetValue(const VLXUnicodeString&, const VLXListOfVLXKDMInstance&)", name, value);
 }
 
 long VLXKDMInstance::SetValue(int position, const VLXListOfVLXKDMInstance& value)
@@ -388,12 +395,27 @@ T ValueAt(const T* pointer)
 // Any non-zero boolean argument is true.
 VLXBoolean Truth(int b) { return static_cast<VLXBoolean>(b != 0); }
 template <class T>
-T Same(T value) { return value; }
+T Same(T value)
+{
+  return value;
+}
 
-long GatherBinaries(const char* op, int n, va_list a, VLXListValVLXBinary& l) { return Gather<const VLXBinary*>(op, n, a, l, ValueAt<VLXBinary>); }
-long GatherBooleans(const char* op, int n, va_list a, VLXListValVLXBoolean& l) { return Gather<int>(op, n, a, l, Truth); }
-long GatherDates(const char* op, int n, va_list a, VLXListValVLXTime& l) { return Gather<const VLXTime*, true>(op, n, a, l, ValueAt<VLXTime>); }
-long GatherDoubles(const char* op, int n, va_list a, VLXRawColldouble& l) { return Gather<double>(op, n, a, l, Same<double>); }
+long GatherBinaries(const char* op, int n, va_list a, VLXListValVLXBinary& l)
+{
+  return Gather<const VLXBinary*>(op, n, a, l, ValueAt<VLXBinary>);
+}
+long GatherBooleans(const char* op, int n, va_list a, VLXListValVLXBoolean& l)
+{
+  return Gather<int>(op, n, a, l, Truth);
+}
+long GatherDates(const char* op, int n, va_list a, VLXListValVLXTime& l)
+{
+  return Gather<const VLXTime*, true>(op, n, a, l, ValueAt<VLXTime>);
+}
+long GatherDoubles(const char* op, int n, va_list a, VLXRawColldouble& l)
+{
+  return Gather<double>(op, n, a, l, Same<double>);
+}
 long GatherInstances(const char* op, int n, va_list a, VLXListValVLXKDMInstance& l)
 {
   return Gather<const VLXKDMInstance*, true>(op, n, a, l, ValueAt<VLXKDMInstance>);
@@ -402,11 +424,11 @@ long GatherIntegers(const char* op, int n, va_list a, VLXRawCollint& l) { return
 
 }  // namespace
 
-#define VLXKDM_VARIADIC_SETTER(Operation, Attribute, List, gather)                                   \
-  long VLXKDMInstance::Operation(Attribute attribute, int count, ...)                                \
-  {                                                                                                  \
-    VLXKDM_GATHER_THEN(List, gather, "VLXKDMInstance::" #Operation "(" #Attribute ", int, ...)",     \
-                       [&](const List& list) { return SetValue(attribute, list); });                 \
+#define VLXKDM_VARIADIC_SETTER(Operation, Attribute, List, gather)                               \
+  long VLXKDMInstance::Operation(Attribute attribute, int count, ...)                            \
+  {                                                                                              \
+    VLXKDM_GATHER_THEN(List, gather, "VLXKDMInstance::" #Operation "(" #Attribute ", int, ...)", \
+                       [&](const List& list) { return SetValue(attribute, list); });             \
   }
 
 VLXKDM_VARIADIC_SETTER(SetValueBinaries, const VLXUnicodeString&, VLXListValVLXBinary, GatherBinaries)

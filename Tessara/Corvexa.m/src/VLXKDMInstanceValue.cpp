@@ -38,7 +38,10 @@ void Empty(JNIEnv*, VLXUnicodeString& text) { text = VLXUnicodeString(); }
 void Empty(JNIEnv* env, VLXKDMInstance& instance) { instance.SetHandle(env, nullptr); }
 void Empty(JNIEnv*, VLXListValVLXKDMInstance& list) { list.RemoveAll(VLXCollec::FreeMemory); }
 template <class E>
-void Empty(JNIEnv*, VLXList<E>& list) { list.RemoveAll(1); }
+void Empty(JNIEnv*, VLXList<E>& list)
+{
+  list.RemoveAll(1);
+}
 
 }  // namespace
 
@@ -48,11 +51,11 @@ struct VLXKDMInstanceValue::Dispatch {
   struct Row {
     Type type;
     bool isArray;
-    Slot javaClass;                                   // the exact class of the remote form
-    long (*build)(JNIEnv*, jobject, V&, bool);        // Java object to the member (and the handle)
-    long (*convert)(JNIEnv*, V&, jobject&);           // the member to a new Java object
-    void (*empty)(JNIEnv*, V&);                       // the member emptied
-    const char* getterText;                           // the getter's precondition, as reported
+    Slot javaClass;                             // the exact class of the remote form
+    long (*build)(JNIEnv*, jobject, V&, bool);  // Java object to the member (and the handle)
+    long (*convert)(JNIEnv*, V&, jobject&);     // the member to a new Java object
+    void (*empty)(JNIEnv*, V&);                 // the member emptied
+    const char* getterText;                     // the getter's precondition, as reported
     int getterLine;
   };
 
@@ -68,9 +71,15 @@ struct VLXKDMInstanceValue::Dispatch {
     return status;
   }
   template <class T, T V::*M>
-  static long Convert(JNIEnv* env, V& value, jobject& object) { return Values::ConvertToJavaType(env, value.*M, object); }
+  static long Convert(JNIEnv* env, V& value, jobject& object)
+  {
+    return Values::ConvertToJavaType(env, value.*M, object);
+  }
   template <class T, T V::*M>
-  static void EmptyMember(JNIEnv* env, V& value) { Empty(env, value.*M); }
+  static void EmptyMember(JNIEnv* env, V& value)
+  {
+    Empty(env, value.*M);
+  }
 
   // In the order in which BuildLocal compares the Java classes.
   static const Row kRows[14];
@@ -113,15 +122,12 @@ struct VLXKDMInstanceValue::Dispatch {
   }
 };
 
-#define VALUE_ROW(type, isArray, slot, member, text, line)                                        \
-  {type,                                                                                         \
-   isArray,                                                                                      \
-   slot,                                                                                         \
-   &Dispatch::Build<decltype(V::member), &V::member>,                                            \
-   &Dispatch::Convert<decltype(V::member), &V::member>,                                          \
-   &Dispatch::EmptyMember<decltype(V::member), &V::member>,                                      \
-   "AssertionFailed:" text,                                                                      \
-   line}
+#define VALUE_ROW(type, isArray, slot, member, text, line)                                                            \
+  {                                                                                                                   \
+    type, isArray, slot, &Dispatch::Build<decltype(V::member), &V::member>,                                           \
+        &Dispatch::Convert<decltype(V::member), &V::member>, &Dispatch::EmptyMember<decltype(V::member), &V::member>, \
+        "AssertionFailed:" text, line                                                                                 \
+  }
 
 const VLXKDMInstanceValue::Dispatch::Row VLXKDMInstanceValue::Dispatch::kRows[14] = {
     VALUE_ROW(IntegerType, false, Integer, _integer, "_type == IntegerType && !_isArray", 247),
@@ -297,13 +303,19 @@ const VLXListValVLXKDMInstance& VLXKDMInstanceValue::GetListOfInstance() const
 
 void VLXKDMInstanceValue::SetInteger(int value) { Dispatch::Set(*this, &V::_integer, IntegerType, false, value); }
 void VLXKDMInstanceValue::SetDouble(double value) { Dispatch::Set(*this, &V::_double, DoubleType, false, value); }
-void VLXKDMInstanceValue::SetBoolean(VLXBoolean value) { Dispatch::Set(*this, &V::_boolean, BooleanType, false, value); }
+void VLXKDMInstanceValue::SetBoolean(VLXBoolean value)
+{
+  Dispatch::Set(*this, &V::_boolean, BooleanType, false, value);
+}
 void VLXKDMInstanceValue::SetString(const VLXUnicodeString& value)
 {
   Dispatch::Set(*this, &V::_string, StringType, false, value);
 }
 void VLXKDMInstanceValue::SetDate(const VLXTime& value) { Dispatch::Set(*this, &V::_date, DateType, false, value); }
-void VLXKDMInstanceValue::SetBinary(const VLXBinary& value) { Dispatch::Set(*this, &V::_binary, BinaryType, false, value); }
+void VLXKDMInstanceValue::SetBinary(const VLXBinary& value)
+{
+  Dispatch::Set(*this, &V::_binary, BinaryType, false, value);
+}
 void VLXKDMInstanceValue::SetInstance(const VLXKDMInstance& value)
 {
   Dispatch::Set(*this, &V::_instance, InstanceType, false, value);

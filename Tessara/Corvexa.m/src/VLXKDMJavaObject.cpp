@@ -29,10 +29,12 @@ const int kLineNewError = 108;
 // Holds the library's mutex for one scope, when asked to.
 class MaybeLocked {
  public:
-  MaybeLocked(VLXMutex* mutex, bool lock) : _mutex(lock ? mutex : nullptr) {
+  MaybeLocked(VLXMutex* mutex, bool lock) : _mutex(lock ? mutex : nullptr)
+  {
     if (_mutex) _mutex->Lock();
   }
-  ~MaybeLocked() {
+  ~MaybeLocked()
+  {
     if (_mutex) _mutex->Unlock();
   }
   MaybeLocked(const MaybeLocked&) = delete;
@@ -43,14 +45,16 @@ class MaybeLocked {
 };
 
 // Raises a new error of our catalog naming methodName and the cause as the thread's last error.
-long RaiseNew(const char* messageId, const char* methodName, const VLXUnicodeString& cause, int line) {
+long RaiseNew(const char* messageId, const char* methodName, const VLXUnicodeString& cause, int line)
+{
   return VLXJBXException::Raise(VLX_E_FAIL, messageId,
                                 {methodName, std::string(cause.c_str(), static_cast<size_t>(cause.GetLengthInByte()))},
                                 kSourcePath, line);
 }
 
 // The text of the error that the current operation recorded, or the given text when it recorded none.
-VLXUnicodeString OwnCause(const char* otherwise) {
+VLXUnicodeString OwnCause(const char* otherwise)
+{
   VLXError* own = VLXError::VLXGetOperationError();
   if (!own) return VLXUnicodeString(otherwise);
   VLXUnicodeString text = own->GetMessageText();
@@ -80,8 +84,7 @@ long VLXKDMJavaObject::InitJava(JNIEnv*& env, const char* methodName)
   // thread creates and fills the table, every other thread waits until it is complete. This also
   // covers a late start, when the first call of the process found no environment.
   const ReplicaStubs* table = _st.load(std::memory_order_acquire);
-  const bool starting =
-      _javaInitDone.load(std::memory_order_acquire) == 0 || !table || !table->IsSettled();
+  const bool starting = _javaInitDone.load(std::memory_order_acquire) == 0 || !table || !table->IsSettled();
   MaybeLocked lock(_mutex, starting);
   // Errors recorded before this operation are not its own.
   VLXError::MarkOperationStart();
@@ -167,7 +170,8 @@ long VLXKDMJavaObject::CheckJavaClass(JNIEnv* env, jobject object, int javaClass
   std::string expected = ReplicaStubs::ClassPath(slot);
   for (char& c : expected)
     if (c == '/') c = '.';
-  return corvexa::RejectValue(operation, "the Java object is " + corvexa::ClassText(env, object) + ", not a " + expected);
+  return corvexa::RejectValue(operation,
+                              "the Java object is " + corvexa::ClassText(env, object) + ", not a " + expected);
 }
 
 extern "C" int VELMORA_QKA2_INTERNAL_Corvexa() { return 1; }

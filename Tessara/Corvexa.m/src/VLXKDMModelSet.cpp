@@ -60,7 +60,9 @@ long VLXKDMModelSet::Remove(const VLXKDMClassDef& classDef)
 
 long VLXKDMModelSet::Remove(const VLXUnicodeString& className)
 {
-  return Call(*this, "VLXKDMModelSet::Remove(const VLXUnicodeString&)", slot<ModelSet_removeNamed>).with(className).run();
+  return Call(*this, "VLXKDMModelSet::Remove(const VLXUnicodeString&)", slot<ModelSet_removeNamed>)
+      .with(className)
+      .run();
 }
 
 long VLXKDMModelSet::Remove(int position)

@@ -38,10 +38,7 @@ long VLXKDMReplica::ToString(VLXUnicodeString& text)
   return Call(*this, "VLXKDMReplica::ToString(VLXUnicodeString&)", slot<Replica_toString>).returning(text);
 }
 
-long VLXKDMReplica::Commit()
-{
-  return Call(*this, "VLXKDMReplica::Commit()", slot<Replica_commit>).run();
-}
+long VLXKDMReplica::Commit() { return Call(*this, "VLXKDMReplica::Commit()", slot<Replica_commit>).run(); }
 
 long VLXKDMReplica::GetModels(VLXKDMModelSet& models)
 {
@@ -67,7 +64,8 @@ long VLXKDMReplica::GetAttributeDef(const VLXUnicodeString& attributeName, VLXKD
 
 long VLXKDMReplica::SetSchemaLocation(const VLXUnicodeString& location)
 {
-  return CallStatic("VLXKDMReplica::SetSchemaLocation(const VLXUnicodeString&)", Replica, slot<Replica_setSchemaLocation>)
+  return CallStatic("VLXKDMReplica::SetSchemaLocation(const VLXUnicodeString&)", Replica,
+                    slot<Replica_setSchemaLocation>)
       .with(location)
       .run();
 }
@@ -108,7 +106,8 @@ long VLXKDMReplica::PopulatesFromXmlFile(const VLXUnicodeString& path)
 
 long VLXKDMReplica::PopulatesFromXmlString(const VLXUnicodeString& xml)
 {
-  return Call(*this, "VLXKDMReplica::PopulatesFromXmlString(const VLXUnicodeString&)", slot<Replica_populatesFromXmlString>)
+  return Call(*this, "VLXKDMReplica::PopulatesFromXmlString(const VLXUnicodeString&)",
+              slot<Replica_populatesFromXmlString>)
       .with(xml)
       .run();
 }
@@ -116,7 +115,7 @@ long VLXKDMReplica::PopulatesFromXmlString(const VLXUnicodeString& xml)
 long VLXKDMReplica::ReadFromXmlFile(const VLXUnicodeString& path, VLXKDMReplica& replica)
 {
   return CallStatic("VLXKDMReplica::ReadFromXmlFile(const VLXUnicodeString&, VLXKDMReplica&)", Replica,
-                      slot<Replica_readFromXmlFile>)
+                    slot<Replica_readFromXmlFile>)
       .with(path)
       .returning(replica);
 }
@@ -124,7 +123,7 @@ long VLXKDMReplica::ReadFromXmlFile(const VLXUnicodeString& path, VLXKDMReplica&
 long VLXKDMReplica::ReadFromXmlString(const VLXUnicodeString& xml, VLXKDMReplica& replica)
 {
   return CallStatic("VLXKDMReplica::ReadFromXmlString(const VLXUnicodeString&, VLXKDMReplica&)", Replica,
-                      slot<Replica_readFromXmlString>)
+                    slot<Replica_readFromXmlString>)
       .with(xml)
       .returning(replica);
 }
@@ -151,7 +150,7 @@ long VLXKDMReplica::GetXsd(VLXUnicodeString& xsd)
 long VLXKDMReplica::GetBinaryFromReplica(const VLXKDMReplica& replica, VLXBoolean compressed, VLXBinary& bytes)
 {
   return CallStatic("VLXKDMReplica::GetBinaryFromReplica(const VLXKDMReplica&, VLXBoolean, VLXBinary&)", Replica,
-                      slot<Replica_getBinaryFromReplica>)
+                    slot<Replica_getBinaryFromReplica>)
       .with(replica, compressed)
       .returning(bytes);
 }
@@ -159,7 +158,7 @@ long VLXKDMReplica::GetBinaryFromReplica(const VLXKDMReplica& replica, VLXBoolea
 long VLXKDMReplica::GetReplicaFromBinary(const VLXBinary& bytes, VLXBoolean compressed, VLXKDMReplica& replica)
 {
   return CallStatic("VLXKDMReplica::GetReplicaFromBinary(const VLXBinary&, VLXBoolean, VLXKDMReplica&)", Replica,
-                      slot<Replica_getReplicaFromBinary>)
+                    slot<Replica_getReplicaFromBinary>)
       .with(bytes, compressed)
       .returning(replica);
 }
@@ -215,8 +214,8 @@ long VLXKDMReplica::ConvertToJavaHolder(JNIEnv* env, jobject& holder)
   }
 
   // A holder made here is handed out only when it holds the replica.
-  LocalRef created(env, holder ? nullptr
-                               : VLXJBXJNIHelper::NewObject(env, st->Class(ReplicaHolder), st->Method(ReplicaHolder_new)));
+  LocalRef created(
+      env, holder ? nullptr : VLXJBXJNIHelper::NewObject(env, st->Class(ReplicaHolder), st->Method(ReplicaHolder_new)));
   const jobject target = holder ? holder : created.get();
   if (!target) return VLXJBXJNIUtilities::HandleJavaError(env, VLX_E_FAIL, name, nullptr, 0);
 

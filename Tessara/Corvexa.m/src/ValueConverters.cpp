@@ -44,7 +44,8 @@ const char* const kConvertInstance = "VLXKDMJavaObject::ConvertToJavaType(JNIEnv
 const char* const kConvertTimes = "VLXKDMJavaObject::ConvertToJavaType(JNIEnv*, const VLXListOfVLXTime&, jobject&)";
 const char* const kConvertInstances =
     "VLXKDMJavaObject::ConvertToJavaType(JNIEnv*, const VLXListOfVLXKDMInstance&, jobject&)";
-const char* const kConvertBinaries = "VLXKDMJavaObject::ConvertToJavaType(JNIEnv*, const VLXListOfVLXBinary&, jobject&)";
+const char* const kConvertBinaries =
+    "VLXKDMJavaObject::ConvertToJavaType(JNIEnv*, const VLXListOfVLXBinary&, jobject&)";
 
 long Translate(JNIEnv* env, long status, const char* name)
 {
@@ -91,8 +92,8 @@ bool Milliseconds(const VLXTime& time, jlong& ms)
 
 long RejectTime(JNIEnv* env, const VLXTime& time, const char* name)
 {
-  const std::string why = "the time " + std::to_string(static_cast<long long>(time.Gettime_t())) +
-                          " s is beyond the range of a Java date";
+  const std::string why =
+      "the time " + std::to_string(static_cast<long long>(time.Gettime_t())) + " s is beyond the range of a Java date";
   return Translate(env, RejectValue(name, why), name);
 }
 
@@ -300,7 +301,8 @@ long VLXKDMJavaObject::ConvertToJavaType(JNIEnv* env, const VLXListValVLXKDMInst
     if (input[i].GetHandle()) continue;
     VLXFatalError("AssertionFailed:input[i].GetHandle() != NULL", nullptr, nullptr, nullptr, kSource,
                   kLineUnattachedElement);
-    const std::string why = "the instance at position " + std::to_string(i) + " of the list is not attached to a Java object";
+    const std::string why =
+        "the instance at position " + std::to_string(i) + " of the list is not attached to a Java object";
     return Translate(env, RejectValue(kConvertInstances, why), kConvertInstances);
   }
   LocalRef array(env, H::NewObjectArray(env, n, st->Class(Instance), nullptr));

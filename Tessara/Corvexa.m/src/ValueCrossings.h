@@ -18,7 +18,8 @@ namespace corvexa {
 struct Values : VLXKDMJavaObject {
   using VLXKDMJavaObject::BuildFromJavaType;
   using VLXKDMJavaObject::ConvertToJavaType;
-  static long ConvertToJavaType(JNIEnv* env, const VLXUnicodeString& input, jobject& output) {
+  static long ConvertToJavaType(JNIEnv* env, const VLXUnicodeString& input, jobject& output)
+  {
     jstring text = nullptr;
     const long status = VLXJBXJNIConverter::ConvertToJavaString(env, input, text);
     if (status >= 0) output = text;
@@ -26,12 +27,14 @@ struct Values : VLXKDMJavaObject {
   }
   template <class Native>
   static auto ConvertToJavaType(JNIEnv* env, const Native& input, jobject& output)
-      -> decltype(VLXJBXJNIConverter::ConvertToJavaType(env, input, output)) {
+      -> decltype(VLXJBXJNIConverter::ConvertToJavaType(env, input, output))
+  {
     return VLXJBXJNIConverter::ConvertToJavaType(env, input, output);
   }
   template <class Native>
   static auto BuildFromJavaType(JNIEnv* env, jobject input, Native& output)
-      -> decltype(VLXJBXJNIConverter::BuildFromJavaType(env, input, output)) {
+      -> decltype(VLXJBXJNIConverter::BuildFromJavaType(env, input, output))
+  {
     return VLXJBXJNIConverter::BuildFromJavaType(env, input, output);
   }
 };
@@ -43,7 +46,10 @@ struct JavaForm {
   const T& value;
 };
 template <class T>
-JavaForm<T> AsJava(const T& value) { return JavaForm<T>{value}; }
+JavaForm<T> AsJava(const T& value)
+{
+  return JavaForm<T>{value};
+}
 
 template <class T>
 struct ArgOf<JavaForm<T>> {
@@ -65,7 +71,8 @@ struct ArgOf<RemoteForm> {
   using J = jobject;
   static constexpr bool kOwnsRef = false;
   static constexpr bool kEarly = true;
-  static long To(JNIEnv*, const RemoteForm& arg, J& out) {
+  static long To(JNIEnv*, const RemoteForm& arg, J& out)
+  {
     const long status = arg.value.BuildRemote();
     if (status < 0) return status;
     out = arg.value.GetHandle();
@@ -82,7 +89,8 @@ struct ArgOf<VLXKDMInstanceValue>;
 template <>
 struct ResultOf<VLXKDMInstanceValue> {
   using Raw = jobject;
-  static long Land(JNIEnv* env, jobject result, VLXKDMInstanceValue& out, long) {
+  static long Land(JNIEnv* env, jobject result, VLXKDMInstanceValue& out, long)
+  {
     LocalRef owned(env, result);
     if (!result) return RejectValue("VLXKDMInstanceValue::BuildLocal()", "the Java method answered no value");
     return FrameAccess::Read(out, env, result);

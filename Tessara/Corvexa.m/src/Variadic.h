@@ -26,8 +26,8 @@ long Gather(const char* operation, int count, va_list args, List& list, Convert 
     const VaArg argument = va_arg(args, VaArg);
     if constexpr (kNullRefused) {
       if (!argument)
-        return RejectValue(operation, "value " + std::to_string(i + 1) + " of " + std::to_string(count) +
-                                          " is a null pointer");
+        return RejectValue(operation,
+                           "value " + std::to_string(i + 1) + " of " + std::to_string(count) + " is a null pointer");
     }
     list.Append(convert(argument));
   }
@@ -41,12 +41,12 @@ inline long GatherTexts(const char* operation, int count, va_list args, VLXListV
 }
 
 // The body of a variadic setter: gathers its count values with gather, then runs set on the list.
-#define VLXKDM_GATHER_THEN(List, gather, operation, set) \
-  List values;                                           \
-  va_list args;                                          \
-  va_start(args, count);                                 \
+#define VLXKDM_GATHER_THEN(List, gather, operation, set)        \
+  List values;                                                  \
+  va_list args;                                                 \
+  va_start(args, count);                                        \
   const long gathered = gather(operation, count, args, values); \
-  va_end(args);                                          \
+  va_end(args);                                                 \
   return gathered < 0 ? gathered : set(values)
 
 }  // namespace corvexa
