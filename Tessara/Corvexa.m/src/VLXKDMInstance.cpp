@@ -392,13 +392,10 @@ T ValueAt(const T* pointer)
   return pointer ? *pointer : T();
 }
 
-// Any non-zero boolean argument is true.
-VLXBoolean Truth(int b) { return static_cast<VLXBoolean>(b != 0); }
-template <class T>
-T Same(T value)
-{
-  return value;
-}
+// The conversions, as lambdas so that the gathering loop inlines them. Any non-zero boolean
+// argument is true.
+constexpr auto kTruth = [](int b) { return static_cast<VLXBoolean>(b != 0); };
+constexpr auto kSame = [](auto value) { return value; };
 
 long GatherBinaries(const char* op, int n, va_list a, VLXListValVLXBinary& l)
 {
@@ -406,21 +403,18 @@ long GatherBinaries(const char* op, int n, va_list a, VLXListValVLXBinary& l)
 }
 long GatherBooleans(const char* op, int n, va_list a, VLXListValVLXBoolean& l)
 {
-  return Gather<int>(op, n, a, l, Truth);
+  return Gather<int>(op, n, a, l, kTruth);
 }
 long GatherDates(const char* op, int n, va_list a, VLXListValVLXTime& l)
 {
   return Gather<const VLXTime*, true>(op, n, a, l, ValueAt<VLXTime>);
 }
-long GatherDoubles(const char* op, int n, va_list a, VLXRawColldouble& l)
-{
-  return Gather<double>(op, n, a, l, Same<double>);
-}
+long GatherDoubles(const char* op, int n, va_list a, VLXRawColldouble& l) { return Gather<double>(op, n, a, l, kSame); }
 long GatherInstances(const char* op, int n, va_list a, VLXListValVLXKDMInstance& l)
 {
   return Gather<const VLXKDMInstance*, true>(op, n, a, l, ValueAt<VLXKDMInstance>);
 }
-long GatherIntegers(const char* op, int n, va_list a, VLXRawCollint& l) { return Gather<int>(op, n, a, l, Same<int>); }
+long GatherIntegers(const char* op, int n, va_list a, VLXRawCollint& l) { return Gather<int>(op, n, a, l, kSame); }
 
 }  // namespace
 
