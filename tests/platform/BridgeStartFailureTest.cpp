@@ -17,7 +17,7 @@ TEST(StartFailure, EveryCallFailsWithTheReasonAndTheEnvironmentNull)
   EXPECT_EQ(e.id, VLXJBXMessages::JvmCreationFailed);
   for (const char* part :
        {"the Java virtual machine could not be created", "-XX:+ThisOptionDoesNotExist", "JNI_CreateJavaVM returned"})
-    EXPECT_NE(why.find(part), std::string::npos) << why;
+    EXPECT_TRUE(Has(why, part)) << why;
 
   // A later call, even with other options, does not try again.
   VLXListValVLXUnicodeString options;
@@ -31,8 +31,7 @@ TEST(StartFailure, EveryCallFailsWithTheReasonAndTheEnvironmentNull)
 TEST(StartFailure, ObjectsWithoutAHandleAndErrorTranslationNeedNoJvm)
 {
   const long base = VLXJBXJNIUtilities::GetGlobalRefCount();
-  VLXJBXJavaObject a;
-  VLXJBXJavaObject b(a);
+  VLXJBXJavaObject a, b(a);
   b = a;
   EXPECT_TRUE(a == b);
   EXPECT_EQ(a.SetGlobalRef(nullptr, nullptr), 0);

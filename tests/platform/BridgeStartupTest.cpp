@@ -1,9 +1,7 @@
-// Start-up: the JVM the bridge created, its options and class path, and the start-up configuration.
+// Start-up: the process's JVM, created once by the test environment through the bridge with an
+// options list of its own, its class path, and the start-up configuration.
 #include "BridgeSupport.h"
 #include "VLXJBXInternal.h"
-
-#include <sys/stat.h>
-#include <unistd.h>
 
 #include <cstdlib>
 #include <filesystem>
@@ -11,6 +9,17 @@
 
 namespace {
 
+class JvmEnvironment : public ::testing::Environment {
+  void SetUp() override
+  {
+    VLXListValVLXUnicodeString options;
+    options.Append("-Dcorvexa.platform.test=from-options");
+    options.Append("");  // empty entries are skipped
+    JNIEnv* env = nullptr;
+    ASSERT_EQ(VLXJBXJNIUtilities::GetJNIEnv(env, options), VLX_S_OK) << TakeLastError().text;
+    ASSERT_NE(env, nullptr);
+  }
+};
 using StartupTest = BridgeTest;
 
 // System.getProperty(name), ASCII only.
@@ -19,10 +28,8 @@ std::string SystemProperty(JNIEnv* env, const char* name)
   jclass system = env->FindClass("java/lang/System");
   jmethodID get = env->GetStaticMethodID(system, "getProperty", "(Ljava/lang/String;)Ljava/lang/String;");
   jstring value = Checked(env, static_cast<jstring>(env->CallStaticObjectMethod(system, get, env->NewStringUTF(name))));
-  std::string out;
-  for (char16_t c : value != nullptr ? Units(env, value) : std::u16string())
-    out += c < 0x80 ? static_cast<char>(c) : '?';
-  return out;
+  const std::u16string units = value != nullptr ? Units(env, value) : std::u16string();
+  return std::string(units.begin(), units.end());
 }
 
 TEST_F(StartupTest, TheProcessJvmWasCreatedOnceWithTheOptionsListAndTheClassPath)
@@ -34,8 +41,7 @@ TEST_F(StartupTest, TheProcessJvmWasCreatedOnceWithTheOptionsListAndTheClassPath
   EXPECT_EQ(classPath.rfind("/nonexistent/first.jar:/nonexistent/second", 0), 0u) << classPath;
   const std::string libraryDirectory = VLXJBXDetail::LibraryDirectory();
   ASSERT_FALSE(libraryDirectory.empty());
-  struct stat st;
-  const bool jarBuilt = stat((libraryDirectory + "/../share/corvexa/corvexa-replica.jar").c_str(), &st) == 0;
+  const bool jarBuilt = std::filesystem::exists(libraryDirectory + "/../share/corvexa/corvexa-replica.jar");
   EXPECT_EQ(classPath.find("corvexa-replica.jar") != std::string::npos, jarBuilt) << classPath;
 
   JNIEnv* again = nullptr;
@@ -67,11 +73,16 @@ TEST(StartupConfig, ClassPathPrefersTheSharedJarAndPutsTheVariableFirst)
       << "installed and build-tree layout first";
   EXPECT_EQ(VLXJBXDetail::BuildClassPath("x", ""), "x") << "unknown library directory";
   std::filesystem::remove_all(root);
-
-  EXPECT_TRUE(VLXJBXDetail::SplitOptions(nullptr).empty());
-  EXPECT_TRUE(VLXJBXDetail::SplitOptions(" \t\n").empty());
+  EXPECT_TRUE(VLXJBXDetail::SplitOptions(nullptr).empty() && VLXJBXDetail::SplitOptions(" \t\n").empty());
   EXPECT_EQ(VLXJBXDetail::SplitOptions("  -Xcheck:jni\t-Xmx64m\n -Dk=v "),
             (std::vector<std::string>{"-Xcheck:jni", "-Xmx64m", "-Dk=v"}));
 }
 
 }  // namespace
+
+int main(int argc, char** argv)
+{
+  ::testing::InitGoogleTest(&argc, argv);
+  ::testing::AddGlobalTestEnvironment(new JvmEnvironment);
+  return RUN_ALL_TESTS();
+}

@@ -1,4 +1,4 @@
-// Shared helpers of the bridge tests. The JVM is created by the test environment in BridgeMain.cpp.
+// Shared helpers of the bridge tests.
 #ifndef BridgeSupport_h
 #define BridgeSupport_h
 
@@ -12,10 +12,8 @@
 #include <string>
 #include <vector>
 
-inline std::string Str(const VLXUnicodeString& s)
-{
-  return std::string(s.c_str(), static_cast<size_t>(s.GetLengthInByte()));
-}
+inline std::string Str(const VLXUnicodeString& s) { return std::string(s.c_str(), size_t(s.GetLengthInByte())); }
+inline bool Has(const std::string& text, const std::string& part) { return text.find(part) != std::string::npos; }
 
 // The calling thread's last error, read and cleaned.
 struct ErrorView {
@@ -23,7 +21,6 @@ struct ErrorView {
   std::string id, text;
   std::vector<std::string> parameters;
 };
-
 inline ErrorView TakeLastError()
 {
   ErrorView view;
@@ -36,20 +33,19 @@ inline ErrorView TakeLastError()
   return view;
 }
 
-// The UTF-16 units of a Java string, read and made without the converters under test.
+// The UTF-16 units of a Java string, and a Java string of UTF-16 units, without the converters.
 inline std::u16string Units(JNIEnv* env, jstring s)
 {
-  std::u16string units(static_cast<size_t>(env->GetStringLength(s)), u'\0');
-  env->GetStringRegion(s, 0, static_cast<jsize>(units.size()), reinterpret_cast<jchar*>(&units[0]));
+  std::u16string units(size_t(env->GetStringLength(s)), u'\0');
+  env->GetStringRegion(s, 0, jsize(units.size()), reinterpret_cast<jchar*>(&units[0]));
   return units;
 }
-
 inline jstring JavaString(JNIEnv* env, const std::u16string& units)
 {
-  return env->NewString(reinterpret_cast<const jchar*>(units.data()), static_cast<jsize>(units.size()));
+  return env->NewString(reinterpret_cast<const jchar*>(units.data()), jsize(units.size()));
 }
 
-// A Java call's result, after the exception check -Xcheck:jni asks for; an exception fails the test.
+// A Java call's result, after the exception check -Xcheck:jni asks for.
 template <class T>
 T Checked(JNIEnv* env, T value)
 {
@@ -61,14 +57,12 @@ T Checked(JNIEnv* env, T value)
 class BridgeTest : public ::testing::Test {
  protected:
   JNIEnv* env = nullptr;
-
   void SetUp() override
   {
     VLXError::VLXCleanLastError();
     ASSERT_EQ(VLXJBXJNIUtilities::GetJNIEnv(env, VLXListValVLXUnicodeString()), VLX_S_OK);
     ASSERT_EQ(env->PushLocalFrame(32), JNI_OK);
   }
-
   void TearDown() override
   {
     if (env != nullptr) {
@@ -78,7 +72,6 @@ class BridgeTest : public ::testing::Test {
     }
     VLXError::VLXCleanLastError();
   }
-
   jclass Find(const char* name)
   {
     jclass c = env->FindClass(name);

@@ -80,61 +80,52 @@ TEST_F(ThreadsTest, EachNativeThreadIsAttachedOnceAsANamedDaemonConvertsAndIsDet
   }
 }
 
-// A thread attached by someone else: its own exit hook (a pthread key made after the bridge's,
-// so it runs after it) finds it still attached, then detaches it.
+// Threads the application attaches and detaches itself. The exit hook of the first (a pthread key
+// made after the bridge's, so it runs after it) records whether it is still attached at exit.
 std::atomic<int> g_stillAttachedAtExit{-1};
 pthread_key_t g_ownerKey;
-
 void OwnerDetach(void* vm)
 {
   void* env = nullptr;
-  g_stillAttachedAtExit = static_cast<JavaVM*>(vm)->GetEnv(&env, JNI_VERSION_1_8) == JNI_OK ? 1 : 0;
+  g_stillAttachedAtExit = static_cast<JavaVM*>(vm)->GetEnv(&env, JNI_VERSION_1_8) == JNI_OK;
   static_cast<JavaVM*>(vm)->DetachCurrentThread();
 }
 
-TEST_F(ThreadsTest, AThreadAttachedBySomeoneElseIsNeverDetachedByTheBridge)
+TEST_F(ThreadsTest, TheApplicationsAttachmentsAreUsedAsTheyAreAndItsDetachesAreNoticed)
 {
   JavaVM* vm = VLXJBXJNIUtilities::GetJavaVM();
   ASSERT_NE(vm, nullptr);
   ASSERT_EQ(pthread_key_create(&g_ownerKey, &OwnerDetach), 0);
-  std::atomic<int> sameEnv{0};
+  std::atomic<int> steps{0};
+  void* own = nullptr;
+  JNIEnv* e = nullptr;
+  auto works = [&] {  // the bridge's environment for the calling thread, used for a real call
+    jstring js = nullptr;
+    const bool ok = VLXJBXJNIUtilities::GetJNIEnv(e, VLXListValVLXUnicodeString()) == VLX_S_OK && e != nullptr &&
+                    VLXJBXJNIConverter::ConvertToJavaType(e, VLXUnicodeString("works \xE2\x9C\x93"), js) == VLX_S_OK &&
+                    e->GetStringLength(js) == 7;
+    if (ok) e->DeleteLocalRef(js);
+    return ok;
+  };
   std::thread([&] {
-    void* own = nullptr;
     if (vm->AttachCurrentThread(&own, nullptr) != JNI_OK) return;
     pthread_setspecific(g_ownerKey, vm);
-    JNIEnv* bridged = nullptr;
-    sameEnv += VLXJBXJNIUtilities::GetJNIEnv(bridged, VLXListValVLXUnicodeString()) == VLX_S_OK && bridged == own;
+    steps += works() && e == own;  // the application's attachment, never detached by the bridge
   }).join();
-  pthread_key_delete(g_ownerKey);
-  EXPECT_EQ(sameEnv, 1) << "the bridge used the existing attachment";
-  EXPECT_EQ(g_stillAttachedAtExit, 1) << "the bridge detached a thread it did not attach";
-}
-
-// The application detaches the thread, first from an attachment of its own, then from the one the
-// bridge made (and cached): each time the bridge attaches it again rather than use a stale environment.
-TEST_F(ThreadsTest, AThreadTheApplicationDetachedIsAttachedAgainByTheBridge)
-{
-  JavaVM* vm = VLXJBXJNIUtilities::GetJavaVM();
-  std::atomic<int> ok{0};
   JavaThread last;
   std::thread([&] {
-    void* own = nullptr;
-    JNIEnv* e = nullptr;
     if (vm->AttachCurrentThread(&own, nullptr) != JNI_OK) return;
-    for (int round = 0; round < 2; ++round) {
-      if (VLXJBXJNIUtilities::GetJNIEnv(e, VLXListValVLXUnicodeString()) != VLX_S_OK) return;
-      vm->DetachCurrentThread();
-      if (VLXJBXJNIUtilities::GetJNIEnv(e, VLXListValVLXUnicodeString()) != VLX_S_OK || e == nullptr) return;
-      jstring js = nullptr;  // a real call through the new environment
-      ok += VLXJBXJNIConverter::ConvertToJavaType(e, VLXUnicodeString("works \xE2\x9C\x93"), js) == VLX_S_OK &&
-            e->GetStringLength(js) == 7;
-      e->DeleteLocalRef(js);
-    }
+    steps += works() && e == own;
+    vm->DetachCurrentThread();
+    steps += works();  // attached by the bridge
+    vm->DetachCurrentThread();
+    steps += works();  // attached again rather than using the stale environment
     last = Current(e);
   }).join();
-  EXPECT_EQ(ok, 2);
+  pthread_key_delete(g_ownerKey);
+  EXPECT_EQ(steps, 4);
+  EXPECT_EQ(g_stillAttachedAtExit, 1) << "the bridge detached a thread it did not attach";
   ASSERT_NE(last.thread, nullptr);
-  EXPECT_EQ(last.name.rfind(kAttached, 0), 0u);
   EXPECT_FALSE(IsAlive(env, last.thread)) << "the bridge's own attachment ended with the thread";
 }
 

@@ -1,4 +1,4 @@
-// Installs a fatal-error handler that records the reports (per thread) and returns, for its scope.
+// Installs, for its scope, a fatal-error handler that records the calling thread's reports and returns.
 #ifndef FatalRecorder_h
 #define FatalRecorder_h
 
@@ -18,7 +18,6 @@ class FatalRecorder {
   ~FatalRecorder() { VLXSetFatalErrorHandler(_previous); }
   FatalRecorder(const FatalRecorder&) = delete;
   FatalRecorder& operator=(const FatalRecorder&) = delete;
-
   static std::vector<FatalReport>& Reports()
   {
     static thread_local std::vector<FatalReport> reports;
