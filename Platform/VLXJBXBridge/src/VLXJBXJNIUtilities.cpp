@@ -282,10 +282,10 @@ long CreateJavaVM(const VLXListValVLXUnicodeString& extraOptions, JavaVM*& vm, J
     if (jar.found.empty()) return StartFailed(jar.problem);
   }
 
-  bool checked = true;
-  for (const std::string& option : userOptions) checked = checked && CannotStopTheJvm(option);
+  bool trusted = true;
+  for (const std::string& option : userOptions) trusted = trusted && CannotStopTheJvm(option);
   std::string refusal;
-  if (!checked && !LauncherAccepts(userOptions, refusal)) return StartFailed(refusal);
+  if (!trusted && !LauncherAccepts(userOptions, refusal)) return StartFailed(refusal);
 
   std::vector<std::string> texts;
   if (!classPath.empty()) texts.push_back("-Djava.class.path=" + classPath);
