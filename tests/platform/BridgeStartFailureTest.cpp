@@ -16,7 +16,7 @@ TEST(StartFailure, EveryCallFailsWithTheReasonAndTheEnvironmentNull)
   const std::string why = e.text;
   EXPECT_EQ(e.id, VLXJBXMessages::JvmCreationFailed);
   for (const char* part :
-       {"the Java virtual machine could not be created", "-XX:+ThisOptionDoesNotExist", "JNI_CreateJavaVM returned"})
+       {"the Java virtual machine could not be created", "-XX:+ThisOptionDoesNotExist", "Unrecognized VM option"})
     EXPECT_TRUE(Has(why, part)) << why;
 
   // A later call, even with other options, does not try again.

@@ -105,9 +105,16 @@ long WithUtf8(JNIEnv* env, jstring text, const char* operation, Use use)
 // The start-up configuration, exposed for tests.
 // The directory of the bridge library ("" if it cannot be found).
 std::string LibraryDirectory();
+// The replica jar: the first of <libraryDirectory>/../share/corvexa/corvexa-replica.jar and
+// <libraryDirectory>/corvexa-replica.jar that is a readable file, else "" and why neither is
+// (the paths searched, those that exist but cannot be read).
+struct ReplicaJarSearch {
+  std::string found;
+  std::string problem;
+};
+ReplicaJarSearch FindReplicaJar(const std::string& libraryDirectory);
 // The class path for `classPathVariable` (VLXJBX_CLASSPATH, may be null) and the library
-// directory: the variable's non-empty entries, then the replica jar when it exists in
-// <libraryDirectory>/../share/corvexa or else in <libraryDirectory>.
+// directory: the variable's non-empty entries, then the replica jar when it is found.
 std::string BuildClassPath(const char* classPathVariable, const std::string& libraryDirectory);
 // The whitespace-separated words of `text` (may be null).
 std::vector<std::string> SplitOptions(const char* text);

@@ -5,15 +5,27 @@
 #include "VLXJBXInternal.h"
 
 #include <dlfcn.h>
+#include <fcntl.h>
+#include <poll.h>
 #include <pthread.h>
+#include <signal.h>
+#include <spawn.h>
 #include <sys/stat.h>
+#include <sys/wait.h>
+#include <time.h>
+#include <unistd.h>
 
 #include <atomic>
 #include <cctype>
+#include <cerrno>
 #include <cstdlib>
+#include <cstring>
 #include <mutex>
 #include <string>
+#include <system_error>
 #include <vector>
+
+extern char** environ;
 
 using VLXJBXDetail::LocalRef;
 using VLXJBXDetail::Raise;
@@ -76,20 +88,208 @@ const char* JniCodeText(jint code)
   }
 }
 
+std::string Joined(const std::vector<std::string>& words)
+{
+  std::string text;
+  for (size_t i = 0; i < words.size(); ++i) text += (i ? " " : "") + words[i];
+  return text;
+}
+
+// Whether the options the application gave can be trusted not to stop the JVM while it starts:
+// HotSpot ends the whole process (exit(1)) for many faulty options, such as a maximum heap below
+// its minimum or two collectors. Only options with no failure at start are trusted: the JNI checks,
+// verbose output and the library's own properties. Properties in general are not (a bad
+// java.system.class.loader or management port ends the process too).
+bool CannotStopTheJvm(const std::string& option)
+{
+  return option == "-Xcheck:jni" || option == "-verbose:gc" || option == "-verbose:class" || option == "-verbose:jni" ||
+         option.rfind("-Dcorvexa.", 0) == 0;
+}
+
+// The java launcher of the JDK whose libjvm the library uses ("" if there is none): bin/java in
+// the first directory above libjvm's that has one (lib/server/libjvm.so in current JDKs,
+// jre/lib/<arch>/server/libjvm.so in older ones).
+std::string JavaLauncher()
+{
+  Dl_info info;
+  if (dladdr(reinterpret_cast<void*>(&JNI_CreateJavaVM), &info) == 0 || info.dli_fname == nullptr) return std::string();
+  std::string directory = info.dli_fname;
+  for (int level = 0; level < 4; ++level) {
+    const size_t slash = directory.rfind('/');
+    if (slash == std::string::npos || slash == 0) break;
+    directory.resize(slash);
+    const std::string java = directory + "/bin/java";
+    if (access(java.c_str(), X_OK) == 0) return java;
+  }
+  return std::string();
+}
+
+// The line of the launcher's output that says what went wrong: the first one that is not one of
+// its general lines, else the first line.
+std::string ReasonLine(const std::string& output)
+{
+  std::string first;
+  size_t start = 0;
+  while (start < output.size()) {
+    size_t end = output.find('\n', start);
+    if (end == std::string::npos) end = output.size();
+    std::string line = output.substr(start, end - start);
+    start = end + 1;
+    if (!line.empty() && line.back() == '\r') line.pop_back();
+    if (line.empty()) continue;
+    if (first.empty()) first = line;
+    if (line != "Error occurred during initialization of VM" &&
+        line.rfind("Error: Could not create the Java", 0) != 0 &&
+        line.rfind("Error: A fatal exception has occurred", 0) != 0 && line.rfind("Picked up ", 0) != 0)
+      return line;
+  }
+  return first.empty() ? "no output" : first;
+}
+
+long long NowMs()
+{
+  timespec now;
+  clock_gettime(CLOCK_MONOTONIC, &now);
+  return static_cast<long long>(now.tv_sec) * 1000 + now.tv_nsec / 1000000;
+}
+
+// The JNI "exit" hook among the options of JNI_CreateJavaVM is no way out: HotSpot does not call
+// it for these failures (tried with JDK 17) and ends the process all the same. Hence a check in a
+// process of its own.
+// Starts `java <options> -version` (no shell, its output captured) and waits for it, at most
+// kLauncherTimeoutMs. Returns false with the reason in `refusal` when the launcher failed with
+// the options; true when it succeeded or nothing could be decided (no launcher, no process, no
+// answer in time, its status taken by someone else): the JVM is then created as before.
+constexpr long long kLauncherTimeoutMs = 20000;
+
+bool LauncherAccepts(const std::vector<std::string>& options, std::string& refusal)
+{
+  const std::string java = JavaLauncher();
+  if (java.empty()) return true;
+  std::vector<char*> argv;
+  argv.push_back(const_cast<char*>(java.c_str()));
+  for (const std::string& option : options) argv.push_back(const_cast<char*>(option.c_str()));
+  argv.push_back(const_cast<char*>("-version"));
+  argv.push_back(nullptr);
+  // JDK_JAVA_OPTIONS is read by the launcher alone, not by a JVM created through JNI.
+  std::vector<char*> envp;
+  for (char** variable = environ; variable != nullptr && *variable != nullptr; ++variable)
+    if (std::strncmp(*variable, "JDK_JAVA_OPTIONS=", 17) != 0) envp.push_back(*variable);
+  envp.push_back(nullptr);
+
+  int fds[2];
+  if (pipe2(fds, O_CLOEXEC) != 0) return true;
+  posix_spawn_file_actions_t actions;
+  posix_spawnattr_t attributes;
+  posix_spawn_file_actions_init(&actions);
+  posix_spawn_file_actions_addopen(&actions, 0, "/dev/null", O_RDONLY, 0);
+  posix_spawn_file_actions_adddup2(&actions, fds[1], 1);  // HotSpot writes its start errors to stdout
+  posix_spawn_file_actions_adddup2(&actions, fds[1], 2);
+  posix_spawnattr_init(&attributes);
+  sigset_t none;
+  sigemptyset(&none);
+  posix_spawnattr_setsigmask(&attributes, &none);
+  posix_spawnattr_setflags(&attributes, POSIX_SPAWN_SETSIGMASK);
+  pid_t pid = -1;
+  const int spawned = posix_spawn(&pid, java.c_str(), &actions, &attributes, argv.data(), envp.data());
+  posix_spawn_file_actions_destroy(&actions);
+  posix_spawnattr_destroy(&attributes);
+  close(fds[1]);
+  if (spawned != 0) {
+    close(fds[0]);
+    return true;
+  }
+
+  // Read its output until it ends (another process may keep the pipe open if it was forked
+  // meanwhile, so the end of the output alone does not say it) or until the deadline.
+  std::string output;
+  // 1: read some, 0: nothing within the time, -1: at the end of the output.
+  auto readSome = [&output, fd = fds[0]](int timeoutMs) {
+    pollfd wait = {fd, POLLIN, 0};
+    const int ready = poll(&wait, 1, timeoutMs);
+    if (ready == 0 || (ready < 0 && errno == EINTR)) return 0;
+    if (ready < 0) return -1;
+    char buffer[4096];
+    const ssize_t got = read(fd, buffer, sizeof buffer);
+    if (got > 0 && output.size() < 65536) output.append(buffer, static_cast<size_t>(got));
+    if (got > 0) return 1;
+    return got < 0 && errno == EINTR ? 0 : -1;
+  };
+  int status = 0;
+  pid_t waited = 0;
+  bool timedOut = false, reading = true;
+  const long long deadline = NowMs() + kLauncherTimeoutMs;
+  for (;;) {
+    if (reading) {
+      const int got = readSome(100);
+      if (got > 0 && NowMs() <= deadline) continue;
+      reading = got >= 0;
+    } else {
+      usleep(10000);
+    }
+    waited = waitpid(pid, &status, WNOHANG);
+    if (waited == pid || (waited < 0 && errno != EINTR)) break;
+    if (NowMs() > deadline) {
+      timedOut = true;
+      kill(pid, SIGKILL);
+      while (waitpid(pid, &status, 0) < 0 && errno == EINTR) {
+      }
+      break;
+    }
+  }
+  while (readSome(0) > 0) {
+  }
+  close(fds[0]);
+  if (timedOut || waited != pid) return true;
+  if (WIFEXITED(status) && WEXITSTATUS(status) == 0) return true;
+  refusal = "the JVM options [" + Joined(options) + "] would end the process while the JVM starts: " + java +
+            " with them and -version " +
+            (WIFEXITED(status) ? "exited with code " + std::to_string(WEXITSTATUS(status))
+                               : "was ended by signal " + std::to_string(WTERMSIG(status))) +
+            " (" + ReasonLine(output) + ")";
+  return false;
+}
+
+long StartFailed(const std::string& why)
+{
+  g_startFailed = true;
+  g_startFailure = why;
+  return VLX_E_FAIL;
+}
+
 // Creates the JVM (the caller holds g_startMutex and saw no JVM). On success the calling thread is
-// attached and *env is its environment.
+// attached and *env is its environment. Faults that would leave a JVM without the replica, or end
+// the process, are found first, and no JVM is created.
 long CreateJavaVM(const VLXListValVLXUnicodeString& extraOptions, JavaVM*& vm, JNIEnv*& env)
 {
-  std::vector<std::string> texts;
-  const std::string classPath =
-      VLXJBXDetail::BuildClassPath(std::getenv("VLXJBX_CLASSPATH"), VLXJBXDetail::LibraryDirectory());
-  if (!classPath.empty()) texts.push_back("-Djava.class.path=" + classPath);
-  for (std::string& word : VLXJBXDetail::SplitOptions(std::getenv("VLXJBX_JVM_OPTIONS")))
-    texts.push_back(std::move(word));
+  vm = nullptr;
+  std::vector<std::string> userOptions = VLXJBXDetail::SplitOptions(std::getenv("VLXJBX_JVM_OPTIONS"));
   for (int i = 1; i <= extraOptions.Size(); ++i)
     if (extraOptions[i].GetLengthInByte() > 0)
-      texts.emplace_back(extraOptions[i].c_str(), static_cast<size_t>(extraOptions[i].GetLengthInByte()));
+      userOptions.emplace_back(extraOptions[i].c_str(), static_cast<size_t>(extraOptions[i].GetLengthInByte()));
 
+  const char* classPathVariable = std::getenv("VLXJBX_CLASSPATH");
+  const std::string libraryDirectory = VLXJBXDetail::LibraryDirectory();
+  const std::string classPath = VLXJBXDetail::BuildClassPath(classPathVariable, libraryDirectory);
+  // Without a class path of the application's own (VLXJBX_CLASSPATH or -Djava.class.path), the
+  // replica classes can come only from the replica jar.
+  bool ownClassPath =
+      classPathVariable != nullptr && std::string(classPathVariable).find_first_not_of(':') != std::string::npos;
+  for (const std::string& option : userOptions)
+    if (option.rfind("-Djava.class.path=", 0) == 0) ownClassPath = true;
+  if (!ownClassPath) {
+    const VLXJBXDetail::ReplicaJarSearch jar = VLXJBXDetail::FindReplicaJar(libraryDirectory);
+    if (jar.found.empty()) return StartFailed(jar.problem);
+  }
+
+  bool trusted = true;
+  for (const std::string& option : userOptions) trusted = trusted && CannotStopTheJvm(option);
+  std::string refusal;
+  if (!trusted && !LauncherAccepts(userOptions, refusal)) return StartFailed(refusal);
+
+  std::vector<std::string> texts;
+  if (!classPath.empty()) texts.push_back("-Djava.class.path=" + classPath);
+  texts.insert(texts.end(), userOptions.begin(), userOptions.end());
   std::vector<JavaVMOption> options(texts.size());
   for (size_t i = 0; i < texts.size(); ++i) {
     options[i].optionString = const_cast<char*>(texts[i].c_str());
@@ -107,13 +307,9 @@ long CreateJavaVM(const VLXListValVLXUnicodeString& extraOptions, JavaVM*& vm, J
     env = static_cast<JNIEnv*>(envOut);
     return VLX_S_OK;
   }
-  std::string why = "JNI_CreateJavaVM returned " + std::to_string(rc) + " (" + JniCodeText(rc) + ") for the options [";
-  for (size_t i = 0; i < texts.size(); ++i) why += (i ? " " : "") + texts[i];
-  why += "]";
-  g_startFailed = true;
-  g_startFailure = why;
   vm = nullptr;
-  return VLX_E_FAIL;
+  return StartFailed("JNI_CreateJavaVM returned " + std::to_string(rc) + " (" + JniCodeText(rc) +
+                     ") for the options [" + Joined(texts) + "]");
 }
 
 long SlowGetJNIEnv(JNIEnv*& env, const VLXListValVLXUnicodeString& options)
@@ -368,13 +564,32 @@ std::string VLXJBXDetail::LibraryDirectory()
   return slash == 0 ? "/" : path.substr(0, slash);
 }
 
-namespace {
-bool IsRegularFile(const std::string& path)
+VLXJBXDetail::ReplicaJarSearch VLXJBXDetail::FindReplicaJar(const std::string& libraryDirectory)
 {
-  struct stat st;
-  return stat(path.c_str(), &st) == 0 && S_ISREG(st.st_mode);
+  ReplicaJarSearch search;
+  if (libraryDirectory.empty()) {
+    search.problem = std::string(kReplicaJar) + " was not found: the directory of the library is unknown";
+    return search;
+  }
+  std::string searched, unreadable;
+  for (const std::string& path :
+       {libraryDirectory + "/../share/corvexa/" + kReplicaJar, libraryDirectory + "/" + kReplicaJar}) {
+    struct stat st;
+    if (stat(path.c_str(), &st) == 0 && S_ISREG(st.st_mode)) {
+      const int fd = open(path.c_str(), O_RDONLY | O_CLOEXEC);
+      if (fd >= 0) {
+        close(fd);
+        search.found = path;
+        return search;
+      }
+      unreadable += "; " + path + " exists but cannot be read (" + std::generic_category().message(errno) + ")";
+    }
+    searched += (searched.empty() ? "" : ", ") + path;
+  }
+  search.problem = std::string(kReplicaJar) + (unreadable.empty() ? " was not found" : " could not be read") +
+                   " (searched " + searched + unreadable + ")";
+  return search;
 }
-}  // namespace
 
 std::string VLXJBXDetail::BuildClassPath(const char* classPathVariable, const std::string& libraryDirectory)
 {
@@ -394,14 +609,7 @@ std::string VLXJBXDetail::BuildClassPath(const char* classPathVariable, const st
       start = end + 1;
     }
   }
-  if (!libraryDirectory.empty()) {
-    const std::string shared = libraryDirectory + "/../share/corvexa/" + kReplicaJar;
-    const std::string beside = libraryDirectory + "/" + kReplicaJar;
-    if (IsRegularFile(shared))
-      add(shared);
-    else if (IsRegularFile(beside))
-      add(beside);
-  }
+  if (!libraryDirectory.empty()) add(FindReplicaJar(libraryDirectory).found);
   return classPath;
 }
 
