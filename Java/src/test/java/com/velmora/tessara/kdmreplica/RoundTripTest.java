@@ -1,24 +1,10 @@
 package com.velmora.tessara.kdmreplica;
 
-import static com.velmora.tessara.kdmreplica.Fx.addAttr;
-import static com.velmora.tessara.kdmreplica.Fx.addClass;
-import static com.velmora.tessara.kdmreplica.Fx.dump;
-import static com.velmora.tessara.kdmreplica.Fx.generate;
-import static com.velmora.tessara.kdmreplica.Fx.throwsWith;
-import static org.junit.jupiter.api.Assertions.assertArrayEquals;
-import static org.junit.jupiter.api.Assertions.assertEquals;
-import static org.junit.jupiter.api.Assertions.assertFalse;
-import static org.junit.jupiter.api.Assertions.assertNull;
-import static org.junit.jupiter.api.Assertions.assertSame;
-import static org.junit.jupiter.api.Assertions.assertThrows;
-import static org.junit.jupiter.api.Assertions.assertTrue;
+import static com.velmora.tessara.kdmreplica.Fx.*;
+import static org.junit.jupiter.api.Assertions.*;
 
 import com.velmora.tessara.kdmreplica.vrattributes.AccessMode;
-import java.util.ArrayList;
-import java.util.Collections;
-import java.util.Date;
-import java.util.List;
-import java.util.Random;
+import java.util.*;
 import java.util.stream.Stream;
 import org.junit.jupiter.api.AfterEach;
 import org.junit.jupiter.api.Test;
@@ -43,13 +29,7 @@ class RoundTripTest {
     }
 
     enum Form {
-        XML(false), XML_STATES(true), XSD_POPULATE(false), XSD_POPULATE_STATES(true), BINARY(true), BINARY_COMPRESSED(true);
-
-        final boolean states;
-
-        Form(boolean states) {
-            this.states = states;
-        }
+        XML, XML_STATES, XSD_POPULATE, XSD_POPULATE_STATES, BINARY, BINARY_COMPRESSED;
 
         boolean binary() {
             return this == BINARY || this == BINARY_COMPRESSED;
@@ -62,10 +42,9 @@ class RoundTripTest {
             }
             Replica.setFeature("indent", this == XML || this == XSD_POPULATE_STATES);
             boolean embedded = this == XML || this == XML_STATES;
-            String xml = r.getXml(embedded, states);
-            String xsd = r.getXsd();
-            Fx.validate(xsd, xml);
-            return embedded ? new Object[] {xml} : new Object[] {xsd, xml};
+            String xml = r.getXml(embedded, this == XML_STATES || this == XSD_POPULATE_STATES);
+            Fx.validate(r.getXsd(), xml);
+            return embedded ? new Object[] {xml} : new Object[] {r.getXsd(), xml};
         }
 
         Replica read(Object[] w, String name) {
@@ -104,28 +83,28 @@ class RoundTripTest {
 
     static Stream<Arguments> edgeValues() {
         double nanPayload = Double.longBitsToDouble(0x7ff0000000000123L);
-        double negativeNan = Double.longBitsToDouble(0xfff8000000000000L);
         long year0 = -62135596800001L; // 0000-12-31T23:59:59.999Z, proleptic
         byte[] allBytes = new byte[256];
         for (int i = 0; i < 256; i++) {
             allBytes[i] = (byte) i;
         }
+        StringBuilder controls = new StringBuilder();
+        for (char c = 0; c < 0x20; c++) {
+            controls.append(c);
+        }
         Object[][] rows = {
             {AttributeType.Integer, new Object[] {0, -1, Integer.MIN_VALUE, Integer.MAX_VALUE},
                 new Object[] {new int[0], new int[] {Integer.MIN_VALUE, 0, Integer.MAX_VALUE}}},
-            {AttributeType.Double, new Object[] {0.0, -0.0, Double.NaN, nanPayload, negativeNan, Double.POSITIVE_INFINITY,
-                Double.NEGATIVE_INFINITY, Double.MIN_VALUE, -Double.MAX_VALUE, 0.1, 1.0 / 3, 1e-310, 123456789012345680.0},
-                new Object[] {new double[0], new double[] {-0.0, Double.NaN, nanPayload, 2.5e-300}}},
-            {AttributeType.String, new Object[] {"", " lead and trail ", "a\r\nb\rc\n", "\t",
-                "\u0000\u0001\u0002\u0003\u0004\u0005\u0006\u0007\b\t\n\u000b\f\r\u000e\u000f"
-                + "\u0010\u0011\u0012\u0013\u0014\u0015\u0016\u0017\u0018\u0019\u001a\u001b\u001c\u001d\u001e\u001f",
-                "\ufffe\uffff", "lone \ud800 high", "lone \udc00 low", "pair \ud83d\ude00", "back\\slash \\u0041",
-                "]]> <&> \"'", "\u0085\u2028 \u007f", "x".repeat(100_000) + "\u0000"},
+            {AttributeType.Double, new Object[] {0.0, -0.0, Double.NaN, nanPayload, Double.longBitsToDouble(0xfff8000000000000L),
+                Double.POSITIVE_INFINITY, Double.NEGATIVE_INFINITY, Double.MIN_VALUE, -Double.MAX_VALUE, 0.1, 1.0 / 3,
+                1e-310, 123456789012345680.0}, new Object[] {new double[0], new double[] {-0.0, Double.NaN, nanPayload, 2.5e-300}}},
+            {AttributeType.String, new Object[] {"", " lead and trail ", "a\r\nb\rc\n", "\t", controls.toString(), "\ufffe\uffff",
+                "lone \ud800 high", "lone \udc00 low", "pair \ud83d\ude00", "back\\slash \\u0041", "]]> <&> \"'",
+                "\u0085\u2028 \u007f", "x".repeat(100_000) + "\u0000"},
                 new Object[] {new String[0], new String[] {""}, new String[] {"a\u0001", "", "\\", "\r"}}},
-            {AttributeType.Date, new Object[] {new Date(0), new Date(-1), new Date(Long.MIN_VALUE),
-                new Date(Long.MAX_VALUE), new Date(year0), new Date(year0 + 1), new Date(-62135596800000L),
-                new Date(253402300800000L), new Date(1700000000123L)},
-                new Object[] {new Date[0], new Date[] {new Date(5), new Date(-5)}}},
+            {AttributeType.Date, new Object[] {new Date(0), new Date(-1), new Date(Long.MIN_VALUE), new Date(Long.MAX_VALUE),
+                new Date(year0), new Date(year0 + 1), new Date(-62135596800000L), new Date(253402300800000L),
+                new Date(1700000000123L)}, new Object[] {new Date[0], new Date[] {new Date(5), new Date(-5)}}},
             {AttributeType.Boolean, new Object[] {true, false},
                 new Object[] {new boolean[0], new boolean[] {true, false, false, true, true, false, true, true, true}}},
             {AttributeType.Binary, new Object[] {new byte[0], new byte[] {-1}, allBytes},
@@ -171,8 +150,7 @@ class RoundTripTest {
         c.setValue("next", a);
         a.setValue("all", new Instance[] {c, a, c, b});
         b.setValue("all", new Instance[0]);
-        for (String id : new String[] {"a\tb", "line\nbreak", "cr\r", "\u0001", "\\u0041", "\ud800", " padded ", "",
-            "&<>\"'"}) {
+        for (String id : new String[] {"a\tb", "line\nbreak", "cr\r", "\u0001", "\\u0041", "\ud800", " padded ", "", "&<>\"'"}) {
             Instance x = node.createInstance();
             x.setID(id);
             x.setValue("s", id);
@@ -194,7 +172,6 @@ class RoundTripTest {
         Replica back = trip(r, f);
         assertEquals(dump(r), dump(back));
         assertEquals(r.getXsd(), back.getXsd());
-        assertEquals("Bolt", back.getModels().getItem(0).getClassDef().getClassName());
     }
 
     /**
@@ -231,8 +208,7 @@ class RoundTripTest {
         assertEquals(dump(r), dump(back));
         assertEquals("Replica 'states' (1 classes, 3 instances, 1 deleted)", back.toString());
         ReplicaCommitException e1 = assertThrows(ReplicaCommitException.class, r::commit);
-        ReplicaCommitException e2 = assertThrows(ReplicaCommitException.class, back::commit);
-        assertEquals(e1.getViolations(), e2.getViolations());
+        assertEquals(e1.getViolations(), assertThrows(ReplicaCommitException.class, back::commit).getViolations());
         for (Replica x : new Replica[] {r, back}) {
             for (int i = 0; i < 2; i++) {
                 x.getModels().getItem(0).getInstances().getItem(i).clearValue("link");
@@ -254,8 +230,8 @@ class RoundTripTest {
         kept.setValue("peer", gone);
         part.getInstances().remove(gone);
         part.createInstance();
-        throwsWith(IllegalArgumentException.class, () -> r.getXml(false), "Part[#0]", "'Part.peer'",
-                "Part[id=\"g\"]", "write with states");
+        throwsWith(IllegalArgumentException.class, () -> r.getXml(false), "Part[#0]", "'Part.peer'", "Part[id=\"g\"]",
+                "write with states");
         kept.clearValue("peer");
         Model pm = Replica.readFromXmlString(r.getXml(true, false)).getModels().getItem("Part");
         assertEquals(2, pm.getInstances().getCount());
@@ -276,9 +252,8 @@ class RoundTripTest {
         AttributeDef label = addAttr(base, "label", AttributeType.String, false);
         addAttr(sub, "owns", AttributeType.Relationship, true).setAggregationType(AggregationType.Composition);
         Instance parent = sub.createInstance();
-        Instance child = base.createInstance();
         parent.setValue("label", "a long label");
-        parent.setValue("owns", new Instance[] {child});
+        parent.setValue("owns", new Instance[] {base.createInstance()});
         int max = f.binary() ? 3 : 12;
         label.length = max; // binary: below the value held (setLength refuses that; documents would not validate)
         label.setAccessMode(AccessMode.Read);
@@ -290,8 +265,7 @@ class RoundTripTest {
         assertSame(read.getAttributeDef("Base.label"), read.getAttributeDef("Sub.label"));
         throwsWith(IllegalStateException.class, () -> p.setValue("label", "ab"), "read-only");
         read.getAttributeDef("Base.label").setAccessMode(AccessMode.ReadWrite);
-        throwsWith(IllegalArgumentException.class, () -> p.setValue("label", "x".repeat(max + 1)),
-                "at most " + max);
+        throwsWith(IllegalArgumentException.class, () -> p.setValue("label", "x".repeat(max + 1)), "at most " + max);
         read.getModels().getItem("Sub").getInstances().remove(p);
         assertEquals(0, read.getModels().getItem("Base").getInstances().getCount(), "composition removes the child");
         assertEquals(1, base.getInstances().getCount(), "the original keeps its own");
@@ -340,19 +314,18 @@ class RoundTripTest {
         x.setID("x");
         x.setValue("to", b.createInstance());
         r.getModels().remove("B");
-        throwsWith(IllegalArgumentException.class, () -> Replica.getBinaryFromReplica(r, false),
-                "A[id=\"x\"]", "'A.to'", "class 'B' is not in the replica");
+        throwsWith(IllegalArgumentException.class, () -> Replica.getBinaryFromReplica(r, false), "A[id=\"x\"]", "'A.to'",
+                "class 'B' is not in the replica");
 
         Replica r2 = new Replica("refs2");
         Model c = addClass(r2, "C", null);
         addAttr(c, "to", AttributeType.Relationship, false);
-        Instance y = c.createInstance();
         Instance z = c.createInstance();
-        y.setValue("to", z);
+        c.createInstance().setValue("to", z);
         c.getInstances().remove(z);
         addAttr(c, "later", AttributeType.Integer, false);
-        throwsWith(IllegalArgumentException.class, () -> Replica.getBinaryFromReplica(r2, true),
-                "'C.to'", "attributes have changed");
+        throwsWith(IllegalArgumentException.class, () -> Replica.getBinaryFromReplica(r2, true), "'C.to'",
+                "attributes have changed");
 
         Replica r3 = new Replica("names");
         addClass(r3, "\u00aaClass", null).createInstance(); // a letter, but not one an XML name may start with
@@ -373,8 +346,7 @@ class RoundTripTest {
         String location = "dir with space/100%/\u00e9t\u00e9.xsd";
         Replica.setSchemaLocation(location);
         String xml = r.getXml(true);
-        assertTrue(xml.contains("xsi:schemaLocation=\"urn:corvexa:replica:1 dir%20with%20space/100%25/\u00e9t\u00e9.xsd\""),
-                xml);
+        assertTrue(xml.contains("xsi:schemaLocation=\"urn:corvexa:replica:1 dir%20with%20space/100%25/\u00e9t\u00e9.xsd\""), xml);
         Replica.setSchemaLocation("elsewhere.xsd");
         assertEquals(location, Replica.readFromXmlString(xml).getSchemaLocation(), "the location read");
         assertEquals("elsewhere.xsd", new Replica("b").getSchemaLocation(), "taken when a replica is created");
@@ -392,26 +364,24 @@ class RoundTripTest {
         List<Throwable> errors = Collections.synchronizedList(new ArrayList<>());
         List<Thread> threads = new ArrayList<>();
         for (int t = 0; t < 4; t++) {
-            long seed = t;
+            int seed = t;
+            boolean compressed = seed == 3;
             threads.add(new Thread(() -> {
                 Random rnd = new Random(seed);
                 for (int i = 0; i < (seed < 2 ? 400 : 25); i++) {
                     try {
                         if (seed >= 2) {
-                            byte[] b = Replica.getBinaryFromReplica(r, seed == 3);
-                            assertArrayEquals(b, Replica.getBinaryFromReplica(Replica.getReplicaFromBinary(b,
-                                    seed == 3), seed == 3));
+                            byte[] b = Replica.getBinaryFromReplica(r, compressed);
+                            assertArrayEquals(b, Replica.getBinaryFromReplica(Replica.getReplicaFromBinary(b, compressed),
+                                    compressed));
                         } else if (rnd.nextBoolean() || m.getInstances().getCount() == 0) {
                             m.createInstance().setID("w" + seed + "-" + i);
                         } else {
                             m.getInstances().remove(rnd.nextInt(m.getInstances().getCount()));
                         }
-                    } catch (IndexOutOfBoundsException e) {
-                        if (seed >= 2) { // a writer may find that the other removed in between
-                            errors.add(e);
-                        }
-                    } catch (IllegalStateException e) {
-                        if (seed >= 2 || !e.getMessage().contains("is deleted")) { // removed before its id was set
+                    } catch (IndexOutOfBoundsException | IllegalStateException e) {
+                        // a changer may find that the other removed in between, or removed before the id was set
+                        if (seed >= 2 || e instanceof IllegalStateException && !e.getMessage().contains("is deleted")) {
                             errors.add(e);
                         }
                     } catch (Throwable e) {
