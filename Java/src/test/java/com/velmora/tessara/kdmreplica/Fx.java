@@ -47,6 +47,30 @@ final class Fx {
         return a;
     }
 
+    /** A replica of a compact schema: "Part: name String, tags String*; Bolt(Part): thread Integer" (* multi-valued). */
+    static Replica replica(String name, String schema) {
+        Replica r = new Replica(name);
+        for (String c : schema.split(";")) {
+            String[] head = c.split(":", 2);
+            String[] n = head[0].trim().split("[()]");
+            Model m = addClass(r, n[0], n.length > 1 ? n[1] : null);
+            for (String a : head.length > 1 && !head[1].isBlank() ? head[1].split(",") : new String[0]) {
+                String[] p = a.trim().split(" ");
+                addAttr(m, p[0], AttributeType.valueOf(p[1].replace("*", "")), p[1].endsWith("*"));
+            }
+        }
+        return r;
+    }
+
+    /** A new instance of the model with the values of the name, value pairs. */
+    static Instance inst(Model m, Object... values) {
+        Instance x = m.createInstance();
+        for (int i = 0; i < values.length; i += 2) {
+            x.setValue((String) values[i], values[i + 1]);
+        }
+        return x;
+    }
+
     private static void contains(String m, String... fragments) {
         for (String f : fragments) {
             assertTrue(m != null && m.contains(f), () -> "message \"" + m + "\" lacks \"" + f + "\"");
