@@ -217,6 +217,8 @@ class BinaryHostileTest {
             row(compressedBuffer(stream, payload.length + 1), true, "inflates to " + payload.length),
             row(compressedBuffer(stream, payload.length), true, "checksum mismatch"),
             row(compressedBuffer(changed(stream, b -> b[2] ^= 0x55), payload.length), true, "compressed stream"),
+            row(compressedBuffer(new byte[] {0x78, (byte) 0xBB, 0, 0, 0, 1, 3, 0}, 10), true, "needs a preset dictionary"),
+            row(compressedBuffer(flushedOnly(payload), payload.length), true, "ends before its end marker"),
             // header and checksum
             Arguments.of("magic", changed(plain, b -> b[0] = 'X'), false, 0, new String[] {"not a binary replica"}),
             row(changed(plain, b -> b[4] = 2), false, "unsupported version 2"),
@@ -296,6 +298,14 @@ class BinaryHostileTest {
             throw new AssertionError(e);
         }
         return bytes.toByteArray();
+    }
+
+    /** The payload deflated and flushed, without the final block that ends the stream. */
+    private static byte[] flushedOnly(byte[] data) {
+        Deflater d = new Deflater(9);
+        d.setInput(data);
+        byte[] out = new byte[data.length * 2 + 64];
+        return Arrays.copyOf(out, d.deflate(out, 0, out.length, Deflater.SYNC_FLUSH));
     }
 
     private static byte[] compressedBuffer(byte[] stream, long declared) {

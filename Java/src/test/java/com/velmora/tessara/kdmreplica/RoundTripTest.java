@@ -116,10 +116,8 @@ class RoundTripTest {
     @ParameterizedTest(name = "{0} {1}")
     @MethodSource("edgeValues")
     void everyValueSurvivesExactly(Form f, AttributeType type, Object[] singles, Object[] arrays) throws Exception {
-        Replica r = new Replica("values of " + type);
-        Model m = addClass(r, "T", null);
-        addAttr(m, "one", type, false);
-        addAttr(m, "many", type, true);
+        Replica r = replica("values of " + type, "T: one " + type + ", many " + type + "*");
+        Model m = r.getModels().getItem(0);
         for (Object v : singles) {
             m.createInstance().setValue("one", v);
         }
@@ -134,12 +132,9 @@ class RoundTripTest {
     @ParameterizedTest
     @EnumSource(Form.class)
     void referencesIdentifiersAndTextsXmlCannotCarry(Form f) throws Exception {
-        Replica r = new Replica("tab\there\r\n\u0000");
-        Model node = addClass(r, "Node", null);
-        addAttr(node, "next", AttributeType.Relationship, false);
-        addAttr(node, "all", AttributeType.Relationship, true);
-        addAttr(node, "s", AttributeType.String, false);
-        Model leaf = addClass(r, "Leaf", "Node");
+        Replica r = replica("tab\there\r\n\u0000", "Node: next Relationship, all Relationship*, s String; Leaf(Node)");
+        Model node = r.getModels().getItem("Node");
+        Model leaf = r.getModels().getItem("Leaf");
         Instance a = node.createInstance(); // no identifier
         Instance b = node.createInstance();
         Instance c = leaf.createInstance();
@@ -151,9 +146,7 @@ class RoundTripTest {
         a.setValue("all", new Instance[] {c, a, c, b});
         b.setValue("all", new Instance[0]);
         for (String id : new String[] {"a\tb", "line\nbreak", "cr\r", "\u0001", "\\u0041", "\ud800", " padded ", "", "&<>\"'"}) {
-            Instance x = node.createInstance();
-            x.setID(id);
-            x.setValue("s", id);
+            inst(node, "s", id).setID(id);
         }
         leaf.createInstance().setID(new byte[0]);
         r.commit();
@@ -182,15 +175,12 @@ class RoundTripTest {
     @ParameterizedTest
     @EnumSource(value = Form.class, names = {"XML_STATES", "XSD_POPULATE_STATES", "BINARY", "BINARY_COMPRESSED"})
     void statesAndDeletedInstancesComeBack(Form f) throws Exception {
-        Replica r = new Replica("states");
-        Model part = addClass(r, "Part", null);
-        addAttr(part, "n", AttributeType.Integer, false);
-        AttributeDef link = addAttr(part, "link", AttributeType.Relationship, false);
+        Replica r = replica("states", "Part: n Integer, link Relationship");
+        Model part = r.getModels().getItem(0);
         Instance kept = part.createInstance();
-        Instance gone = part.createInstance();
+        Instance gone = inst(part, "n", 7);
         Instance changed = part.createInstance();
         gone.setID("p1");
-        gone.setValue("n", 7);
         r.commit();
         changed.setValue("n", 1);
         kept.setValue("link", gone);
@@ -198,11 +188,10 @@ class RoundTripTest {
         part.createInstance().setID("p1"); // the deleted instance's identifier is free again
         part.getInstances().remove(part.createInstance()); // created then removed: forgotten
         if (f.binary()) { // only the binary form carries these
-            Instance ghost = part.createInstance(); // created, referred to, removed before any commit
-            ghost.setValue("n", 99);
+            Instance ghost = inst(part, "n", 99); // created, referred to, removed before any commit
             changed.setValue("link", ghost);
             part.getInstances().remove(ghost);
-            link.targetNames = new String[] {"Elsewhere"}; // values held no longer fit (the setter refuses that)
+            r.getAttributeDef("link").targetNames = new String[] {"Elsewhere"}; // values held no longer fit (the setter refuses that)
         }
         Replica back = trip(r, f);
         assertEquals(dump(r), dump(back));
@@ -220,9 +209,8 @@ class RoundTripTest {
 
     @Test
     void withoutStatesPendingChangesAreWrittenAsCommittedAndDeletedTargetsAreRefused() {
-        Replica r = new Replica("states");
-        Model part = addClass(r, "Part", null);
-        addAttr(part, "peer", AttributeType.Relationship, false);
+        Replica r = replica("states", "Part: peer Relationship");
+        Model part = r.getModels().getItem(0);
         Instance kept = part.createInstance();
         Instance gone = part.createInstance();
         gone.setID("g");
@@ -246,14 +234,11 @@ class RoundTripTest {
     @ParameterizedTest
     @EnumSource(Form.class)
     void schemaPropertiesComeBackInForce(Form f) throws Exception {
-        Replica r = new Replica("schema");
-        Model base = addClass(r, "Base", null);
-        Model sub = addClass(r, "Sub", "Base");
-        AttributeDef label = addAttr(base, "label", AttributeType.String, false);
-        addAttr(sub, "owns", AttributeType.Relationship, true).setAggregationType(AggregationType.Composition);
-        Instance parent = sub.createInstance();
-        parent.setValue("label", "a long label");
-        parent.setValue("owns", new Instance[] {base.createInstance()});
+        Replica r = replica("schema", "Base: label String; Sub(Base): owns Relationship*");
+        Model base = r.getModels().getItem("Base");
+        AttributeDef label = r.getAttributeDef("label");
+        r.getAttributeDef("owns").setAggregationType(AggregationType.Composition);
+        inst(r.getModels().getItem("Sub"), "label", "a long label", "owns", new Instance[] {base.createInstance()});
         int max = f.binary() ? 3 : 12;
         label.length = max; // binary: below the value held (setLength refuses that; documents would not validate)
         label.setAccessMode(AccessMode.Read);
@@ -306,22 +291,16 @@ class RoundTripTest {
 
     @Test
     void referencesAndNamesTheFormsCannotCarryAreRefusedByName() {
-        Replica r = new Replica("refs");
-        Model a = addClass(r, "A", null);
-        Model b = addClass(r, "B", null);
-        addAttr(a, "to", AttributeType.Relationship, false);
-        Instance x = a.createInstance();
-        x.setID("x");
-        x.setValue("to", b.createInstance());
+        Replica r = replica("refs", "A: to Relationship; B");
+        inst(r.getModels().getItem("A"), "to", r.getModels().getItem("B").createInstance()).setID("x");
         r.getModels().remove("B");
         throwsWith(IllegalArgumentException.class, () -> Replica.getBinaryFromReplica(r, false), "A[id=\"x\"]", "'A.to'",
                 "class 'B' is not in the replica");
 
-        Replica r2 = new Replica("refs2");
-        Model c = addClass(r2, "C", null);
-        addAttr(c, "to", AttributeType.Relationship, false);
+        Replica r2 = replica("refs2", "C: to Relationship");
+        Model c = r2.getModels().getItem(0);
         Instance z = c.createInstance();
-        c.createInstance().setValue("to", z);
+        inst(c, "to", z);
         c.getInstances().remove(z);
         addAttr(c, "later", AttributeType.Integer, false);
         throwsWith(IllegalArgumentException.class, () -> Replica.getBinaryFromReplica(r2, true), "'C.to'",
@@ -340,8 +319,7 @@ class RoundTripTest {
 
     @Test
     void theProcessWideSchemaLocationIsWrittenAndRemembered() {
-        Replica r = new Replica("loc");
-        addAttr(addClass(r, "A", null), "v", AttributeType.Integer, false);
+        Replica r = replica("loc", "A: v Integer");
         assertFalse(r.getXml(true).contains("schemaLocation"));
         String location = "dir with space/100%/\u00e9t\u00e9.xsd";
         Replica.setSchemaLocation(location);
