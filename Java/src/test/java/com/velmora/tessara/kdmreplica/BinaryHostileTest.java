@@ -199,6 +199,8 @@ class BinaryHostileTest {
                     "count of instances outside the replica is 2147483647"),
             row(oneValue(DOUBLE | MULTI, x -> w(uv(x, 2), 0, 0, 0, 0, 0, 0, 0, 0, 0)), false, "Double array length is 2"),
             row(oneValue(BINARY, x -> x.uvar(MAX)), false, "Binary value announces 2147483647 bytes"),
+            row(oneValue(BINARY, x -> w(x, 3, 1, 2)), false, "Binary value announces 3 bytes, 2 remain"),
+            row(oneValue(STRING, x -> w(x, 6, 65, 66)), false, "String value announces 3 bytes, 2 remain"),
             row(oneValue(STRING, x -> x.uvar(MAX << 1 | 1)), false, "String value announces 2147483647"),
             row(oneValue(REL, x -> x.uvar(MAX)), false, "target is 2147483647, outside the 1 instances"),
             row(oneValue(INT, x -> w(x, 0xFF, 0xFF, 0xFF, 0xFF, 0x7F)), false, "malformed number in an Integer value"),

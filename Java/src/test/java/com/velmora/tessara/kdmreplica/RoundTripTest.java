@@ -5,6 +5,7 @@ import static org.junit.jupiter.api.Assertions.*;
 
 import com.velmora.tessara.kdmreplica.vrattributes.AccessMode;
 import java.util.*;
+import java.util.concurrent.CountDownLatch;
 import java.util.stream.Stream;
 import org.junit.jupiter.api.AfterEach;
 import org.junit.jupiter.api.Test;
@@ -340,13 +341,14 @@ class RoundTripTest {
         Replica r = generate(11, 40);
         Model m = r.getModels().getItem(0);
         List<Throwable> errors = Collections.synchronizedList(new ArrayList<>());
+        CountDownLatch snapshots = new CountDownLatch(2);
         List<Thread> threads = new ArrayList<>();
         for (int t = 0; t < 4; t++) {
             int seed = t;
             boolean compressed = seed == 3;
             threads.add(new Thread(() -> {
                 Random rnd = new Random(seed);
-                for (int i = 0; i < (seed < 2 ? 400 : 25); i++) {
+                for (int i = 0; seed < 2 ? snapshots.getCount() > 0 : i < 100; i++) {
                     try {
                         if (seed >= 2) {
                             byte[] b = Replica.getBinaryFromReplica(r, compressed);
@@ -366,6 +368,9 @@ class RoundTripTest {
                         errors.add(e);
                     }
                 }
+                if (seed >= 2) {
+                    snapshots.countDown();
+                }
             }));
         }
         for (Thread t : threads) {
@@ -374,7 +379,7 @@ class RoundTripTest {
         for (Thread t : threads) {
             t.join();
         }
-        assertTrue(errors.isEmpty(), () -> "errors: " + errors);
+        assertTrue(errors.isEmpty(), () -> errors.size() + " errors: " + errors.subList(0, Math.min(3, errors.size())));
         same(r, Form.BINARY);
     }
 }

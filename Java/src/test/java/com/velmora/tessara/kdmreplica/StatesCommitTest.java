@@ -42,6 +42,7 @@ class StatesCommitTest {
         p.setID("ann");
         assertEquals("M,", states(p));
         r.commit();
+        assertEquals(",", states(p));
         p.clearValue("name");
         assertEquals("M,", states(p));
         person.getInstances().remove(p);
