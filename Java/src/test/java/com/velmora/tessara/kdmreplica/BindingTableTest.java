@@ -1,10 +1,6 @@
 package com.velmora.tessara.kdmreplica;
 
-import static org.junit.jupiter.api.Assertions.assertEquals;
-import static org.junit.jupiter.api.Assertions.assertFalse;
-import static org.junit.jupiter.api.Assertions.assertNotNull;
-import static org.junit.jupiter.api.Assertions.assertSame;
-import static org.junit.jupiter.api.Assertions.assertTrue;
+import static org.junit.jupiter.api.Assertions.*;
 
 import java.lang.reflect.Executable;
 import java.lang.reflect.Field;
@@ -12,11 +8,7 @@ import java.lang.reflect.Method;
 import java.lang.reflect.Modifier;
 import java.nio.file.Files;
 import java.nio.file.Paths;
-import java.util.ArrayList;
-import java.util.Arrays;
-import java.util.HashMap;
-import java.util.List;
-import java.util.Map;
+import java.util.*;
 import java.util.regex.Matcher;
 import java.util.regex.Pattern;
 import java.util.stream.Stream;
@@ -56,15 +48,11 @@ class BindingTableTest {
                 macros.put(d.group(1), d.group(2));
             } else if (r.matches()) {
                 String[] args = r.group(2).split(",(?=(?:[^\"]*\"[^\"]*\")*[^\"]*$)");
-                String[] row = new String[5];
-                row[0] = r.group(1);
-                row[2] = args[0].trim();
+                String[] row = {r.group(1), owner, args[0].trim(), null, null};
                 for (int i = 1; i < args.length; i++) {
                     row[i + 2] = concat(args[i], macros, line);
                 }
-                if (row[0].equals("CLASS")) {
-                    owner = row[3];
-                }
+                owner = row[0].equals("CLASS") ? row[3] : owner;
                 row[1] = owner;
                 rows.add(row);
             } else {
@@ -88,10 +76,6 @@ class BindingTableTest {
         return b.toString();
     }
 
-    static Stream<String[]> tableRows() throws Exception {
-        return rows().stream();
-    }
-
     @Test
     void theTableHasRowsOfEveryKind() throws Exception {
         List<String[]> rows = rows();
@@ -106,8 +90,8 @@ class BindingTableTest {
             return c.getName().replace('.', '/');
         }
         if (c.isPrimitive()) {
-            return String.valueOf("ZBCSIJFDV".charAt(Arrays.asList(boolean.class, byte.class, char.class, short.class,
-                    int.class, long.class, float.class, double.class, void.class).indexOf(c)));
+            return String.valueOf("ZBCSIJFDV".charAt(List.of(boolean.class, byte.class, char.class, short.class, int.class,
+                    long.class, float.class, double.class, void.class).indexOf(c)));
         }
         return "L" + c.getName().replace('.', '/') + ";";
     }
@@ -121,7 +105,7 @@ class BindingTableTest {
     }
 
     @ParameterizedTest(name = "{0} {2}")
-    @MethodSource("tableRows")
+    @MethodSource("rows")
     void everyRowResolves(String kind, String owner, String slot, String member, String sig) throws Exception {
         if (kind.equals("RESERVED")) {
             assertTrue(slot.matches("\\w+"), slot);

@@ -1,46 +1,35 @@
 package com.velmora.tessara.kdmreplica;
 
-import static org.junit.jupiter.api.Assertions.assertEquals;
-import static org.junit.jupiter.api.Assertions.assertThrows;
-import static org.junit.jupiter.api.Assertions.assertTrue;
-import static org.junit.jupiter.api.Assertions.fail;
+import static org.junit.jupiter.api.Assertions.*;
 
 import com.velmora.tessara.kdmreplica.vrattributes.AccessMode;
 import com.velmora.tessara.kdmreplica.vrattributes.Visibility;
 import java.io.IOException;
 import java.io.StringReader;
 import java.lang.management.ManagementFactory;
+import java.lang.reflect.Array;
 import java.net.InetAddress;
 import java.net.ServerSocket;
 import java.net.Socket;
-import java.net.SocketException;
-import java.util.ArrayList;
-import java.util.Arrays;
-import java.util.Date;
-import java.util.IdentityHashMap;
-import java.util.List;
-import java.util.Random;
+import java.nio.charset.StandardCharsets;
+import java.util.*;
 import java.util.concurrent.atomic.AtomicInteger;
 import javax.xml.XMLConstants;
 import javax.xml.transform.stream.StreamSource;
-import javax.xml.validation.Schema;
 import javax.xml.validation.SchemaFactory;
 import javax.xml.validation.Validator;
 import org.junit.jupiter.api.function.Executable;
-import org.xml.sax.SAXException;
 
 /**
- * Helpers of the tests: builders; one canonical dump of a replica (schema, data and states,
- * through public members and the deleted lists, independent of every codec); a replica with every
- * schema property away from its default; a seeded generator of replicas that use every type,
- * property and state; refusal checks for documents and binary forms; a local listener that counts
- * connections.
+ * Helpers of the tests: builders; one canonical dump of a replica (schema, data and states, through
+ * public members and the deleted lists, independent of every codec); a replica with every schema
+ * property away from its default; a seeded generator of replicas that use every type, property and
+ * state; refusal checks; a local listener that counts connections.
  */
 final class Fx {
     private Fx() {
     }
 
-    /** Adds a class (with an optional super name) and its model to the replica. */
     static Model addClass(Replica r, String name, String superName) {
         ClassDef c = new ClassDef(name);
         if (superName != null) {
@@ -58,65 +47,84 @@ final class Fx {
         return a;
     }
 
+    /** A replica of a compact schema: "Part: name String, tags String*; Bolt(Part): thread Integer" (* multi-valued). */
+    static Replica replica(String name, String schema) {
+        Replica r = new Replica(name);
+        for (String c : schema.split(";")) {
+            String[] head = c.split(":", 2);
+            String[] n = head[0].trim().split("[()]");
+            Model m = addClass(r, n[0], n.length > 1 ? n[1] : null);
+            for (String a : head.length > 1 && !head[1].isBlank() ? head[1].split(",") : new String[0]) {
+                String[] p = a.trim().split(" ");
+                addAttr(m, p[0], AttributeType.valueOf(p[1].replace("*", "")), p[1].endsWith("*"));
+            }
+        }
+        return r;
+    }
+
+    /** A new instance of the model with the values of the name, value pairs. */
+    static Instance inst(Model m, Object... values) {
+        Instance x = m.createInstance();
+        for (int i = 0; i < values.length; i += 2) {
+            x.setValue((String) values[i], values[i + 1]);
+        }
+        return x;
+    }
+
+    private static void contains(String m, String... fragments) {
+        for (String f : fragments) {
+            assertTrue(m != null && m.contains(f), () -> "message \"" + m + "\" lacks \"" + f + "\"");
+        }
+    }
+
     /** Asserts that the call throws {@code type} and that the message contains every fragment. */
     static <T extends Throwable> T throwsWith(Class<T> type, Executable call, String... fragments) {
         T e = assertThrows(type, call);
-        for (String f : fragments) {
-            assertTrue(e.getMessage() != null && e.getMessage().contains(f),
-                    () -> "message \"" + e.getMessage() + "\" lacks \"" + f + "\"");
-        }
+        contains(e.getMessage(), fragments);
         return e;
+    }
+
+    /** Runs rows of {exception class, call, message fragments...}. */
+    static void refusals(Object[][] rows) {
+        for (Object[] row : rows) {
+            throwsWith(((Class<?>) row[0]).asSubclass(Throwable.class), (Executable) row[1],
+                    Arrays.copyOfRange(row, 2, row.length, String[].class));
+        }
     }
 
     /** Everything a replica holds, through public members (and the deleted lists), as text. */
     static String dump(Replica r) {
         StringBuilder b = new StringBuilder();
-        b.append("replica ").append(esc(r.getName())).append(" location ").append(esc(r.getSchemaLocation()))
-                .append('\n');
+        fields(b, "replica", r.getName(), r.getSchemaLocation());
         IdentityHashMap<Instance, String> names = new IdentityHashMap<>();
         ModelSet ms = r.getModels();
         for (int i = 0; i < ms.getCount(); i++) {
             Model m = ms.getItem(i);
-            InstanceSet s = m.getInstances();
-            for (int k = 0; k < s.getCount(); k++) {
-                names.put(s.getItem(k), m.getClassDef().getClassName() + "#" + k);
+            for (int k = 0; k < m.getInstances().getCount(); k++) {
+                names.put(m.getInstances().getItem(k), m.getClassDef().getClassName() + "#" + k);
             }
-            if (m.deleted != null) {
-                for (int k = 0; k < m.deleted.size(); k++) {
-                    names.put(m.deleted.get(k), m.getClassDef().getClassName() + "~" + k);
-                }
+            for (int k = 0; m.deleted != null && k < m.deleted.size(); k++) {
+                names.put(m.deleted.get(k), m.getClassDef().getClassName() + "~" + k);
             }
         }
         List<Instance> outside = new ArrayList<>();
         for (int i = 0; i < ms.getCount(); i++) {
             Model m = ms.getItem(i);
             ClassDef c = m.getClassDef();
-            b.append("class ").append(esc(c.getClassName())).append(" super ").append(esc(c.getSuperName()))
-                    .append(" uuid ").append(esc(c.getUuid())).append(" comment ").append(esc(c.getQKAComment()))
-                    .append(" deriv ").append(esc(c.getQKADerivability())).append(" scopes ")
-                    .append(escAll(c.getScopeNames())).append(' ').append(c.isExtensible()).append(' ')
-                    .append(c.isAbstract()).append(' ').append(c.isPersistent()).append(' ')
-                    .append(c.getSoftwareVisibility()).append(' ').append(c.getClassType()).append('\n');
-            AttributeDefList al = c.getAttributes();
-            for (int k = 0; k < al.getCount(); k++) {
-                AttributeDef a = al.getItem(k);
-                b.append("  attr ").append(esc(a.getAttributeName())).append(' ').append(a.getAttributeType())
-                        .append(' ').append(a.isMultiValuated()).append(' ').append(a.getLength()).append(' ')
-                        .append(a.isMandatory()).append(' ').append(a.isUnique()).append(' ')
-                        .append(a.getAccessMode()).append(' ').append(a.getSoftwareVisibility()).append(' ')
-                        .append(a.getAggregationType()).append(" uuid ").append(esc(a.getUuid()))
-                        .append(" comment ").append(esc(a.getQKAComment())).append(" targets ")
-                        .append(escAll(a.getTargetNames())).append(" refs ").append(escAll(a.getTargetRefs()))
-                        .append('\n');
+            fields(b, "class", c.getClassName(), c.getSuperName(), c.getUuid(), c.getQKAComment(),
+                    c.getQKADerivability(), c.getScopeNames(), c.isExtensible(), c.isAbstract(), c.isPersistent(),
+                    c.getSoftwareVisibility(), c.getClassType());
+            for (int k = 0; k < c.getAttributes().getCount(); k++) {
+                AttributeDef a = c.getAttributes().getItem(k);
+                fields(b, " attr", a.getAttributeName(), a.getAttributeType(), a.isMultiValuated(), a.getLength(),
+                        a.isMandatory(), a.isUnique(), a.getAccessMode(), a.getSoftwareVisibility(),
+                        a.getAggregationType(), a.getUuid(), a.getQKAComment(), a.getTargetNames(), a.getTargetRefs());
             }
-            InstanceSet s = m.getInstances();
-            for (int k = 0; k < s.getCount(); k++) {
-                instance(b, s.getItem(k), names, outside);
+            for (int k = 0; k < m.getInstances().getCount(); k++) {
+                instance(b, m.getInstances().getItem(k), names, outside);
             }
-            if (m.deleted != null) {
-                for (Instance x : m.deleted) {
-                    instance(b, x, names, outside);
-                }
+            for (int k = 0; m.deleted != null && k < m.deleted.size(); k++) {
+                instance(b, m.deleted.get(k), names, outside);
             }
         }
         for (int i = 0; i < outside.size(); i++) {
@@ -125,14 +133,21 @@ final class Fx {
         return b.toString();
     }
 
+    private static void fields(StringBuilder b, String head, Object... values) {
+        b.append(head);
+        for (Object v : values) {
+            value(b.append(' '), v, null, null);
+        }
+        b.append('\n');
+    }
+
     private static void instance(StringBuilder b, Instance x, IdentityHashMap<Instance, String> names,
             List<Instance> outside) {
         b.append("  ").append(names.get(x)).append(x.isCreated() ? " C" : "").append(x.isModified() ? " M" : "")
                 .append(x.isDeleted() ? " D" : "").append(" id ");
         value(b, x.getID(), names, outside);
         for (int p = 0; p < x.values.length; p++) {
-            b.append(" | ");
-            value(b, x.getValue(p), names, outside);
+            value(b.append(" | "), x.getValue(p), names, outside);
         }
         b.append('\n');
     }
@@ -148,10 +163,7 @@ final class Fx {
         } else if (v instanceof Date) {
             b.append("t").append(((Date) v).getTime());
         } else if (v instanceof byte[]) {
-            b.append("x");
-            for (byte x : (byte[]) v) {
-                b.append(String.format("%02x", x));
-            }
+            b.append("x").append(HexFormat.of().formatHex((byte[]) v));
         } else if (v instanceof Instance) {
             Instance t = (Instance) v;
             if (!names.containsKey(t)) {
@@ -161,8 +173,8 @@ final class Fx {
             b.append(names.get(t));
         } else if (v.getClass().isArray()) {
             b.append('[');
-            for (int i = 0; i < java.lang.reflect.Array.getLength(v); i++) {
-                value(b, java.lang.reflect.Array.get(v, i), names, outside);
+            for (int i = 0; i < Array.getLength(v); i++) {
+                value(b, Array.get(v, i), names, outside);
                 b.append(',');
             }
             b.append(']');
@@ -177,12 +189,6 @@ final class Fx {
             b.append(c >= 0x20 && c < 0x7F && c != '"' && c != '\\' ? String.valueOf(c) : String.format("\\u%04x", (int) c));
         }
         return b.append('"').toString();
-    }
-
-    private static String escAll(String[] a) {
-        StringBuilder b = new StringBuilder();
-        value(b, a, null, null);
-        return b.toString();
     }
 
     /**
@@ -219,10 +225,8 @@ final class Fx {
         s.setTargetRefs(new String[] {"ref1", "\uffff"});
         s.setAggregationType(AggregationType.Composition);
         s.setAccessMode(AccessMode.Write);
-        AttributeDef blob = addAttr(part, "blob", AttributeType.Binary, true);
-        blob.setLength(4);
-        AttributeDef neg = addAttr(bolt, "thread", AttributeType.Integer, false);
-        neg.setLength(-3);
+        addAttr(part, "blob", AttributeType.Binary, true).setLength(4);
+        addAttr(bolt, "thread", AttributeType.Integer, false).setLength(-3);
         addAttr(bolt, "grade", AttributeType.Double, true).setLength(7);
         addAttr(sup, "name", AttributeType.String, false);
         addAttr(sup, "since", AttributeType.Date, false);
@@ -247,21 +251,20 @@ final class Fx {
         return r;
     }
 
-    static final AttributeType[] TYPES = AttributeType.values();
-
     private static final String[] TEXTS = {"", "plain", "ünïcödé", "\u0000nul", "tab\tcr\r", "\uD83D\uDE00 pair",
         "lone \uD800 high", "lone \uDC00 low", "end \uD800", "\uFFFD replacement", "<&>\"'"};
+    private static final double[] DOUBLES = {0.0, -0.0, Double.NaN, Double.longBitsToDouble(0x7ff8000000000123L),
+        Double.POSITIVE_INFINITY, Double.NEGATIVE_INFINITY, Double.MIN_VALUE, Double.MAX_VALUE, 1.5, -1e-300};
+    private static final int[] INTS = {0, 1, -1, 63, 64, -64, -65, Integer.MAX_VALUE, Integer.MIN_VALUE};
+    private static final long[] MILLIS = {0, 1, -1, Long.MAX_VALUE, Long.MIN_VALUE, 1700000000123L, -62135596800000L};
+    private static final Class<?>[] ELEMENTS = {int.class, double.class, String.class, Date.class, boolean.class,
+        byte[].class, Instance.class};
 
     static String text(Random rnd) {
         return rnd.nextInt(3) == 0 ? "t" + rnd.nextInt(1000) : TEXTS[rnd.nextInt(TEXTS.length)];
     }
 
-    private static final double[] DOUBLES = {0.0, -0.0, Double.NaN, Double.longBitsToDouble(0x7ff8000000000123L),
-        Double.POSITIVE_INFINITY, Double.NEGATIVE_INFINITY, Double.MIN_VALUE, Double.MAX_VALUE, 1.5, -1e-300};
-    private static final int[] INTS = {0, 1, -1, 63, 64, -64, -65, Integer.MAX_VALUE, Integer.MIN_VALUE};
-    private static final long[] MILLIS = {0, 1, -1, Long.MAX_VALUE, Long.MIN_VALUE, 1700000000123L, -62135596800000L};
-
-    static Object scalar(AttributeType t, Random rnd, List<Instance> live) {
+    private static Object scalar(AttributeType t, Random rnd, List<Instance> live) {
         switch (t) {
             case Integer:
                 return rnd.nextBoolean() ? INTS[rnd.nextInt(INTS.length)] : rnd.nextInt();
@@ -273,20 +276,16 @@ final class Fx {
                 return new Date(rnd.nextBoolean() ? MILLIS[rnd.nextInt(MILLIS.length)] : rnd.nextLong());
             case Boolean:
                 return rnd.nextBoolean();
-            case Binary: {
+            case Binary:
                 byte[] b = new byte[rnd.nextInt(4) == 0 ? 0 : rnd.nextInt(40)];
                 rnd.nextBytes(b);
                 return b;
-            }
             default:
                 return live.get(rnd.nextInt(live.size()));
         }
     }
 
-    private static final Class<?>[] ELEMENTS = {int.class, double.class, String.class, Date.class, boolean.class,
-        byte[].class, Instance.class};
-
-    static Object value(AttributeDef a, Random rnd, List<Instance> live) {
+    private static Object value(AttributeDef a, Random rnd, List<Instance> live) {
         AttributeType t = a.getAttributeType();
         if (t == AttributeType.Relationship && live.isEmpty()) {
             return null;
@@ -294,10 +293,9 @@ final class Fx {
         if (!a.isMultiValuated()) {
             return scalar(t, rnd, live);
         }
-        int n = rnd.nextInt(4) == 0 ? 0 : rnd.nextInt(13);
-        Object v = java.lang.reflect.Array.newInstance(ELEMENTS[t.ordinal()], n);
-        for (int i = 0; i < n; i++) {
-            java.lang.reflect.Array.set(v, i, scalar(t, rnd, live));
+        Object v = Array.newInstance(ELEMENTS[t.ordinal()], rnd.nextInt(4) == 0 ? 0 : rnd.nextInt(13));
+        for (int i = 0; i < Array.getLength(v); i++) {
+            Array.set(v, i, scalar(t, rnd, live));
         }
         return v;
     }
@@ -308,9 +306,7 @@ final class Fx {
 
     private static String[] texts(Random rnd) {
         String[] s = new String[rnd.nextInt(3)];
-        for (int i = 0; i < s.length; i++) {
-            s[i] = text(rnd);
-        }
+        Arrays.setAll(s, i -> text(rnd));
         return s;
     }
 
@@ -325,9 +321,8 @@ final class Fx {
         Random rnd = new Random(seed);
         Replica r = new Replica("gen " + seed + " " + text(rnd));
         r.schemaLocation = rnd.nextBoolean() ? "" : "file:schemas/" + text(rnd) + ".xsd";
-        int nClasses = 1 + rnd.nextInt(5);
         List<Model> models = new ArrayList<>();
-        for (int i = 0; i < nClasses; i++) {
+        for (int i = 0, n = 1 + rnd.nextInt(5); i < n; i++) {
             ClassDef c = new ClassDef(i == 2 ? "Größe" : "C" + i);
             if (i > 0 && rnd.nextInt(3) == 0) {
                 c.setSuperName(models.get(rnd.nextInt(i)).getClassDef().getClassName());
@@ -340,9 +335,8 @@ final class Fx {
             c.setPersistency(rnd.nextBoolean());
             c.setSoftwareVisibility(pick(rnd, Visibility.values()));
             c.setClassType(pick(rnd, ClassType.values()));
-            int na = rnd.nextInt(7);
-            for (int k = 0; k < na; k++) {
-                AttributeDef a = new AttributeDef("a" + i + "_" + k, pick(rnd, TYPES));
+            for (int k = 0, na = rnd.nextInt(7); k < na; k++) {
+                AttributeDef a = new AttributeDef("a" + i + "_" + k, pick(rnd, AttributeType.values()));
                 a.setMultiValuation(rnd.nextBoolean());
                 a.setUuid(text(rnd));
                 a.setQKAComment(text(rnd));
@@ -360,25 +354,20 @@ final class Fx {
         int[] ids = {0};
         for (Model m : models) {
             for (int j = 0; j < instancesPerClass; j++) {
-                Instance x = m.createInstance();
-                setId(x, rnd, ids);
-                live.add(x);
+                live.add(setId(m.createInstance(), rnd, ids));
             }
         }
         for (Instance x : live) {
             fill(x, rnd, live);
         }
         r.commit();
-        // Pending changes: modifications, new instances, removals (with composition), references
-        // to removed instances, an instance removed before any commit but still referred to.
+        // Pending changes: modifications, new instances, removals (with composition).
         for (Instance x : new ArrayList<>(live)) {
             int what = rnd.nextInt(6);
             if (what == 0 && !x.isDeleted()) {
                 fill(x, rnd, live);
             } else if (what == 1) {
-                Model m = models.get(rnd.nextInt(models.size()));
-                Instance y = m.createInstance();
-                setId(y, rnd, ids);
+                Instance y = setId(models.get(rnd.nextInt(models.size())).createInstance(), rnd, ids);
                 fill(y, rnd, live);
                 live.add(y);
             }
@@ -386,14 +375,17 @@ final class Fx {
         for (int k = 0; k < 1 + instancesPerClass / 3 && !live.isEmpty(); k++) {
             Instance x = live.get(rnd.nextInt(live.size()));
             if (!x.isDeleted()) {
-                Model m = findModel(r, x);
-                m.getInstances().remove(x);
+                r.getModels().getItem(x.getClassDef().getClassName()).getInstances().remove(x);
             }
         }
         live.removeIf(Instance::isDeleted);
         // A reference to an instance that disappears (created, then removed before a commit).
         for (Model m : models) {
-            AttributeDef ref = firstSingleRelationship(m);
+            AttributeDef ref = null;
+            for (int k = 0; k < m.getClassDef().getAttributes().getCount() && ref == null; k++) {
+                AttributeDef a = m.getClassDef().getAttributes().getItem(k);
+                ref = a.getAttributeType() == AttributeType.Relationship && !a.isMultiValuated() ? a : null;
+            }
             if (ref != null && m.getInstances().getCount() > 0 && rnd.nextBoolean()) {
                 Instance holder = m.getInstances().getItem(0);
                 if (!holder.isDeleted() && holder.getClassDef().getAttributes().indexOf(ref) >= 0) {
@@ -424,22 +416,7 @@ final class Fx {
         return r;
     }
 
-    private static AttributeDef firstSingleRelationship(Model m) {
-        ClassDef c = m.getClassDef();
-        for (int k = 0; k < c.getAttributes().getCount(); k++) {
-            AttributeDef a = c.getAttributes().getItem(k);
-            if (a.getAttributeType() == AttributeType.Relationship && !a.isMultiValuated()) {
-                return a;
-            }
-        }
-        return null;
-    }
-
-    private static Model findModel(Replica r, Instance x) {
-        return r.getModels().getItem(x.getClassDef().getClassName());
-    }
-
-    private static void setId(Instance x, Random rnd, int[] ids) {
+    private static Instance setId(Instance x, Random rnd, int[] ids) {
         int kind = rnd.nextInt(3);
         int n = ids[0]++;
         if (kind == 1) {
@@ -447,15 +424,13 @@ final class Fx {
         } else if (kind == 2) {
             x.setID(new byte[] {(byte) n, (byte) (n >> 8), (byte) 0xFF});
         }
+        return x;
     }
 
     private static void fill(Instance x, Random rnd, List<Instance> live) {
-        ClassDef c = x.getClassDef();
-        int n = x.values.length;
-        for (int p = 0; p < n; p++) {
-            AttributeDef a = c.layout[p];
+        for (int p = 0; p < x.values.length; p++) {
             if (rnd.nextInt(4) != 0) {
-                x.setValue(p, value(a, rnd, live));
+                x.setValue(p, value(x.getClassDef().layout[p], rnd, live));
             } else if (rnd.nextBoolean()) {
                 x.clearValue(p);
             }
@@ -468,23 +443,19 @@ final class Fx {
         String m = e.getMessage();
         if (line > 0) {
             assertEquals(line, e.getLine(), () -> "line of: " + m);
-            assertTrue(m.contains("line " + line + ", column "), () -> "message lacks the line: " + m);
-            assertTrue(e.getColumn() > 0, m);
+            assertTrue(m.contains("line " + line + ", column ") && e.getColumn() > 0, () -> "no line/column: " + m);
         }
-        for (String f : fragments) {
-            assertTrue(m.contains(f), () -> "message \"" + m + "\" lacks \"" + f + "\"");
-        }
+        contains(m, fragments);
         return e;
     }
 
     /** Validates a document against a schema text with the JDK's validator, secured like the package does. */
-    static void validate(String xsd, String xml) throws SAXException, IOException {
+    static void validate(String xsd, String xml) throws Exception {
         SchemaFactory f = SchemaFactory.newDefaultInstance();
         f.setFeature(XMLConstants.FEATURE_SECURE_PROCESSING, true);
         f.setProperty(XMLConstants.ACCESS_EXTERNAL_SCHEMA, "");
         f.setProperty(XMLConstants.ACCESS_EXTERNAL_DTD, "");
-        Schema s = f.newSchema(new StreamSource(new StringReader(xsd)));
-        Validator v = s.newValidator();
+        Validator v = f.newSchema(new StreamSource(new StringReader(xsd))).newValidator();
         v.setProperty(XMLConstants.ACCESS_EXTERNAL_SCHEMA, "");
         v.setProperty(XMLConstants.ACCESS_EXTERNAL_DTD, "");
         v.validate(new StreamSource(new StringReader(xml)));
@@ -492,27 +463,23 @@ final class Fx {
 
     /** A local TCP listener that counts the connections it receives, to prove that nothing was fetched. */
     static final class Listener implements AutoCloseable {
-        private final ServerSocket socket;
+        private final ServerSocket socket = new ServerSocket(0, 50, InetAddress.getLoopbackAddress());
         private final AtomicInteger connections = new AtomicInteger();
-        private final Thread thread;
 
         Listener() throws IOException {
-            socket = new ServerSocket(0, 50, InetAddress.getLoopbackAddress());
-            thread = new Thread(() -> {
+            Thread t = new Thread(() -> {
                 while (!socket.isClosed()) {
                     try (Socket s = socket.accept()) {
                         connections.incrementAndGet();
-                        s.getOutputStream().write(("HTTP/1.0 200 OK\r\nContent-Type: text/plain\r\n\r\n"
-                                + "<!ENTITY x \"FETCHED\">").getBytes(java.nio.charset.StandardCharsets.US_ASCII));
-                    } catch (SocketException closed) {
-                        return;
+                        s.getOutputStream().write("HTTP/1.0 200 OK\r\n\r\n<!ENTITY x \"FETCHED\">".getBytes(
+                                StandardCharsets.US_ASCII));
                     } catch (IOException e) {
-                        // a broken client is still a connection; keep listening
+                        // closed, or a broken client (still a connection)
                     }
                 }
             }, "listener");
-            thread.setDaemon(true);
-            thread.start();
+            t.setDaemon(true);
+            t.start();
         }
 
         String url(String path) {
@@ -526,11 +493,6 @@ final class Fx {
         @Override
         public void close() throws IOException {
             socket.close();
-            try {
-                thread.join(5000);
-            } catch (InterruptedException e) {
-                Thread.currentThread().interrupt();
-            }
         }
     }
 
@@ -562,18 +524,13 @@ final class Fx {
      */
     static ReplicaBinaryException refused(byte[] bytes, boolean compressed, long factor, String... fragments) {
         long before = allocated();
-        try {
-            Replica.getReplicaFromBinary(bytes, compressed);
-        } catch (ReplicaBinaryException e) {
-            long used = allocated() - before;
-            assertTrue(used <= factor * bytes.length + (1 << 20),
-                    () -> "refusing " + bytes.length + " bytes allocated " + used + " bytes: " + e.getMessage());
-            for (String f : fragments) {
-                assertTrue(e.getMessage().contains(f), () -> "message \"" + e.getMessage() + "\" lacks \"" + f + "\"");
-            }
-            assertTrue(e.getMessage().contains("at offset "), e.getMessage());
-            return e;
-        }
-        return fail("bytes were accepted, expected a refusal naming " + Arrays.toString(fragments));
+        ReplicaBinaryException e = assertThrows(ReplicaBinaryException.class,
+                () -> Replica.getReplicaFromBinary(bytes, compressed), () -> "accepted, expected " + List.of(fragments));
+        long used = allocated() - before;
+        assertTrue(used <= factor * bytes.length + (1 << 20), () -> "refusing " + bytes.length + " bytes allocated "
+                + used + " bytes: " + e.getMessage());
+        contains(e.getMessage(), fragments);
+        contains(e.getMessage(), "at offset ");
+        return e;
     }
 }

@@ -1,69 +1,45 @@
 package com.velmora.tessara.kdmreplica;
 
-import static com.velmora.tessara.kdmreplica.Fx.addAttr;
-import static com.velmora.tessara.kdmreplica.Fx.addClass;
-import static com.velmora.tessara.kdmreplica.Fx.throwsWith;
-import static com.velmora.tessara.kdmreplica.Fx.dump;
-import static org.junit.jupiter.api.Assertions.assertArrayEquals;
-import static org.junit.jupiter.api.Assertions.assertEquals;
-import static org.junit.jupiter.api.Assertions.assertFalse;
-import static org.junit.jupiter.api.Assertions.assertNull;
-import static org.junit.jupiter.api.Assertions.assertSame;
-import static org.junit.jupiter.api.Assertions.assertThrows;
-import static org.junit.jupiter.api.Assertions.assertTrue;
+import static com.velmora.tessara.kdmreplica.Fx.*;
+import static org.junit.jupiter.api.Assertions.*;
 
-import java.util.Arrays;
 import org.junit.jupiter.api.BeforeEach;
 import org.junit.jupiter.api.Test;
 import org.junit.jupiter.api.function.Executable;
 
 /** Inheritance, schema checks, live collections, lookups and what schema changes do to existing instances. */
 class SchemaTest {
+    private static final Class<?> INDEX = IndexOutOfBoundsException.class;
+    private static final Class<?> ARG = IllegalArgumentException.class;
+    private static final Class<?> STATE = IllegalStateException.class;
     private Replica r;
     private Model part;
     private Model bolt;
 
     @BeforeEach
     void setUp() {
-        r = new Replica("plant");
-        part = addClass(r, "Part", null);
-        addAttr(part, "name", AttributeType.String, false);
-        addAttr(part, "weight", AttributeType.Double, false);
-        bolt = addClass(r, "Bolt", "Part");
-        addAttr(bolt, "thread", AttributeType.Integer, false);
-    }
-
-    @Test
-    void subclassInstancesHaveInheritedAttributesFirst() {
-        Instance b = bolt.createInstance();
-        b.setValue(0, "m8");
-        b.setValue(1, 2.5);
-        b.setValue(2, 8);
-        assertEquals("m8", b.getValue("name"));
-        assertEquals(8, b.getValue("thread"));
-        throwsWith(IndexOutOfBoundsException.class, () -> b.getValue(3), "position 3", "3 attributes");
-        throwsWith(IllegalArgumentException.class, () -> b.getValue("wieght"), "class 'Bolt'", "'wieght'");
-        assertSame(part.getClassDef().getAttributes().getItem("name"), r.getAttributeDef("Bolt.name"));
+        r = replica("plant", "Part: name String, weight Double; Bolt(Part): thread Integer");
+        part = r.getModels().getItem("Part");
+        bolt = r.getModels().getItem("Bolt");
     }
 
     @Test
     void valuesFollowTheirAttributesWhenTheSchemaChanges() {
-        Instance p = part.createInstance();
-        Instance b = bolt.createInstance();
-        p.setValue("name", "plate");
-        p.setValue("weight", 1.0);
-        b.setValue("name", "m8");
-        b.setValue("thread", 8);
-
+        Instance p = inst(part, "name", "plate", "weight", 1.0);
+        Instance b = inst(bolt, "thread", 8);
+        b.setValue(0, "m8"); // inherited attributes first
+        b.setValue(1, 2.5);
+        assertEquals("m8", b.getValue("name"));
+        assertSame(part.getClassDef().getAttributes().getItem("name"), r.getAttributeDef("Bolt.name"));
+        refusals(new Object[][] {{INDEX, (Executable) () -> b.getValue(3), "position 3", "3 attributes"},
+            {ARG, (Executable) () -> b.getValue("wieght"), "class 'Bolt'", "'wieght'"}});
         // a new attribute of the super class goes before the subclass's own, without value
         addAttr(part, "colour", AttributeType.String, false);
-        assertEquals("colour", part.getClassDef().getAttributes().getItem(2).getAttributeName());
+        assertEquals(2, part.getClassDef().getAttributes().indexOf("colour"));
         assertFalse(b.isValuated("colour"));
-        assertEquals(3, r.getClassDef("Bolt").getAttributes().getCount() + 2);
         assertEquals(8, b.getValue(3));
         assertEquals("m8", b.getValue(0));
         b.setValue("colour", "red");
-
         // removing one takes its values with it, the others stay
         part.getClassDef().getAttributes().remove("weight");
         assertEquals("plate", p.getValue("name"));
@@ -75,19 +51,15 @@ class SchemaTest {
 
     @Test
     void forgottenDeletedInstancesKeepTheAttributesTheyLeftWith() {
-        Instance fresh = part.createInstance();
-        fresh.setValue("weight", 3.0);
-        Instance committed = part.createInstance();
-        committed.setValue("weight", 4.0);
+        Instance fresh = inst(part, "weight", 3.0);
+        Instance committed = inst(part, "weight", 4.0);
         r.commit();
         part.getInstances().remove(committed);
         r.commit(); // forgotten now
-        Instance neverCommitted = part.createInstance();
-        neverCommitted.setValue("weight", 5.0);
+        Instance neverCommitted = inst(part, "weight", 5.0);
         part.getInstances().remove(neverCommitted);
         part.getInstances().remove(fresh);
         r.commit();
-
         part.getClassDef().getAttributes().remove("name");
         addAttr(part, "colour", AttributeType.String, false);
         assertEquals(4.0, committed.getValue("weight"));
@@ -97,59 +69,42 @@ class SchemaTest {
     }
 
     @Test
-    void changingTheSuperClassRealignsInstances() {
-        Model base = addClass(r, "Base", null);
-        addAttr(base, "uid", AttributeType.Integer, false);
-        Instance b = bolt.createInstance();
-        b.setValue("thread", 6);
-        part.getClassDef().setSuperName("Base");
+    void changingTheSuperClassRealignsInstancesAndRefusesUnknownCyclicOrClashingOnes() {
+        addAttr(addClass(r, "Base", null), "uid", AttributeType.Integer, false);
+        Instance b = inst(bolt, "thread", 6);
+        ClassDef p = part.getClassDef();
+        p.setSuperName("Base");
         assertEquals("uid", r.getAttributeDef("Bolt.uid").getAttributeName());
         assertEquals(6, b.getValue(3));
         b.setValue(0, 1);
-        part.getClassDef().setSuperName(null);
-        assertEquals("", part.getClassDef().getSuperName());
+        p.setSuperName(null);
+        assertEquals("", p.getSuperName());
         assertEquals(6, b.getValue(2));
-    }
-
-    @Test
-    void unknownAndCyclicSuperClassesAreRefusedAndUndone() {
-        ClassDef p = part.getClassDef();
-        throwsWith(IllegalArgumentException.class, () -> p.setSuperName("Nope"), "class 'Part'", "'Nope'");
+        addAttr(addClass(r, "Other", null), "thread", AttributeType.String, false);
+        refusals(new Object[][] {
+            {ARG, (Executable) () -> p.setSuperName("Nope"), "class 'Part'", "'Nope'"},
+            {ARG, (Executable) () -> p.setSuperName("Bolt"), "cyclic", "Part -> Bolt -> Part"},
+            {ARG, (Executable) () -> p.setSuperName("Part"), "cyclic"},
+            {ARG, (Executable) () -> addAttr(bolt, "name", AttributeType.String, false), "'Bolt.name'", "'Part.name'"},
+            {ARG, (Executable) () -> addAttr(part, "thread", AttributeType.Integer, false), "'Bolt.thread'"},
+            {ARG, (Executable) () -> bolt.getClassDef().setSuperName("Other"), "'Bolt.thread'", "'Other.thread'"}});
         assertEquals("", p.getSuperName());
-        throwsWith(IllegalArgumentException.class, () -> p.setSuperName("Bolt"), "cyclic", "Part -> Bolt -> Part");
-        throwsWith(IllegalArgumentException.class, () -> p.setSuperName("Part"), "cyclic");
-        assertEquals("", p.getSuperName());
+        assertEquals("Part", bolt.getClassDef().getSuperName());
+        assertEquals(2, p.getAttributes().getCount());
+        assertEquals(1, bolt.getClassDef().getAttributes().getCount());
 
         ClassDef orphan = new ClassDef("Orphan");
         orphan.setSuperName("Missing"); // only stored while in no replica
         throwsWith(IllegalArgumentException.class, () -> r.getModels().add(new Model(orphan)), "'Missing'");
-        assertEquals(2, r.getModels().getCount());
         assertNull(orphan.replica);
         assertNull(r.getClassDef("Orphan"));
         orphan.setSuperName("Part");
         r.getModels().add(new Model(orphan));
-        assertEquals(3, r.getModels().getCount());
-    }
-
-    @Test
-    void attributeNamesMayNotClashAlongTheInheritanceChain() {
-        throwsWith(IllegalArgumentException.class, () -> addAttr(bolt, "name", AttributeType.String, false),
-                "'Bolt.name'", "'Part.name'");
-        throwsWith(IllegalArgumentException.class, () -> addAttr(part, "thread", AttributeType.Integer, false),
-                "'Bolt.thread'");
-        assertEquals(2, part.getClassDef().getAttributes().getCount());
-        assertEquals(1, bolt.getClassDef().getAttributes().getCount());
-        Model other = addClass(r, "Other", null);
-        addAttr(other, "thread", AttributeType.String, false);
-        throwsWith(IllegalArgumentException.class, () -> bolt.getClassDef().setSuperName("Other"), "'Bolt.thread'", "'Other.thread'");
-        assertEquals("Part", bolt.getClassDef().getSuperName());
+        assertEquals(5, r.getModels().getCount());
     }
 
     @Test
     void aClassNameIsTakenOnceAndRenamesCarrySubclassesAndTargets() throws Exception {
-        throwsWith(IllegalArgumentException.class, () -> r.getModels().add(new Model(new ClassDef("Part"))),
-                "already has a class 'Part'");
-        throwsWith(IllegalArgumentException.class, () -> part.getClassDef().setClassName("Bolt"), "taken");
         AttributeDef link = addAttr(part, "link", AttributeType.Relationship, false);
         link.setTargetNames(new String[] {"Nut", "Part"});
         Instance b = bolt.createInstance();
@@ -157,44 +112,41 @@ class SchemaTest {
         part.getClassDef().setClassName("Item");
         assertEquals("Item", bolt.getClassDef().getSuperName());
         assertArrayEquals(new String[] {"Nut", "Item"}, link.getTargetNames());
-        part.createInstance().setValue("link", b);
+        inst(part, "link", b);
         r.commit();
         for (RoundTripTest.Form f : RoundTripTest.Form.values()) {
             RoundTripTest.same(r, f);
         }
         assertSame(part, r.getModels().getItem("Item"));
         assertNull(r.getModels().getItem("Part"));
-        throwsWith(IllegalArgumentException.class, () -> r.getModels().remove("Item"), "'Bolt' extends it");
-        throwsWith(IllegalArgumentException.class, () -> new ClassDef("a.b"), "'a.b'");
-        throwsWith(IllegalArgumentException.class, () -> new AttributeDef("", AttributeType.Integer), "empty");
-        throwsWith(IllegalArgumentException.class, () -> new AttributeDef("x", null), "type is null");
+        refusals(new Object[][] {
+            {ARG, (Executable) () -> r.getModels().add(new Model(new ClassDef("Item"))), "already has a class 'Item'"},
+            {ARG, (Executable) () -> part.getClassDef().setClassName("Bolt"), "taken"},
+            {ARG, (Executable) () -> r.getModels().remove("Item"), "'Bolt' extends it"},
+            {ARG, (Executable) () -> new ClassDef("a.b"), "'a.b'"},
+            {ARG, (Executable) () -> new AttributeDef("", AttributeType.Integer), "empty"},
+            {ARG, (Executable) () -> new AttributeDef("x", null), "type is null"}});
     }
 
     @Test
-    void attributeLookupByQualifiedOrUniqueBareName() {
-        Model nut = addClass(r, "Nut", null);
-        addAttr(nut, "thread", AttributeType.Integer, false);
+    void attributesAreFoundByQualifiedOrUniqueBareNameAndBelongToOneClass() {
+        addAttr(addClass(r, "Nut", null), "thread", AttributeType.Integer, false);
         assertSame(bolt.getClassDef().getAttributes().getItem(0), r.getAttributeDef("Bolt.thread"));
         assertSame(part.getClassDef().getAttributes().getItem(1), r.getAttributeDef("weight"));
         throwsWith(IllegalArgumentException.class, () -> r.getAttributeDef("thread"), "ambiguous", "'Bolt'", "'Nut'");
-        assertNull(r.getAttributeDef("nothing"));
-        assertNull(r.getAttributeDef("Nope.name"));
-        assertNull(r.getAttributeDef("Part.thread"));
+        for (String absent : new String[] {"nothing", "Nope.name", "Part.thread"}) {
+            assertNull(r.getAttributeDef(absent), absent);
+        }
         assertNull(r.getClassDef("Nope"));
         assertThrows(IllegalArgumentException.class, () -> r.getAttributeDef(null));
-    }
 
-    @Test
-    void anAttributeBelongsToOneClass() {
-        AttributeDef a = part.getClassDef().getAttributes().getItem("name");
+        AttributeDef a = r.getAttributeDef("Part.name");
         assertSame(part.getClassDef(), a.getClassDef());
-        Model nut = addClass(r, "Nut", null);
-        throwsWith(IllegalArgumentException.class, () -> nut.getClassDef().getAttributes().add(a),
-                "already belongs to class 'Part'");
+        ClassDef nut = r.getClassDef("Nut");
+        throwsWith(IllegalArgumentException.class, () -> nut.getAttributes().add(a), "already belongs to class 'Part'");
         part.getClassDef().getAttributes().remove(a);
         assertNull(a.getClassDef());
-        nut.getClassDef().getAttributes().add(a);
-        assertSame(nut.getClassDef(), a.getClassDef());
+        nut.getAttributes().add(a);
         assertEquals("AttributeDef 'Nut.name' String", a.toString());
     }
 
@@ -203,29 +155,23 @@ class SchemaTest {
         AttributeDef link = addAttr(part, "link", AttributeType.Relationship, false);
         link.setTargetNames(new String[] {"Part"});
         AttributeDef blobs = addAttr(bolt, "blobs", AttributeType.Binary, true);
-        Instance b = bolt.createInstance();
-        b.setValue("blobs", new byte[][] {{}, {1, 2, 3}});
+        Instance b = inst(bolt, "blobs", new byte[][] {{}, {1, 2, 3}}, "weight", 2.0);
         b.setValue("link", b); // dropped with Part.link when Bolt leaves Part: no obstacle to that
-        b.setValue("weight", 2.0);
-        part.createInstance().setValue("link", b);
-        Instance gone = part.createInstance();
-        gone.setValue("name", "plate \ud83d\udd29");
+        inst(part, "link", b);
+        Instance gone = inst(part, "name", "plate \ud83d\udd29");
         r.commit();
         part.getInstances().remove(gone); // deleted: written with the states until the next commit
         String before = dump(r);
         AttributeDef name = r.getAttributeDef("Part.name");
-        Object[][] edits = {
-            {(Executable) () -> link.setTargetNames(new String[] {"Nut"}), "'Part.link'", "Part[#0]", "Bolt[#0]",
+        refusals(new Object[][] {
+            {STATE, (Executable) () -> link.setTargetNames(new String[] {"Nut"}), "'Part.link'", "Part[#0]", "Bolt[#0]",
                 "class 'Bolt'"},
-            {(Executable) () -> bolt.getClassDef().setSuperName(null), "class 'Bolt'", "'Part.link'", "Part[#0]"},
-            {(Executable) () -> name.setLength(6), "'Part.name'", "Part[deleted]", "7 characters", " 6 "},
-            {(Executable) () -> blobs.setLength(2), "'Bolt.blobs'", "Bolt[#0]", "3 bytes", " 2 "},
-            {(Executable) () -> r.getAttributeDef("Part.weight").setMultiValuation(true), "'Part.weight'", "1 instance"},
-        };
-        for (Object[] e : edits) {
-            throwsWith(IllegalStateException.class, (Executable) e[0], Arrays.copyOfRange(e, 1, e.length, String[].class));
-            assertEquals(before, dump(r));
-        }
+            {STATE, (Executable) () -> bolt.getClassDef().setSuperName(null), "class 'Bolt'", "'Part.link'", "Part[#0]"},
+            {STATE, (Executable) () -> name.setLength(6), "'Part.name'", "Part[deleted]", "7 characters", " 6 "},
+            {STATE, (Executable) () -> blobs.setLength(2), "'Bolt.blobs'", "Bolt[#0]", "3 bytes", " 2 "},
+            {STATE, (Executable) () -> r.getAttributeDef("Part.weight").setMultiValuation(true), "'Part.weight'",
+                "1 instance"}});
+        assertEquals(before, dump(r));
         name.setLength(7);
         blobs.setLength(3);
         part.getInstances().getItem(0).clearValue("link");
@@ -243,47 +189,33 @@ class SchemaTest {
         InstanceSet set = part.getInstances();
         assertSame(part, models.getItem(0));
         assertSame(x, set.getItem(0));
-        assertEquals(0, set.indexOf(x));
-        assertEquals(-1, set.indexOf(y));
-        assertEquals(2, models.indexOf("Other"));
-        assertEquals(2, models.indexOf(other.getClassDef()));
-        assertEquals(1, attrs.indexOf(attrs.getItem("weight")));
-        assertTrue(attrs.includes("name"));
+        assertArrayEquals(new int[] {0, -1, 2, 2, 1, -1, -1, -1, -1}, new int[] {set.indexOf(x), set.indexOf(y),
+            models.indexOf("Other"), models.indexOf(other.getClassDef()), attrs.indexOf(attrs.getItem("weight")),
+            models.indexOf("Nope"), models.indexOf(new ClassDef("Part")), attrs.indexOf("b"),
+            attrs.indexOf(new AttributeDef("name", AttributeType.String))});
+        assertTrue(attrs.includes("name") && !models.includes("Nope"));
         assertNull(models.getItem("Nope"));
-        assertEquals(-1, models.indexOf("Nope"));
-        assertEquals(-1, models.indexOf(new ClassDef("Part")));
-        assertFalse(models.includes("Nope"));
         assertNull(attrs.getItem("b"));
-        assertEquals(-1, attrs.indexOf("b"));
-        assertEquals(-1, attrs.indexOf(new AttributeDef("name", AttributeType.String)));
-        Class<?> index = IndexOutOfBoundsException.class;
-        Class<?> arg = IllegalArgumentException.class;
-        Object[][] refusals = {
-            {index, (Executable) () -> models.getItem(3), "replica 'plant'", "position 3"},
-            {index, (Executable) () -> models.remove(-1), "position -1"},
-            {index, (Executable) () -> attrs.getItem(2), "class 'Part'", "position 2"},
-            {index, (Executable) () -> attrs.remove(5), "position 5"},
-            {index, (Executable) () -> set.getItem(-1), "class 'Part'", "position -1"},
-            {index, (Executable) () -> set.remove(1), "position 1", "count 1"},
-            {index, (Executable) () -> x.getValue(2), "Part[#0]", "position 2"},
-            {index, (Executable) () -> x.setValue(-1, 3), "position -1"},
-            {index, (Executable) () -> x.isValuated(2), "position 2"},
-            {index, (Executable) () -> x.clearValue(2), "position 2"},
-            {arg, (Executable) () -> models.remove("Nope"), "'Nope'"},
-            {arg, (Executable) () -> models.remove(new ClassDef("Part")), "'Part'"},
-            {arg, (Executable) () -> attrs.remove("b"), "'b'"},
-            {arg, (Executable) () -> attrs.remove(new AttributeDef("name", AttributeType.String)), "'name'",
-                "not in this list"},
-            {arg, (Executable) () -> set.remove(y), "Other[#0]", "not in this set"},
-            {arg, (Executable) () -> models.add(null), "model is null"},
-            {arg, (Executable) () -> models.add(part), "already in replica 'plant'"},
-            {arg, (Executable) () -> new Model(null), "null"},
-        };
         String before = dump(r);
-        for (Object[] row : refusals) {
-            throwsWith(((Class<?>) row[0]).asSubclass(Throwable.class), (Executable) row[1],
-                    Arrays.copyOfRange(row, 2, row.length, String[].class));
-        }
+        refusals(new Object[][] {
+            {INDEX, (Executable) () -> models.getItem(3), "replica 'plant'", "position 3"},
+            {INDEX, (Executable) () -> models.remove(-1), "position -1"},
+            {INDEX, (Executable) () -> attrs.getItem(2), "class 'Part'", "position 2"},
+            {INDEX, (Executable) () -> attrs.remove(5), "position 5"},
+            {INDEX, (Executable) () -> set.getItem(-1), "class 'Part'", "position -1"},
+            {INDEX, (Executable) () -> set.remove(1), "position 1", "count 1"},
+            {INDEX, (Executable) () -> x.getValue(2), "Part[#0]", "position 2"},
+            {INDEX, (Executable) () -> x.setValue(-1, 3), "position -1"},
+            {INDEX, (Executable) () -> x.isValuated(2), "position 2"},
+            {INDEX, (Executable) () -> x.clearValue(2), "position 2"},
+            {ARG, (Executable) () -> models.remove("Nope"), "'Nope'"},
+            {ARG, (Executable) () -> models.remove(new ClassDef("Part")), "'Part'"},
+            {ARG, (Executable) () -> attrs.remove("b"), "'b'"},
+            {ARG, (Executable) () -> attrs.remove(new AttributeDef("name", AttributeType.String)), "'name'", "not in this list"},
+            {ARG, (Executable) () -> set.remove(y), "Other[#0]", "not in this set"},
+            {ARG, (Executable) () -> models.add(null), "model is null"},
+            {ARG, (Executable) () -> models.add(part), "already in replica 'plant'"},
+            {ARG, (Executable) () -> new Model(null), "null"}});
         assertEquals(before, dump(r));
     }
 
@@ -301,9 +233,8 @@ class SchemaTest {
 
     @Test
     void noArgumentConstructorsGiveUsableObjects() {
-        ModelSet ms = new ModelSet();
         Model m = new Model();
-        ms.add(m);
+        new ModelSet().add(m);
         assertTrue(m.getReplica().getName().startsWith("Replica"));
         m.getClassDef().getAttributes().add(new AttributeDef());
         m.createInstance().setValue(0, "a generated attribute is a String");

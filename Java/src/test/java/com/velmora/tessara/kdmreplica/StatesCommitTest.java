@@ -1,19 +1,15 @@
 package com.velmora.tessara.kdmreplica;
 
-import static com.velmora.tessara.kdmreplica.Fx.addAttr;
-import static com.velmora.tessara.kdmreplica.Fx.addClass;
-import static com.velmora.tessara.kdmreplica.Fx.throwsWith;
-import static org.junit.jupiter.api.Assertions.assertArrayEquals;
-import static org.junit.jupiter.api.Assertions.assertEquals;
-import static org.junit.jupiter.api.Assertions.assertFalse;
-import static org.junit.jupiter.api.Assertions.assertSame;
-import static org.junit.jupiter.api.Assertions.assertTrue;
+import static com.velmora.tessara.kdmreplica.Fx.*;
+import static org.junit.jupiter.api.Assertions.*;
 
+import com.velmora.tessara.kdmreplica.vrattributes.AccessMode;
 import java.nio.charset.StandardCharsets;
+import java.util.Date;
 import org.junit.jupiter.api.BeforeEach;
 import org.junit.jupiter.api.Test;
 
-/** States, removal with composition, identifiers, and the all-or-nothing commit. */
+/** States, removal with composition, identifiers, the all-or-nothing commit, and the staging that readers use. */
 class StatesCommitTest {
     private Replica r;
     private Model car;
@@ -22,81 +18,71 @@ class StatesCommitTest {
 
     @BeforeEach
     void setUp() {
-        r = new Replica("garage");
-        person = addClass(r, "Person", null);
-        addAttr(person, "name", AttributeType.String, false);
-        wheel = addClass(r, "Wheel", null);
-        addAttr(wheel, "size", AttributeType.Integer, false);
-        car = addClass(r, "Car", null);
-        addAttr(car, "wheels", AttributeType.Relationship, true).setAggregationType(AggregationType.Composition);
-        addAttr(car, "owner", AttributeType.Relationship, false);
+        r = replica("garage", "Person: name String; Wheel: size Integer; Car: wheels Relationship*, owner Relationship");
+        person = r.getModels().getItem("Person");
+        wheel = r.getModels().getItem("Wheel");
+        car = r.getModels().getItem("Car");
+        r.getAttributeDef("Car.wheels").setAggregationType(AggregationType.Composition);
     }
 
-    private static String states(Instance x) {
-        return (x.isCreated() ? "C" : "") + (x.isModified() ? "M" : "") + (x.isDeleted() ? "D" : "");
+    private static String states(Instance... xs) {
+        StringBuilder b = new StringBuilder();
+        for (Instance x : xs) {
+            b.append(x.isCreated() ? "C" : "").append(x.isModified() ? "M" : "").append(x.isDeleted() ? "D" : "").append(',');
+        }
+        return b.toString();
     }
 
     @Test
     void stateLifecycle() {
-        Instance p = person.createInstance();
-        assertEquals("C", states(p));
-        p.setValue("name", "Ann");
-        assertEquals("C", states(p));
+        Instance p = inst(person, "name", "Ann");
+        assertEquals("C,", states(p));
         r.commit();
-        assertEquals("", states(p));
+        assertEquals(",", states(p));
         p.setID("ann");
-        assertEquals("M", states(p));
+        assertEquals("M,", states(p));
         r.commit();
+        assertEquals(",", states(p));
         p.clearValue("name");
-        assertEquals("M", states(p));
+        assertEquals("M,", states(p));
         person.getInstances().remove(p);
-        assertEquals("D", states(p));
-        assertEquals(0, person.getInstances().getCount());
-        assertTrue(r.toString().contains("1 deleted"), r.toString());
+        assertEquals("D,", states(p));
+        assertEquals("Replica 'garage' (3 classes, 0 instances, 1 deleted)", r.toString());
         throwsWith(IllegalStateException.class, () -> p.setValue("name", "x"), "Person[id=\"ann\"]", "deleted");
         throwsWith(IllegalStateException.class, () -> p.setID("x"), "deleted");
         assertEquals("ann", p.getID()); // still readable
         r.commit();
         assertEquals("Replica 'garage' (3 classes, 0 instances)", r.toString());
-        assertTrue(p.isDeleted());
+        assertEquals("D,", states(p));
         Instance never = person.createInstance(); // never committed: simply disappears
         person.getInstances().remove(0);
-        assertEquals("D", states(never));
+        assertEquals("D,", states(never));
         assertEquals("Replica 'garage' (3 classes, 0 instances)", r.toString());
     }
 
     @Test
     void removalCascadesThroughCompositionOnly() {
-        Instance c = car.createInstance();
         Instance w1 = wheel.createInstance();
         Instance w2 = wheel.createInstance();
         Instance keep = wheel.createInstance();
         Instance owner = person.createInstance();
-        c.setValue("wheels", new Instance[] {w1, w2});
-        c.setValue("owner", owner);
+        Instance c = inst(car, "wheels", new Instance[] {w1, w2}, "owner", owner);
         r.commit();
         car.getInstances().remove(c);
-        assertTrue(c.isDeleted() && w1.isDeleted() && w2.isDeleted());
-        assertFalse(owner.isDeleted() || keep.isDeleted());
+        assertEquals("D,D,D,,,", states(c, w1, w2, owner, keep));
         assertSame(keep, wheel.getInstances().getItem(0));
-        assertEquals(0, wheel.getInstances().indexOf(keep));
         assertEquals(-1, wheel.getInstances().indexOf(w1));
-
         // a composition cycle ends
+        addAttr(car, "spare", AttributeType.Relationship, false).setAggregationType(AggregationType.Composition);
         Instance a = car.createInstance();
-        Instance b = car.createInstance();
-        AttributeDef self = addAttr(car, "spare", AttributeType.Relationship, false);
-        self.setAggregationType(AggregationType.Composition);
+        Instance b = inst(car, "spare", a);
         a.setValue("spare", b);
-        b.setValue("spare", a);
         car.getInstances().removeAll();
         assertEquals(0, car.getInstances().getCount());
-        assertTrue(a.isDeleted() && b.isDeleted());
-
+        assertEquals("D,D,", states(a, b));
         // removing a model deletes its instances and leaves references to them dangling
-        Instance owned = car.createInstance();
         Instance ann = person.createInstance();
-        owned.setValue("owner", ann);
+        Instance owned = inst(car, "owner", ann);
         r.commit();
         r.getModels().remove("Person");
         assertTrue(ann.isDeleted());
@@ -108,41 +94,26 @@ class StatesCommitTest {
     @Test
     void commitListsEveryViolationAndChangesNothing() {
         r.getAttributeDef("Person.name").setMandatory(true);
-        AttributeDef size = r.getAttributeDef("size");
-        size.setUnicity(true);
+        r.getAttributeDef("size").setUnicity(true);
         Model sub = addClass(r, "BigWheel", "Wheel");
         car.getClassDef().setAbstract(true);
+        addAttr(person, "tags", AttributeType.Binary, true).setUnicity(true); // arrays are compared by content
+        Instance nameless = inst(person, "tags", new byte[][] {{1, 2}, {3}});
+        inst(wheel, "size", 17);
+        Instance w2 = inst(sub, "size", 17); // uniqueness spans the subclass
+        Instance goner = inst(person, "name", "Bob", "tags", new byte[][] {{1, 2}, {3}});
+        Instance other = inst(person, "name", "Cy", "tags", new byte[][] {{1, 2}, {3}});
+        Instance c = inst(car, "owner", goner);
+        person.getInstances().remove(goner);
 
-        Instance nameless = person.createInstance();
-        Instance w1 = wheel.createInstance();
-        Instance w2 = sub.createInstance(); // uniqueness spans the subclass
-        w1.setValue("size", 17);
-        w2.setValue("size", 17);
-        Instance goner = person.createInstance();
-        goner.setValue("name", "Bob");
-        AttributeDef tags = addAttr(person, "tags", AttributeType.Binary, true);
-        tags.setUnicity(true); // arrays are compared by content
-        nameless.setValue("tags", new byte[][] {{1, 2}, {3}});
-        goner.setValue("tags", new byte[][] {{1, 2}, {3}});
-        Instance other = person.createInstance();
-        other.setValue("name", "Cy");
-        other.setValue("tags", new byte[][] {{1, 2}, {3}});
-        Instance c = car.createInstance();
-        c.setValue("owner", goner);
-        r.getModels().getItem("Person").getInstances().remove(goner);
-
-        ReplicaCommitException e = throwsWith(ReplicaCommitException.class, r::commit,
-                "replica 'garage'", "5 violations",
-                "Person[#0]: mandatory attribute 'Person.name' has no value",
-                "attribute 'Wheel.size' is unique but Wheel[#0] and BigWheel[#0] both hold 17",
-                "class 'Car' is abstract",
+        ReplicaCommitException e = throwsWith(ReplicaCommitException.class, r::commit, "replica 'garage'",
+                "5 violations", "Person[#0]: mandatory attribute 'Person.name' has no value",
+                "attribute 'Wheel.size' is unique but Wheel[#0] and BigWheel[#0] both hold 17", "class 'Car' is abstract",
                 "Car[#0]: attribute 'Car.owner' refers to Person[deleted], which is deleted",
                 "attribute 'Person.tags' is unique but Person[#0] and Person[#1] both hold");
         assertEquals(5, e.getViolationCount());
         assertEquals(5, e.getViolations().size());
-        assertEquals("C", states(nameless));
-        assertEquals("C", states(c));
-        assertTrue(goner.isDeleted());
+        assertEquals("C,C,D,", states(nameless, c, goner));
 
         nameless.setValue("name", "Ann");
         other.setValue("tags", new byte[][] {{1, 2}, {4}});
@@ -150,7 +121,7 @@ class StatesCommitTest {
         c.clearValue("owner");
         car.getClassDef().setAbstract(false);
         r.commit();
-        assertEquals("", states(nameless) + states(c) + states(w2));
+        assertEquals(",,,", states(nameless, c, w2));
     }
 
     @Test
@@ -159,8 +130,7 @@ class StatesCommitTest {
         for (int i = 0; i < 150; i++) {
             person.createInstance();
         }
-        ReplicaCommitException e = throwsWith(ReplicaCommitException.class, r::commit, "150 violations",
-                "and 50 more");
+        ReplicaCommitException e = throwsWith(ReplicaCommitException.class, r::commit, "150 violations", "and 50 more");
         assertEquals(Replica.MAX_LISTED_VIOLATIONS, e.getViolations().size());
         assertEquals(150, e.getViolationCount());
     }
@@ -175,14 +145,69 @@ class StatesCommitTest {
         throwsWith(IllegalArgumentException.class, () -> a.setID(new byte[] {'x'}), "0x78");
         wheel.createInstance().setID("x"); // another model
         throwsWith(IllegalArgumentException.class, () -> b.setID(7), "String or a byte[]", "java.lang.Integer");
-
-        byte[] id = (byte[]) b.getID();
-        id[0] = 'y';
+        ((byte[]) b.getID())[0] = 'y';
         assertArrayEquals(new byte[] {'x'}, (byte[]) b.getID());
         a.setID(null);
         b.setID("x"); // freed by a
         person.getInstances().remove(b);
         a.setID("x"); // freed by the removal
         assertEquals("x", b.getID());
+    }
+
+    private static ClassDef classDef(String name, String superName, String attr, AttributeType type) {
+        ClassDef c = new ClassDef(name);
+        c.setSuperName(superName);
+        if (attr != null) {
+            c.getAttributes().add(new AttributeDef(attr, type));
+        }
+        return c;
+    }
+
+    @Test
+    void stagingBuildsClassesInAnyOrderAndKeepsStates() {
+        Replica built = new Replica("built");
+        Instance bolt;
+        try (Staging st = new Staging(built)) {
+            Model b = st.addClass(classDef("Bolt", "Part", "thread", AttributeType.Integer));
+            Model p = st.addClass(classDef("Part", null, "made", AttributeType.Date));
+            p.classDef.attributes.items.get(0).accessMode = AccessMode.Read; // documents still fill it
+            st.schemaDone();
+            bolt = st.newInstance(b, "b1", false, true, false);
+            st.setValue(bolt, 0, new Date(1000));
+            st.setValue(bolt, 1, 8);
+            assertTrue(st.newInstance(p, "b1", false, false, true).isDeleted());
+            st.finish();
+        }
+        assertEquals(8, bolt.getValue("thread"));
+        assertEquals(new Date(1000), bolt.getValue("made"));
+        assertEquals("M,", states(bolt));
+        assertEquals("Replica 'built' (2 classes, 1 instances, 1 deleted)", built.toString());
+    }
+
+    @Test
+    void stagingNotFinishedIsUndone() {
+        Model part = addClass(r, "Part", null);
+        addAttr(part, "n", AttributeType.Integer, false);
+        Instance old = part.createInstance();
+        old.setID("p1");
+        String before = dump(r);
+        try (Staging st = new Staging(r)) {
+            Model nut = st.addClass(classDef("Nut", "Part", null, null));
+            st.schemaDone();
+            st.newInstance(nut, "n1", true, false, false);
+            st.newInstance(part, "p2", true, false, false);
+            throwsWith(IllegalArgumentException.class, () -> st.newInstance(part, "p1", false, false, false), "\"p1\"");
+            throwsWith(IllegalArgumentException.class, () -> st.setValue(part.instances.items[1], 0, "not an integer"),
+                    "takes Integer");
+        }
+        assertEquals(before, dump(r));
+        part.createInstance().setID("p2"); // the staged identifier is free again
+        try (Staging st = new Staging(r)) {
+            st.addClass(classDef("Loop1", "Loop2", null, null));
+            st.addClass(classDef("Loop2", "Loop1", null, null));
+            throwsWith(IllegalArgumentException.class, st::finish, "cyclic");
+        }
+        assertEquals(4, r.getModels().getCount());
+        assertEquals(1, part.createInstance().values.length);
     }
 }

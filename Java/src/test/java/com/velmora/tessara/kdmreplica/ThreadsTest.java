@@ -1,38 +1,22 @@
 package com.velmora.tessara.kdmreplica;
 
-import static com.velmora.tessara.kdmreplica.Fx.addAttr;
-import static com.velmora.tessara.kdmreplica.Fx.addClass;
-import static org.junit.jupiter.api.Assertions.assertEquals;
-import static org.junit.jupiter.api.Assertions.assertFalse;
-import static org.junit.jupiter.api.Assertions.assertSame;
-import static org.junit.jupiter.api.Assertions.assertTrue;
+import static com.velmora.tessara.kdmreplica.Fx.*;
+import static org.junit.jupiter.api.Assertions.*;
 
-import java.util.ArrayList;
-import java.util.List;
-import java.util.Random;
-import java.util.concurrent.ConcurrentLinkedQueue;
-import java.util.concurrent.CountDownLatch;
-import java.util.concurrent.ExecutorService;
-import java.util.concurrent.Executors;
-import java.util.concurrent.Future;
-import java.util.concurrent.TimeUnit;
+import java.util.*;
+import java.util.concurrent.*;
 import java.util.concurrent.atomic.AtomicInteger;
 import org.junit.jupiter.api.Test;
 
 /**
- * 8 threads read and 2 write one replica for a fixed number of operations (writers also change
- * the schema under the readers). The only exceptions allowed are the documented answers to a
- * race lost: a position that went out of range, an attribute that is gone, an instance deleted
- * by the other writer. Afterwards the replica must be consistent.
+ * 8 threads read and 2 write one replica for a fixed number of operations (writers also change the
+ * schema under the readers). The only exceptions allowed are the documented answers to a race lost:
+ * a position that went out of range, an attribute that is gone, an instance deleted by the other
+ * writer. Afterwards the replica must be consistent.
  */
 class ThreadsTest {
-    private static final int READERS = 8;
-    private static final int WRITERS = 2;
-    private static final int READ_OPS = 20_000;
-    private static final int WRITE_OPS = 3_000;
-    private static final int INITIAL = 200;
-
-    private final ConcurrentLinkedQueue<Throwable> unexpected = new ConcurrentLinkedQueue<>();
+    private static final int READERS = 8, WRITERS = 2, READ_OPS = 20_000, WRITE_OPS = 3_000, INITIAL = 200;
+    private final Queue<Throwable> unexpected = new ConcurrentLinkedQueue<>();
     private final AtomicInteger created = new AtomicInteger();
     private final AtomicInteger removed = new AtomicInteger();
 
@@ -76,7 +60,7 @@ class ThreadsTest {
         }
     }
 
-    private void write(int w, Replica r, Model part, Random rnd, int op) {
+    private void write(int w, Model part, Random rnd, int op) {
         InstanceSet set = part.getInstances();
         int choice = rnd.nextInt(10);
         if (choice < 5) {
@@ -85,8 +69,7 @@ class ThreadsTest {
             x.setID("w" + w + "-" + op);
             x.setValue("n", op);
             x.setValue("tags", new String[] {"a", "b"});
-            int n = set.getCount();
-            x.setValue("ref", set.getItem(rnd.nextInt(n)));
+            x.setValue("ref", set.getItem(rnd.nextInt(set.getCount())));
         } else if (choice < 8) {
             int n = set.getCount();
             if (n > INITIAL / 2) {
@@ -94,8 +77,7 @@ class ThreadsTest {
                 removed.incrementAndGet();
             }
         } else if (choice < 9) {
-            Instance x = set.getItem(rnd.nextInt(set.getCount()));
-            x.setValue("n", -op);
+            set.getItem(rnd.nextInt(set.getCount())).setValue("n", -op);
         } else if (w == 0) {
             AttributeDefList attrs = part.getClassDef().getAttributes();
             if (attrs.includes("extra")) {
@@ -110,17 +92,12 @@ class ThreadsTest {
 
     @Test
     void readersAndWritersEndConsistent() throws Exception {
-        Replica r = new Replica("shared");
-        Model part = addClass(r, "Part", null);
-        addAttr(part, "n", AttributeType.Integer, false);
-        addAttr(part, "tags", AttributeType.String, true);
-        addAttr(part, "ref", AttributeType.Relationship, false);
-        addAttr(part, "note", AttributeType.String, false);
+        Replica r = replica("shared", "Part: n Integer, tags String*, ref Relationship, note String");
+        Model part = r.getModels().getItem(0);
         for (int i = 0; i < INITIAL; i++) {
-            part.createInstance().setValue("n", i);
+            inst(part, "n", i);
         }
         r.commit();
-
         ExecutorService pool = Executors.newFixedThreadPool(READERS + WRITERS);
         CountDownLatch start = new CountDownLatch(1);
         List<Future<?>> done = new ArrayList<>();
@@ -132,7 +109,7 @@ class ThreadsTest {
                 for (int op = 0; op < (id < WRITERS ? WRITE_OPS : READ_OPS); op++) {
                     try {
                         if (id < WRITERS) {
-                            write(id, r, part, rnd, op);
+                            write(id, part, rnd, op);
                         } else {
                             read(r, part, rnd);
                         }
@@ -147,7 +124,6 @@ class ThreadsTest {
         }
         start.countDown();
         pool.shutdown();
-        // a generous bound that only a deadlock can reach
         assertTrue(pool.awaitTermination(120, TimeUnit.SECONDS), "threads did not finish: deadlock?");
         for (Future<?> f : done) {
             f.get();
@@ -157,31 +133,24 @@ class ThreadsTest {
             unexpected.stream().limit(5).forEach(e::addSuppressed);
             throw e;
         }
-
         // consistency: counts, positions, layouts, identifier map
         InstanceSet set = part.getInstances();
         assertEquals(INITIAL + created.get() - removed.get(), set.getCount());
         int withId = 0;
-        int layout = part.getClassDef().layout.length;
         for (int k = 0; k < set.count; k++) {
             Instance x = set.items[k];
             assertEquals(k, x.pos);
             assertFalse(x.isDeleted());
-            assertEquals(layout, x.values.length);
+            assertEquals(part.getClassDef().layout.length, x.values.length);
             if (x.id != null) {
                 withId++;
                 assertSame(x, part.ids.get(x.id));
             }
-        }
-        assertEquals(withId, part.ids == null ? 0 : part.ids.size());
-        // references to instances removed meanwhile are the only thing commit may refuse
-        for (int k = 0; k < set.count; k++) {
-            Instance x = set.items[k];
-            Object ref = x.getValue("ref");
-            if (ref != null && ((Instance) ref).isDeleted()) {
-                x.clearValue("ref");
+            if (x.getValue("ref") != null && ((Instance) x.getValue("ref")).isDeleted()) {
+                x.clearValue("ref"); // references to instances removed meanwhile are the only thing commit may refuse
             }
         }
+        assertEquals(withId, part.ids == null ? 0 : part.ids.size());
         r.commit();
         assertFalse(r.toString().contains("deleted"), r.toString());
     }
