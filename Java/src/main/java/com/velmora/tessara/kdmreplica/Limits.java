@@ -67,7 +67,7 @@ final class Limits {
 
     /** The refusal of something past a limit: what, the limit, and how to raise it. */
     static String exceeded(String what, String name, long limit) {
-        return what + " exceeds the limit " + name + " = " + limit + " (raise it with Replica.setLimit(\"" + name
+        return what + " is past the limit " + name + " = " + limit + " (raise it with Replica.setLimit(\"" + name
                 + "\", n) or VLXKDMReplica::SetLimit)";
     }
 
@@ -143,7 +143,7 @@ final class Limits {
                         if (++matched == XMLNS.length()) {
                             matched = 0;
                             if (++namespaces > maxNamespaces) {
-                                throw new Exceeded(exceeded("the namespace declarations on one element",
+                                throw new Exceeded(exceeded("the count of namespace declarations on one element",
                                         "maxNamespaceDeclarations", maxNamespaces));
                             }
                         }
