@@ -45,6 +45,11 @@ class VLXJBXJNIHelper {
     return env->CallStaticObjectMethod(cls, method, args...);
   }
   template <class... A>
+  static jlong CallStaticLongMethod(JNIEnv* env, jclass cls, jmethodID method, A... args)
+  {
+    return env->CallStaticLongMethod(cls, method, args...);
+  }
+  template <class... A>
   static void CallStaticVoidMethod(JNIEnv* env, jclass cls, jmethodID method, A... args)
   {
     env->CallStaticVoidMethod(cls, method, args...);

@@ -52,6 +52,22 @@ class CORVEXA_API VLXKDMReplica : public VLXKDMJavaObject {
   // against the replica's schema; default off) or "indent" (indent XML output; default on). Needs
   // no proxy; an unknown name fails, listing the known ones.
   static long SetFeature(const VLXUnicodeString& name, VLXBoolean value);
+  // Sets or reads a process-wide limit on what reading a document may cost; a document past a
+  // limit is refused with a last error naming the limit. Limits and defaults: "maxDocumentSize"
+  // (bytes of an XML or XSD file, characters of a string; 1 GiB), "maxElementDepth" (256),
+  // "maxNamespaceDeclarations" (on one element; 100), "maxAttributeLength" (characters of one
+  // attribute value as written; 1 Mi), "maxTextLength" (characters of one text as written;
+  // 256 Mi), "maxInflatedSize" (bytes a compressed binary replica may inflate to; 1 GiB),
+  // "maxInflateRatio" (times its compressed size, checked past 64 MiB; 200). Needs no proxy; an
+  // unknown name or a value below 1 fails.
+  static long SetLimit(const VLXUnicodeString& name, long long value);
+  static long GetLimit(const VLXUnicodeString& name, long long& value);
+  // Sets the folder from which a document's schema location may also be read, for the whole
+  // process: a document given as a string reads its schema file only from there, a document file
+  // from its own folder or there. Empty (the default): a string reads no schema file.
+  static long SetSchemaFolder(const VLXUnicodeString& folder);
+  // The folder set (absolute), or empty.
+  static long GetSchemaFolder(VLXUnicodeString& folder);
 
   // Adds the class definitions of an XSD file or text to the schema, with an empty model for each.
   long InsertSchemaFile(const VLXUnicodeString& path);

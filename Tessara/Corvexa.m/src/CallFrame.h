@@ -310,6 +310,8 @@ class Bound {
                 return VLXJBXJNIHelper::CallStaticVoidMethod(env, st.Class(_call._class), method, j...);
               else if constexpr (std::is_same_v<Raw, jobject>)
                 return VLXJBXJNIHelper::CallStaticObjectMethod(env, st.Class(_call._class), method, j...);
+              else if constexpr (std::is_same_v<Raw, jlong>)
+                return VLXJBXJNIHelper::CallStaticLongMethod(env, st.Class(_call._class), method, j...);
               break;
             case Target::Handle: {
               const jobject self = _call._self->GetHandle();

@@ -125,6 +125,9 @@ struct ArgOf<VLXBinary> : ConvertedArg<VLXBinary, jbyteArray> {
 template <>
 struct ArgOf<int> : PassedArg<jint> {
 };
+template <>
+struct ArgOf<long long> : PassedArg<jlong> {
+};
 // Any non-zero byte is true: Java sees only 0 or 1.
 template <>
 struct ArgOf<VLXBoolean> {
@@ -200,6 +203,9 @@ struct ResultOf<VLXBinary> : ConvertedResult<VLXBinary> {
 };
 template <>
 struct ResultOf<int> : PrimitiveResult<int, jint> {
+};
+template <>
+struct ResultOf<long long> : PrimitiveResult<long long, jlong> {
 };
 template <>
 struct ResultOf<VLXBoolean> : PrimitiveResult<VLXBoolean, jboolean> {

@@ -83,6 +83,33 @@ long VLXKDMReplica::SetFeature(const VLXUnicodeString& name, VLXBoolean value)
       .run();
 }
 
+long VLXKDMReplica::SetLimit(const VLXUnicodeString& name, long long value)
+{
+  return CallStatic("VLXKDMReplica::SetLimit(const VLXUnicodeString&, long long)", Replica, slot<Replica_setLimit>)
+      .with(name, value)
+      .run();
+}
+
+long VLXKDMReplica::GetLimit(const VLXUnicodeString& name, long long& value)
+{
+  return CallStatic("VLXKDMReplica::GetLimit(const VLXUnicodeString&, long long&)", Replica, slot<Replica_getLimit>)
+      .with(name)
+      .returning(value);
+}
+
+long VLXKDMReplica::SetSchemaFolder(const VLXUnicodeString& folder)
+{
+  return CallStatic("VLXKDMReplica::SetSchemaFolder(const VLXUnicodeString&)", Replica, slot<Replica_setSchemaFolder>)
+      .with(folder)
+      .run();
+}
+
+long VLXKDMReplica::GetSchemaFolder(VLXUnicodeString& folder)
+{
+  return CallStatic("VLXKDMReplica::GetSchemaFolder(VLXUnicodeString&)", Replica, slot<Replica_getSchemaFolder>)
+      .returning(folder);
+}
+
 long VLXKDMReplica::InsertSchemaFile(const VLXUnicodeString& path)
 {
   return Call(*this, "VLXKDMReplica::InsertSchemaFile(const VLXUnicodeString&)", slot<Replica_insertSchemaFile>)

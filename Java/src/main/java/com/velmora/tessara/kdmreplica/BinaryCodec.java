@@ -45,7 +45,9 @@ import java.util.zip.Inflater;
  * Every count and length is checked against the bytes that remain before anything is allocated
  * from it (with the bytes that counted instances still owe for their presence bitmaps); a
  * compressed payload is inflated in growing steps and never past its announced length, which must
- * itself stay under {@link #MAX_INFLATED} and {@link #MAX_INFLATE_RATIO} times the compressed size.
+ * itself stay under {@link #MAX_INFLATED} and {@link #MAX_INFLATE_RATIO} times the compressed size, and
+ * under the limits "maxInflatedSize" and "maxInflateRatio" ({@link Limits}), before anything is
+ * inflated.
  * Super class chains are resolved without recursion and limited to {@link #MAX_SUPER_DEPTH}; the
  * class layouts together may hold at most {@link #layoutLimit} attribute slots. Every failure is a
  * {@link ReplicaBinaryException} naming what and where; the replica being built is dropped.
@@ -219,6 +221,14 @@ final class BinaryCodec {
             if (payloadLength > cap) {
                 throw header("the header announces " + payloadLength + " bytes once inflated, more than the cap of "
                         + cap + " bytes for " + stored + " compressed bytes", 8);
+            }
+            if (payloadLength > Limits.get("maxInflatedSize")) {
+                throw header(Limits.exceeded("an inflated size of " + payloadLength + " bytes", "maxInflatedSize",
+                        Limits.get("maxInflatedSize")), 8);
+            }
+            if (payloadLength > Limits.inflateCap(stored)) {
+                throw header(Limits.exceeded("inflating " + stored + " bytes to " + payloadLength + " bytes",
+                        "maxInflateRatio", Limits.get("maxInflateRatio")), 8);
             }
             payload = inflate(bytes, HEADER_SIZE, (int) stored, (int) payloadLength);
             start = 0;

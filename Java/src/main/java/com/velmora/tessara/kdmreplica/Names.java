@@ -1,5 +1,6 @@
 package com.velmora.tessara.kdmreplica;
 
+import java.util.List;
 import java.util.concurrent.atomic.AtomicLong;
 
 /** Name rules and generated names. */
@@ -54,5 +55,15 @@ final class Names {
             }
         }
         return copy;
+    }
+
+    /** Names joined by " -> " for a message; past ten, the middle is left out and counted. */
+    static String chain(List<String> names) {
+        int n = names.size();
+        if (n <= 10) {
+            return String.join(" -> ", names);
+        }
+        return String.join(" -> ", names.subList(0, 5)) + " -> ... (" + (n - 8) + " more) -> "
+                + String.join(" -> ", names.subList(n - 3, n));
     }
 }

@@ -23,11 +23,11 @@ import java.util.function.Function;
  * {@link ReplicaCommitException} listing the violations, changing nothing, or forgets the deleted
  * instances and clears the created and modified flags.
  *
- * <p>Process-wide settings: {@link #setFeature} and {@link #setSchemaLocation}.
+ * <p>Process-wide settings: {@link #setFeature}, {@link #setLimit}, {@link #setSchemaLocation} and
+ * {@link #setSchemaFolder}.
  *
- * <p>Files: a relative path given to a member (and a relative schema location of a document
- * given as a string) is taken from the process's current directory at the time of the call, so
- * it follows a change of directory by native code. Only regular files are read: a directory, pipe
+ * <p>Files: a relative path given to a member is taken from the process's current directory at
+ * the time of the call, so it follows a change of directory by native code. Only regular files are read: a directory, pipe
  * or device is refused unopened.
  */
 public class Replica {
@@ -38,6 +38,8 @@ public class Replica {
     private static final Map<String, Boolean> FEATURES = Collections.synchronizedMap(new LinkedHashMap<>());
     /** The process-wide schema location (read by the XML writer). */
     static volatile String processSchemaLocation = "";
+    /** The folder schema locations may also be read from ({@link #setSchemaFolder}), or "". */
+    static volatile String schemaFolder = "";
 
     static {
         LinkedHashMap<String, Boolean> d = new LinkedHashMap<>();
@@ -103,6 +105,41 @@ public class Replica {
                     + String.join(", ", FEATURE_DEFAULTS.keySet()));
         }
         return v;
+    }
+
+    /**
+     * Sets a process-wide limit on what reading a document may cost; each refusal names the limit.
+     * Known limits and defaults: "maxDocumentSize" (bytes of an XML or XSD file, characters of a
+     * string; 1 GiB), "maxElementDepth" (256), "maxNamespaceDeclarations" (on one element; 100),
+     * "maxAttributeLength" (characters of one attribute value as written; 1 Mi), "maxTextLength"
+     * (characters of one text between tags as written; 256 Mi), "maxInflatedSize" (bytes a
+     * compressed binary replica may inflate to; 1 GiB) and "maxInflateRatio" (times its compressed
+     * size, checked only past 64 MiB; 200). A limit applies to reads that start after it is set.
+     *
+     * @throws IllegalArgumentException for an unknown name (listing the known ones) or a value below 1
+     */
+    public static void setLimit(String limit, long value) {
+        Limits.set(limit, value);
+    }
+
+    /** The current value of a process-wide limit. @throws IllegalArgumentException for an unknown name */
+    public static long getLimit(String limit) {
+        return Limits.get(limit);
+    }
+
+    /**
+     * Sets the process-wide folder from which the schema location of a document may also be read:
+     * a document given as a string reads its schema file only from there (relative locations are
+     * taken from it), a document file from its own folder or there. Null or "" (the default): a
+     * string document reads no schema file, a document file only from its own folder.
+     */
+    public static void setSchemaFolder(String folder) {
+        schemaFolder = Names.orEmpty(folder).isEmpty() ? "" : XmlInput.callerPath(folder).toString();
+    }
+
+    /** The folder set by {@link #setSchemaFolder} (absolute), or "". */
+    public static String getSchemaFolder() {
+        return schemaFolder;
     }
 
     /** Sets the process-wide schema location written into XML output (null: none, stored as ""). */
@@ -352,8 +389,9 @@ public class Replica {
 
     /**
      * Checks the whole replica: mandatory attributes valuated, unique attributes unique within
-     * their class (and its subclasses), no reference to a deleted instance or to one outside the
-     * replica, no live instance of an abstract class. On success forgets the deleted instances and
+     * their class (and its subclasses), no reference to a deleted instance, to one outside the
+     * replica or to one not of a target class, no value longer than its attribute's length (a
+     * document or binary replica may have loaded one), no live instance of an abstract class. On success forgets the deleted instances and
      * clears every created and modified flag.
      *
      * @throws ReplicaCommitException listing every violation (up to {@link #MAX_LISTED_VIOLATIONS});
@@ -394,7 +432,18 @@ public class Replica {
                                 } else if (t.model == null || t.model.replica != this) {
                                     violation(listed, total, x.describe() + ": attribute '" + def.qualifiedName()
                                             + "' refers to " + t.describe() + ", which is not in the replica");
+                                } else if (!Values.isTarget(def.targetNames, t.model.classDef, models)) {
+                                    violation(listed, total, x.describe() + ": attribute '" + def.qualifiedName()
+                                            + "' refers to " + t.describe() + ", which is not of a target class "
+                                            + Arrays.toString(def.targetNames));
                                 }
+                            }
+                        } else if (def.length > 0) {
+                            int longest = Values.longest(v);
+                            if (longest > def.length) {
+                                violation(listed, total, x.describe() + ": attribute '" + def.qualifiedName()
+                                        + "' holds at most " + def.length + (def.type == AttributeType.Binary
+                                        ? " bytes" : " characters") + " but has a value of " + longest);
                             }
                         }
                         if (def.unique) {

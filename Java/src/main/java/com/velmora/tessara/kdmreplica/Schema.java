@@ -37,8 +37,14 @@ final class Schema {
             return known;
         }
         if (!path.add(c.name)) {
-            throw new IllegalArgumentException("replica '" + r.name + "': class '" + c.name
-                    + "' has a cyclic super class chain: " + String.join(" -> ", path) + " -> " + c.name);
+            List<String> names = new ArrayList<>(path);
+            names.add(c.name);
+            throw new IllegalArgumentException("replica '" + r.name + "': class '" + names.get(0)
+                    + "' has a cyclic super class chain: " + Names.chain(names));
+        }
+        if (path.size() > BinaryCodec.MAX_SUPER_DEPTH) {
+            throw new IllegalArgumentException("replica '" + r.name + "': the super class chain of class '"
+                    + path.iterator().next() + "' is longer than " + BinaryCodec.MAX_SUPER_DEPTH + " classes");
         }
         List<AttributeDef> all = new ArrayList<>();
         if (!c.superName.isEmpty()) {

@@ -1,12 +1,16 @@
 package com.velmora.tessara.kdmreplica;
 
 import java.io.ByteArrayOutputStream;
+import java.io.IOException;
 import java.net.URI;
 import java.net.URISyntaxException;
 import java.nio.charset.StandardCharsets;
+import java.nio.file.Files;
 import java.nio.file.InvalidPathException;
 import java.nio.file.Path;
 import java.nio.file.Paths;
+import java.util.ArrayList;
+import java.util.List;
 import java.util.regex.Pattern;
 
 /**
@@ -108,5 +112,54 @@ final class SchemaLocations {
             throw new IllegalArgumentException("the schema location '" + XmlNames.clip(decoded) + "' is not a valid path: "
                     + e.getMessage(), e);
         }
+    }
+
+    /**
+     * The file a document's schema location names, confined to the document's own folder and the
+     * schema folder ({@link Replica#setSchemaFolder}; for a document given as a string, the only
+     * place, and relative locations are taken from it). The file must be a regular file whose real
+     * path lies in one of them. Whatever the reason, the refusal reads the same, so that it does not
+     * tell which files exist elsewhere; a location outside both is refused without any access.
+     *
+     * @param documentDir the folder of the document's file, or null for a string
+     * @throws IllegalArgumentException for a location that is refused
+     */
+    static Path confined(String decoded, Path documentDir, String schemaFolder) {
+        List<Path> allowed = new ArrayList<>();
+        if (documentDir != null) {
+            allowed.add(documentDir);
+        }
+        if (!schemaFolder.isEmpty()) {
+            allowed.add(Paths.get(schemaFolder));
+        }
+        String clipped = XmlNames.clip(decoded);
+        if (allowed.isEmpty()) {
+            throw new IllegalArgumentException("the schema location '" + clipped + "' is refused: a document given as"
+                    + " a string reads no schema file unless a schema folder is set (Replica.setSchemaFolder,"
+                    + " VLXKDMReplica::SetSchemaFolder); nothing was read");
+        }
+        IllegalArgumentException refused = new IllegalArgumentException("the schema location '" + clipped
+                + "' is refused: only a regular file in " + (allowed.size() == 1 ? "'" + allowed.get(0) + "'"
+                : "'" + allowed.get(0) + "' or '" + allowed.get(1) + "'") + " is read as a document's schema");
+        Path p = localFile(decoded, allowed.get(0));
+        if (allowed.stream().noneMatch(p::startsWith)) {
+            throw refused;
+        }
+        Path real;
+        try {
+            real = p.toRealPath();
+        } catch (IOException | SecurityException e) {
+            throw refused;
+        }
+        for (Path dir : allowed) {
+            try {
+                if (real.startsWith(dir.toRealPath()) && Files.isRegularFile(real)) {
+                    return real;
+                }
+            } catch (IOException | SecurityException e) {
+                // a folder that is not there allows nothing
+            }
+        }
+        throw refused;
     }
 }

@@ -67,37 +67,52 @@ final class XmlInput {
             return new Src(null, p, kind + " file '" + p + "'");
         }
 
-        /** The directory that relative names in this input are resolved against (now, for a string). */
-        Path baseDir() {
-            return file != null ? file.getParent() : currentDir();
-        }
-
         In open() {
             XMLInputFactory f = inputFactory();
+            Limits.Scan scan = new Limits.Scan();
+            InputStream s = null;
+            In in;
             try {
                 if (file == null) {
-                    return new In(f.createXMLStreamReader(new StringReader(text)), this, null);
+                    scan.sized(text.length(), "characters");
+                    StringReader rd = new StringReader(text);
+                    if (text.startsWith("\uFEFF")) {
+                        rd.skip(1); // a byte order mark, as a file may start with
+                    }
+                    in = new In(f.createXMLStreamReader(Limits.scanned(rd, scan)), this, null);
+                } else {
+                    // checked before opening: opening a pipe blocks, a device may never end
+                    if (!Files.isRegularFile(file) && Files.exists(file)) {
+                        throw new IllegalArgumentException("cannot read " + name + ": it is not a regular file (a"
+                                + " directory, pipe or device is not read)");
+                    }
+                    try {
+                        scan.sized(Files.size(file), "bytes");
+                        s = new BufferedInputStream(Files.newInputStream(file), 1 << 16);
+                    } catch (Limits.Exceeded e) {
+                        throw e;
+                    } catch (IOException e) {
+                        throw new IllegalArgumentException("cannot read " + name + ": " + describe(e), e);
+                    }
+                    in = new In(f.createXMLStreamReader(file.toUri().toString(), Limits.scanned(s, scan)), this, s);
                 }
-                // checked before opening: opening a pipe blocks, a device may never end
-                if (!Files.isRegularFile(file) && Files.exists(file)) {
-                    throw new IllegalArgumentException("cannot read " + name + ": it is not a regular file (a"
-                            + " directory, pipe or device is not read)");
-                }
-                InputStream s;
-                try {
-                    s = new BufferedInputStream(Files.newInputStream(file), 1 << 16);
-                } catch (IOException e) {
-                    throw new IllegalArgumentException("cannot read " + name + ": " + describe(e), e);
-                }
-                try {
-                    return new In(f.createXMLStreamReader(file.toUri().toString(), s), this, s);
-                } catch (XMLStreamException | RuntimeException e) {
-                    closeQuietly(s);
-                    throw e;
-                }
+            } catch (Limits.Exceeded e) {
+                closeQuietly(s);
+                throw new XmlDocumentException(name, -1, -1, e.getMessage(), e);
             } catch (XMLStreamException e) {
+                closeQuietly(s);
                 throw In.wrap(this, e);
+            } catch (IOException | RuntimeException e) {
+                closeQuietly(s);
+                throw e instanceof RuntimeException ? (RuntimeException) e
+                        : new IllegalArgumentException("cannot read " + name + ": " + describe((IOException) e), e);
             }
+            if ("1.1".equals(in.r.getVersion())) {
+                in.close();
+                throw new XmlDocumentException(name, 1, 1, "the document is XML 1.1; only XML 1.0 documents are read",
+                        null);
+            }
+            return in;
         }
 
         /**
@@ -201,7 +216,9 @@ final class XmlInput {
 
     private static void closeQuietly(InputStream s) {
         try {
-            s.close();
+            if (s != null) {
+                s.close();
+            }
         } catch (IOException ignored) {
             // nothing more to do with a stream that failed to open
         }
@@ -238,6 +255,8 @@ final class XmlInput {
         final String source;
         private final Src src;
         private final InputStream stream;
+        private final long maxDepth = Limits.get("maxElementDepth");
+        private long depth;
 
         In(XMLStreamReader r, Src src, InputStream stream) {
             this.r = r;
@@ -253,6 +272,11 @@ final class XmlInput {
          */
         static XmlDocumentException wrap(Src src, XMLStreamException e) {
             Location l = e.getLocation();
+            Limits.Exceeded over = exceeded(e);
+            if (over != null) {
+                return new XmlDocumentException(src.name, l == null ? -1 : l.getLineNumber(),
+                        l == null ? -1 : l.getColumnNumber(), over.getMessage(), over);
+            }
             int line = l == null ? -1 : l.getLineNumber();
             int column = l == null ? -1 : l.getColumnNumber();
             String m = e.getMessage() == null ? e.toString() : e.getMessage();
@@ -269,6 +293,19 @@ final class XmlInput {
                 }
             }
             return new XmlDocumentException(src.name, line, column, "the input is not well-formed XML: " + m, e);
+        }
+
+        /** The limit that stopped the parser, when one did. */
+        private static Limits.Exceeded exceeded(Throwable e) {
+            Throwable c = e;
+            for (int i = 0; c != null && i < 8; i++) {
+                if (c instanceof Limits.Exceeded) {
+                    return (Limits.Exceeded) c;
+                }
+                c = c.getCause() != null ? c.getCause()
+                        : c instanceof XMLStreamException ? ((XMLStreamException) c).getNestedException() : null;
+            }
+            return null;
         }
 
         private static final Pattern MESSAGE_KEY = Pattern.compile("http://www\\.w3\\.org/TR/[^#\\s]*#(\\w+)\\?(.*)");
@@ -312,7 +349,14 @@ final class XmlInput {
                 throw wrap(src, x);
             } catch (RuntimeException x) {
                 // The JDK reader reports some malformed input (bad encodings) unchecked.
-                throw new XmlDocumentException(source, -1, -1, "the input cannot be read as XML: " + x, x);
+                Limits.Exceeded over = exceeded(x);
+                throw new XmlDocumentException(source, -1, -1, over != null ? over.getMessage()
+                        : "the input cannot be read as XML: " + x, x);
+            }
+            if (e == XMLStreamConstants.START_ELEMENT && ++depth > maxDepth) {
+                throw fail(Limits.exceeded("the element depth", "maxElementDepth", maxDepth));
+            } else if (e == XMLStreamConstants.END_ELEMENT) {
+                depth--;
             }
             if (e == XMLStreamConstants.DTD) {
                 throw fail("the document has a DOCTYPE declaration; documents with a DOCTYPE (DTDs, entity"

@@ -17,13 +17,14 @@ import javax.xml.stream.XMLStreamConstants;
  *
  * <p>Schema: a new replica takes the {@code xs:schema} embedded as the document's first child,
  * or else the local file named by the document's {@code xsi:schemaLocation} for the replica
- * namespace (relative to the document's file, or to the current directory for a string; URLs are
- * refused unread). Locations for other namespaces are ignored. Populating an existing replica
+ * namespace, confined to the document's own folder and the schema folder
+ * ({@link SchemaLocations#confined}; URLs are refused unread). Locations for other namespaces are ignored. Populating an existing replica
  * reads no schema: its classes must be known, an embedded schema is skipped.
  *
  * <p>Instances without {@code state} are loaded unchanged; {@code state} gives created, modified
  * or deleted. Values are loaded as written: the reader does not apply attribute lengths (a
- * document may hold values longer than the lengths of the schema it is read with); the "validate"
+ * document may hold values longer than the lengths of the schema it is read with, and stays
+ * readable), {@link Replica#commit} refuses such values until they are mended; the "validate"
  * feature checks the whole document against the replica's schema.
  */
 final class XmlReader {
@@ -212,7 +213,8 @@ final class XmlReader {
                 }
                 Path file;
                 try {
-                    file = SchemaLocations.localFile(location, src.baseDir());
+                    file = SchemaLocations.confined(location, src.file == null ? null : src.file.getParent(),
+                            Replica.schemaFolder);
                 } catch (IllegalArgumentException x) {
                     throw new XmlDocumentException(in.source, locLine, locColumn, x.getMessage(), x);
                 }

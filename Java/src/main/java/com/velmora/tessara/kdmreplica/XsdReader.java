@@ -9,9 +9,9 @@ import java.io.IOException;
 import java.nio.file.Files;
 import java.nio.file.Path;
 import java.util.ArrayList;
+import java.util.HashMap;
 import java.util.HashSet;
 import java.util.LinkedHashMap;
-import java.util.LinkedHashSet;
 import java.util.List;
 import java.util.Map;
 import java.util.Set;
@@ -807,11 +807,37 @@ final class XsdReader {
                             + t.name + "' is not defined (neither in the schema nor in replica '" + r.name + "')", null);
                 }
             }
-            LinkedHashSet<String> chain = new LinkedHashSet<>();
+        }
+        Map<String, Integer> depths = new HashMap<>(); // 0 while its chain is being walked
+        List<DeclaredType> path = new ArrayList<>();
+        for (DeclaredType t : types) {
+            int d = 0;
+            path.clear();
             for (DeclaredType c = t; c != null; c = c.base == null ? null : byName.get(c.base)) {
-                if (!chain.add(c.name)) {
-                    throw at(t, t.line, t.column, "class '" + t.name + "' has a cyclic super class chain: "
-                            + String.join(" -> ", chain) + " -> " + c.name, null);
+                Integer known = depths.putIfAbsent(c.name, 0);
+                if (known != null) {
+                    if (known == 0) {
+                        List<String> names = new ArrayList<>();
+                        path.forEach(x -> names.add(x.name));
+                        names.add(c.name);
+                        throw at(t, t.line, t.column, "class '" + t.name + "' has a cyclic super class chain: "
+                                + Names.chain(names), null);
+                    }
+                    d = known;
+                    break;
+                }
+                path.add(c);
+                if (c.base != null && !byName.containsKey(c.base)) {
+                    for (ClassDef s = r.models.byName.get(c.base).classDef; s != null; s = r.models.superOf(s)) {
+                        d++;
+                    }
+                }
+            }
+            for (int i = path.size() - 1; i >= 0; i--) {
+                depths.put(path.get(i).name, ++d);
+                if (d > BinaryCodec.MAX_SUPER_DEPTH) {
+                    throw at(t, t.line, t.column, "the super class chain of class '" + path.get(i).name + "' is longer"
+                            + " than " + BinaryCodec.MAX_SUPER_DEPTH + " classes", null);
                 }
             }
         }
