@@ -1,12 +1,7 @@
 // Attribute values and identifiers of instances of a real replica: the variadic setters against the
 // list setters, dates and booleans as written, what the native side refuses, and what it leaves
 // alone when it fails. (Values of every type cross through the converters of values/.)
-#include <climits>
 #include <functional>
-#include <string>
-#include <vector>
-
-#include <gtest/gtest.h>
 
 #include "TestSupport.h"
 
@@ -92,7 +87,6 @@ TEST(ValueFailures, AClassOutsideTheTableIsReportedAndFails)
     EXPECT_LT(rc, 0);
     ASSERT_FALSE(FatalRecorder::Reports().empty());
     EXPECT_EQ("AssertionFailed:_type != (Type) -1", FatalRecorder::Reports()[0].message);
-    EXPECT_EQ(99, FatalRecorder::Reports()[0].line);
     EXPECT_EQ(static_cast<VLXKDMInstanceValue::Type>(-1), value.GetType());
   }
 }

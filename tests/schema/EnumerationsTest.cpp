@@ -8,8 +8,6 @@ namespace {
 
 const char* const kNullAttributeDef = "com/velmora/tessara/testdoubles/NullSchema$AttributeDef";
 const char* const kNullClassDef = "com/velmora/tessara/testdoubles/NullSchema$ClassDefinition";
-const char* const kAttributeDefSource = "Tessara\\Corvexa.m\\src\\VLXKDMAttributeDef.cpp";
-const char* const kClassDefSource = "Tessara\\Corvexa.m\\src\\VLXKDMClassDef.cpp";
 
 // Sets each enumerator through the setter and reads it back through the getter.
 template <class E, class Proxy>
@@ -62,11 +60,11 @@ int Got(Proxy& proxy, long (Proxy::*get)(E&), int sentinel)
   return value;
 }
 
-// Null answers give the defaults, but leave the aggregation alone; object getters detach.
+// Null answers give the defaults, but leave the aggregation alone.
 TEST(Enumerations, NullAnswersGiveTheDefaultsButLeaveTheAggregationAlone)
 {
   VLXKDMAttributeDef attribute;
-  VLXKDMClassDef classDef, real;
+  VLXKDMClassDef classDef;
   AttachNew(attribute, kNullAttributeDef);
   AttachNew(classDef, kNullClassDef);
   EXPECT_EQ(VLXKDMAttributeType::String, Got(attribute, &VLXKDMAttributeDef::GetAttributeType, 5));
@@ -75,22 +73,12 @@ TEST(Enumerations, NullAnswersGiveTheDefaultsButLeaveTheAggregationAlone)
   EXPECT_EQ(VLXKDMAggregationType::Shared, Got(attribute, &VLXKDMAttributeDef::GetAggregationType, 1));
   EXPECT_EQ(VLXKDMClassType::Class, Got(classDef, &VLXKDMClassDef::GetClassType, 1));
   EXPECT_EQ(VLXKDMVisibility::Public, Got(classDef, &VLXKDMClassDef::GetSoftwareVisibility, 1));
-
-  ASSERT_EQ(VLX_S_OK, real.Build(U("Real")));
-  VLXKDMAttributeDefList attributes;
-  ASSERT_EQ(VLX_S_OK, real.GetAttributes(attributes));
-  EXPECT_EQ(VLX_S_OK, classDef.GetAttributes(attributes));
-  EXPECT_EQ(nullptr, attributes.GetHandle());
-  EXPECT_EQ(VLX_S_OK, attribute.GetClassDef(real));
-  EXPECT_EQ(nullptr, real.GetHandle());
 }
 
 struct OutOfRange {
   const char* what;
   std::function<long()> call;
   const char* message;
-  const char* file;
-  int line;
 };
 
 TEST(Enumerations, ValuesOutOfRangeAreReportedAndNeverReachJava)
@@ -102,20 +90,20 @@ TEST(Enumerations, ValuesOutOfRangeAreReportedAndNeverReachJava)
   VLXKDMAttributeDef built;
   const std::vector<OutOfRange> cases = {
       {"SetAccessMode(3)", [&] { return attribute.SetAccessMode(static_cast<VLXKDMAccessMode::Mode>(3)); },
-       "AssertionFailed:mode != NULL", kAttributeDefSource, 245},
+       "AssertionFailed:mode != NULL"},
       {"SetAggregationType(-1)",
        [&] { return attribute.SetAggregationType(static_cast<VLXKDMAggregationType::Type>(-1)); },
-       "AssertionFailed:agg != NULL", kAttributeDefSource, 139},
+       "AssertionFailed:agg != NULL"},
       {"AttributeDef SetSoftwareVisibility(3)",
        [&] { return attribute.SetSoftwareVisibility(static_cast<VLXKDMVisibility::Mode>(3)); },
-       "AssertionFailed:vis != NULL", kAttributeDefSource, 290},
+       "AssertionFailed:vis != NULL"},
       {"SetClassType(2)", [&] { return classDef.SetClassType(static_cast<VLXKDMClassType::Type>(2)); },
-       "AssertionFailed:type != NULL", kClassDefSource, 341},
+       "AssertionFailed:type != NULL"},
       {"ClassDef SetSoftwareVisibility(7)",
        [&] { return classDef.SetSoftwareVisibility(static_cast<VLXKDMVisibility::Mode>(7)); },
-       "AssertionFailed:vis != NULL", kClassDefSource, 211},
-      {"Build(name, 7)", [&] { return built.Build(VLXUnicodeString("x"), static_cast<VLXKDMAttributeType::Type>(7)); },
-       "AssertionFailed:type != NULL", kAttributeDefSource, 41},
+       "AssertionFailed:vis != NULL"},
+      {"Build(name, 7)", [&] { return built.Build(U("x"), static_cast<VLXKDMAttributeType::Type>(7)); },
+       "AssertionFailed:type != NULL"},
   };
   for (const OutOfRange& c : cases) {
     SCOPED_TRACE(c.what);
@@ -124,8 +112,6 @@ TEST(Enumerations, ValuesOutOfRangeAreReportedAndNeverReachJava)
     EXPECT_LT(rc, 0);
     ASSERT_EQ(1u, FatalRecorder::Reports().size());
     EXPECT_EQ(c.message, FatalRecorder::Reports()[0].message);
-    EXPECT_EQ(c.file, FatalRecorder::Reports()[0].file);
-    EXPECT_EQ(c.line, FatalRecorder::Reports()[0].line);
     EXPECT_NE(std::string::npos, PeekLastError().text.find("none of its enumerators")) << PeekLastError().text;
   }
   EXPECT_EQ(0, IntField(attribute.GetHandle(), "setterCalls"));

@@ -166,7 +166,7 @@ TEST_F(InstanceList, QuickSortMovesOnlyPointersAndCompareComparesPositionByPosit
   gOrder = nullptr;
 }
 
-TEST_F(InstanceList, AHundredThousandElementsAreCopiedCrossToJavaAndAreReleased)
+TEST_F(InstanceList, AHundredThousandElementsAreCopiedAndReleased)
 {
   VLXListValVLXKDMInstance list(100000);
   for (int i = 0; i < 100000; ++i) list.Append(o[static_cast<size_t>(i % 5)]);
@@ -175,12 +175,6 @@ TEST_F(InstanceList, AHundredThousandElementsAreCopiedCrossToJavaAndAreReleased)
   EXPECT_EQ(baseline + 200000, GlobalRefCount());
   EXPECT_EQ(99995, copy.RemoveDuplicates());
   EXPECT_EQ("ABCDE", Letters(copy));
-  VLXKDMInstanceValue value, read;
-  value.SetListOfInstance(list);
-  ASSERT_EQ(VLX_S_OK, value.BuildRemote());
-  ASSERT_EQ(VLX_S_OK, read.SetHandle(Env(), value.GetHandle()));
-  ASSERT_EQ(VLX_S_OK, read.BuildLocal());
-  EXPECT_TRUE(read.GetListOfInstance() == list);
   list.Size(10, nullptr);
   EXPECT_EQ(10, list.Size());
 }
