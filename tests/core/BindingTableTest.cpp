@@ -3,9 +3,6 @@
 #include <fstream>
 #include <map>
 #include <regex>
-#include <string>
-
-#include <gtest/gtest.h>
 
 #include "CallFrame.h"
 #include "TestSupport.h"

@@ -1,9 +1,5 @@
 // The call frame as a caller sees it: results, out-parameters, last errors and Java exceptions.
 #include <functional>
-#include <string>
-#include <vector>
-
-#include <gtest/gtest.h>
 
 #include "TestSupport.h"
 
@@ -11,196 +7,157 @@ using namespace corvexa_test;
 
 namespace {
 
-const char* const kThrowingReplica = "com/velmora/tessara/testdoubles/ThrowingReplica";
-const char* const kNullReplica = "com/velmora/tessara/testdoubles/NullReplica";
+std::string NameOf(VLXKDMReplica& replica)
+{
+  VLXUnicodeString name("unread");
+  EXPECT_EQ(VLX_S_OK, replica.GetName(name));
+  return Text(name);
+}
 
-class FrameTest : public ::testing::Test {
- protected:
-  void SetUp() override
-  {
-    ASSERT_NE(nullptr, Env());
-    ClearLastError();
-  }
-};
-
-// An error left by an earlier call, or by a failure of a later one that recorded no cause, never
-// stands for the next failure.
-TEST_F(FrameTest, AnEarlierErrorIsNeverRaisedAgain)
+// An error left by an earlier call never stands for the next failure, and a failure that recorded
+// no cause names the operation and its code. A proxy's unbuilt handle is null and reports nothing.
+TEST(Frame, AnEarlierErrorIsNeverRaisedAgain)
 {
   VLXError* earlier = new VLXError("TESTERR_0001", "CorvexaTestMessages");
   ASSERT_EQ(VLX_E_FAIL, VLXError::GetReturn(2, earlier, nullptr, __FILE__, __LINE__));
-  VLXKDMReplica unbuilt;
+  VLXKDMReplica unbuilt, built;
   EXPECT_EQ(VLX_E_FAIL, unbuilt.Commit());
   EXPECT_EQ("VLXJBXInfraERR_1003", PeekLastError().id);
-  EXPECT_EQ("VLXKDMReplica::Commit()", PeekLastError().parameters[0]);
+  EXPECT_EQ("VLXKDMReplica::Commit()", PeekLastError().operation());
 
-  // A failure that records nothing after an operation has started names itself and its code.
-  VLXKDMReplica built;
-  ASSERT_EQ(VLX_S_OK, built.Build(VLXUnicodeString("fresh")));
-  VLXUnicodeString name;
-  ASSERT_EQ(VLX_S_OK, built.GetName(name));
+  ASSERT_EQ(VLX_S_OK, built.Build(U("fresh")));
+  EXPECT_EQ("fresh", NameOf(built));
   EXPECT_EQ(VLX_E_FAIL, VLXKDMReplica::HandleReplicaError(Env(), VLX_E_INVALIDARG, "Caller::Step()"));
   EXPECT_EQ("Caller::Step() failed: it failed with the code -2147024809 and recorded no cause", PeekLastError().text);
+
+  ClearLastError();
+  EXPECT_EQ(nullptr, unbuilt.GetHandle());
+  EXPECT_FALSE(PeekLastError().present);
 }
 
 // A proxy holds only a Java object of its own class, however the object comes to it; a wrong one is
 // refused, naming both classes, and the proxy keeps what it held.
-TEST_F(FrameTest, AnObjectOfAnotherClassNeverEntersAProxy)
+TEST(Frame, AnObjectOfAnotherClassNeverEntersAProxy)
 {
-  VLXKDMReplica replica;
-  ASSERT_EQ(VLX_S_OK, replica.Build(VLXUnicodeString("wrong")));
+  VLXKDMReplica replica, target;
   VLXKDMClassDef classDef;
-  ASSERT_EQ(VLX_S_OK, classDef.Build(VLXUnicodeString("Part")));
-  const jobject string = Env()->NewStringUTF("not a replica");
+  ASSERT_EQ(VLX_S_OK, replica.Build(U("wrong")));
+  ASSERT_EQ(VLX_S_OK, target.Build(U("kept")));
+  ASSERT_EQ(VLX_S_OK, classDef.Build(U("Part")));
+  Local string(Env()->NewStringUTF("not a replica"));
   const std::string kReplica = "com.velmora.tessara.kdmreplica.Replica";
   const std::string kClassDef = "com.velmora.tessara.kdmreplica.ClassDef";
   const std::string kHolder = "com.velmora.tessara.ReplicaHolder";
-  struct Case {
+  const struct {
     const char* what;
     std::function<long()> attach;
     std::string actual, expected;
-  };
-  VLXKDMReplica target;
-  ASSERT_EQ(VLX_S_OK, target.Build(VLXUnicodeString("kept")));
-  const std::vector<Case> cases = {
+  } cases[] = {
       {"SetHandle", [&] { return target.SetHandle(Env(), classDef.GetHandle()); }, kClassDef, kReplica},
-      {"exchange", [&] { return target.BuildFromJavaType(Env(), string); }, "java.lang.String", kReplica},
+      {"exchange", [&] { return target.BuildFromJavaType(Env(), string.get()); }, "java.lang.String", kReplica},
       {"holder in", [&] { return target.BuildFromJavaHolder(Env(), replica.GetHandle()); }, kReplica, kHolder},
       {"holder out",
        [&] {
-         jobject h = string;
+         jobject h = string.get();
          return target.ConvertToJavaHolder(Env(), h);
        },
        "java.lang.String", kHolder},
       {"assignment through the base",
        [&] {
-         VLXKDMJavaObject& base = target;
-         base = classDef;
+         static_cast<VLXKDMJavaObject&>(target) = classDef;
          return VLX_E_INVALIDARG;
        },
        kClassDef, kReplica},
   };
-  for (const Case& c : cases) {
+  for (const auto& c : cases) {
     SCOPED_TRACE(c.what);
     ClearLastError();
     EXPECT_EQ(VLX_E_INVALIDARG, c.attach());
-    const std::string text = PeekLastError().text;
-    EXPECT_NE(std::string::npos, text.find("is a " + c.actual + ", not a " + c.expected)) << text;
-    VLXUnicodeString name;
-    ASSERT_EQ(VLX_S_OK, target.GetName(name));
-    EXPECT_EQ("kept", Text(name));
+    EXPECT_TRUE(Has(PeekLastError().text, "is a " + c.actual + ", not a " + c.expected)) << PeekLastError().text;
+    EXPECT_EQ("kept", NameOf(target));
   }
-  Env()->DeleteLocalRef(string);
 }
 
-TEST_F(FrameTest, GetHandleOfAnUnbuiltProxyIsNullAndReportsNothing)
+// A Java exception is reported with the operation, its class, message and cause, and cleared; the
+// out-parameters, text and proxy, keep what they held, and the next call works.
+TEST(Frame, AJavaExceptionIsReportedClearedAndLeavesOutParametersAlone)
 {
-  VLXKDMReplica unbuilt;
-  EXPECT_EQ(nullptr, unbuilt.GetHandle());
-  EXPECT_FALSE(PeekLastError().present);
-}
-
-TEST_F(FrameTest, AJavaExceptionIsReportedClearedAndLeavesOutParametersAlone)
-{
-  VLXKDMReplica throwing;
-  AttachNew(throwing, kThrowingReplica);
-
+  VLXKDMReplica throwing, other;
+  AttachNew(throwing, "com/velmora/tessara/testdoubles/ThrowingReplica");
   VLXUnicodeString name("kept");
   EXPECT_EQ(VLX_E_FAIL, throwing.GetName(name));
   EXPECT_EQ("kept", Text(name));
   EXPECT_FALSE(Env()->ExceptionCheck());
-  const LastError error = PeekLastError();
-  ASSERT_TRUE(error.present);
-  EXPECT_NE(std::string::npos, error.text.find("VLXKDMReplica::GetName(VLXUnicodeString&)")) << error.text;
-  EXPECT_NE(std::string::npos, error.text.find("java.lang.IllegalStateException")) << error.text;
-  EXPECT_NE(std::string::npos, error.text.find("name unavailable")) << error.text;
-  EXPECT_NE(std::string::npos, error.text.find("storage offline")) << error.text;
+  const std::string text = PeekLastError().text;
+  for (const char* part : {"VLXKDMReplica::GetName(VLXUnicodeString&)", "java.lang.IllegalStateException",
+                           "name unavailable", "storage offline"})
+    EXPECT_TRUE(Has(text, part)) << text;
 
-  // An out-proxy keeps the object it referred to.
-  VLXKDMReplica other;
-  ASSERT_EQ(VLX_S_OK, other.Build(VLXUnicodeString("other")));
   VLXKDMClassDef classDef, before;
-  ASSERT_EQ(VLX_S_OK, classDef.Build(VLXUnicodeString("Before")));
+  ASSERT_EQ(VLX_S_OK, classDef.Build(U("Before")));
   before = classDef;
-  EXPECT_EQ(VLX_E_FAIL, throwing.GetClassDef(VLXUnicodeString("Part"), classDef));
+  EXPECT_EQ(VLX_E_FAIL, throwing.GetClassDef(U("Part"), classDef));
   EXPECT_TRUE(classDef == before);
-  EXPECT_NE(std::string::npos, PeekLastError().text.find("no class lookups here: Part"));
-
+  EXPECT_TRUE(Has(PeekLastError().text, "no class lookups here: Part"));
   EXPECT_EQ(VLX_E_FAIL, throwing.Commit());
   EXPECT_EQ(3, IntField(throwing.GetHandle(), "calls"));
 
-  // The next call on the same thread works.
-  VLXUnicodeString otherName;
-  EXPECT_EQ(VLX_S_OK, other.GetName(otherName));
-  EXPECT_EQ("other", Text(otherName));
+  ASSERT_EQ(VLX_S_OK, other.Build(U("other")));
+  EXPECT_EQ("other", NameOf(other));
 }
 
-// A caller's own JNI code may leave an exception pending: the operation must not call Java over
-// it, and reports it through the Java error handling instead.
-TEST_F(FrameTest, AnExceptionPendingBeforeTheCallFailsItWithoutAJavaCall)
+// An exception the caller's own JNI code left pending fails the operation without a Java call, and
+// is reported and cleared, on a built proxy and on an unbuilt one.
+TEST(Frame, AnExceptionPendingBeforeTheCallFailsItWithoutAJavaCall)
 {
-  VLXKDMReplica replica;
-  ASSERT_EQ(VLX_S_OK, replica.Build(VLXUnicodeString("before")));
+  VLXKDMReplica replica, unbuilt;
+  ASSERT_EQ(VLX_S_OK, replica.Build(U("before")));
   JNIEnv* env = Env();
-  for (const bool built : {true, false}) {
-    jclass cls = env->FindClass("java/lang/IllegalArgumentException");
-    ASSERT_NE(nullptr, cls);
-    ASSERT_EQ(0, env->ThrowNew(cls, "left by the caller"));
-    env->DeleteLocalRef(cls);
-
+  for (VLXKDMReplica* proxy : {&replica, &unbuilt}) {
+    Local cls(env->FindClass("java/lang/IllegalArgumentException"));
+    ASSERT_EQ(0, env->ThrowNew(static_cast<jclass>(cls.get()), "left by the caller"));
     VLXUnicodeString name("kept");
-    VLXKDMReplica unbuilt;
-    EXPECT_EQ(VLX_E_FAIL, (built ? replica : unbuilt).GetName(name));
+    EXPECT_EQ(VLX_E_FAIL, proxy->GetName(name));
     EXPECT_EQ("kept", Text(name));
     EXPECT_FALSE(env->ExceptionCheck());
-    const LastError error = PeekLastError();
-    EXPECT_NE(std::string::npos, error.text.find("java.lang.IllegalArgumentException")) << error.text;
-    EXPECT_NE(std::string::npos, error.text.find("left by the caller")) << error.text;
+    const std::string text = PeekLastError().text;
+    EXPECT_TRUE(Has(text, "java.lang.IllegalArgumentException") && Has(text, "left by the caller")) << text;
   }
-  VLXUnicodeString name;
-  EXPECT_EQ(VLX_S_OK, replica.GetName(name));
-  EXPECT_EQ("before", Text(name));
+  EXPECT_EQ("before", NameOf(replica));
 }
 
-TEST_F(FrameTest, NullJavaResultsGiveEmptyValuesAndUnbuiltProxies)
+// Null Java answers give an empty text and a detached out-proxy; so does a lookup of an absent name.
+TEST(Frame, NullJavaResultsGiveEmptyValuesAndUnbuiltProxies)
 {
-  VLXKDMReplica nulls;
-  AttachNew(nulls, kNullReplica);
-  VLXUnicodeString name("before");
-  EXPECT_EQ(VLX_S_OK, nulls.GetName(name));
-  EXPECT_EQ("", Text(name));
-
-  VLXKDMReplica real;
+  VLXKDMReplica nulls, real;
+  AttachNew(nulls, "com/velmora/tessara/testdoubles/NullReplica");
+  EXPECT_EQ("", NameOf(nulls));
   ASSERT_EQ(VLX_S_OK, real.Build());
   VLXKDMModelSet models;
   ASSERT_EQ(VLX_S_OK, real.GetModels(models));
   ASSERT_NE(nullptr, models.GetHandle());
   EXPECT_EQ(VLX_S_OK, nulls.GetModels(models));
   EXPECT_EQ(nullptr, models.GetHandle());
-
-  // A lookup of an absent name detaches the out-proxy.
   VLXKDMClassDef classDef;
-  ASSERT_EQ(VLX_S_OK, classDef.Build(VLXUnicodeString("Elsewhere")));
-  EXPECT_EQ(VLX_S_OK, real.GetClassDef(VLXUnicodeString("NoSuchClass"), classDef));
+  ASSERT_EQ(VLX_S_OK, classDef.Build(U("Elsewhere")));
+  EXPECT_EQ(VLX_S_OK, real.GetClassDef(U("NoSuchClass"), classDef));
   EXPECT_EQ(nullptr, classDef.GetHandle());
 }
 
 // Build attaches the proxy to a new Java object; a copy keeps the old one. An unbuilt proxy given as
 // an argument goes to Java as null: Java refuses it, and a failing Build leaves the proxy as it was.
-TEST_F(FrameTest, BuildAttachesANewObjectAndAFailedOneKeepsTheOld)
+TEST(Frame, BuildAttachesANewObjectAndAFailedOneKeepsTheOld)
 {
   VLXKDMReplica replica;
-  ASSERT_EQ(VLX_S_OK, replica.Build(VLXUnicodeString("first")));
+  ASSERT_EQ(VLX_S_OK, replica.Build(U("first")));
   VLXKDMReplica keep(replica);
-  ASSERT_EQ(VLX_S_OK, replica.Build(VLXUnicodeString("second")));
+  ASSERT_EQ(VLX_S_OK, replica.Build(U("second")));
   EXPECT_FALSE(keep == replica);
-  VLXUnicodeString name;
-  ASSERT_EQ(VLX_S_OK, keep.GetName(name));
-  EXPECT_EQ("first", Text(name));
+  EXPECT_EQ("first", NameOf(keep));
 
   VLXKDMClassDef classDef;
-  ASSERT_EQ(VLX_S_OK, classDef.Build(VLXUnicodeString("Part")));
   VLXKDMModel model;
+  ASSERT_EQ(VLX_S_OK, classDef.Build(U("Part")));
   ASSERT_EQ(VLX_S_OK, model.Build(classDef));
   VLXKDMModel kept(model);
   EXPECT_EQ(VLX_E_FAIL, model.Build(VLXKDMClassDef()));
@@ -212,28 +169,25 @@ TEST_F(FrameTest, BuildAttachesANewObjectAndAFailedOneKeepsTheOld)
   EXPECT_EQ(5, position);
 }
 
-TEST_F(FrameTest, CopiesStayValidAfterTheSourceIsDestroyed)
+// Copies and assignments take global references of their own, outlive their source, and give
+// their references back.
+TEST(Frame, CopiesStayValidAfterTheSourceIsDestroyed)
 {
-  const long baseline = VLXJBXJNIUtilities::GetGlobalRefCount();
+  const long baseline = GlobalRefCount();
   {
     VLXKDMReplica* source = new VLXKDMReplica;
-    ASSERT_EQ(VLX_S_OK, source->Build(VLXUnicodeString("shared")));
-    VLXKDMReplica copy(*source);
-    VLXKDMReplica assigned;
+    ASSERT_EQ(VLX_S_OK, source->Build(U("shared")));
+    VLXKDMReplica copy(*source), assigned;
     assigned = *source;
     EXPECT_TRUE(copy == *source);
-    EXPECT_EQ(baseline + 3, VLXJBXJNIUtilities::GetGlobalRefCount());
+    EXPECT_EQ(baseline + 3, GlobalRefCount());
     delete source;
-
-    VLXUnicodeString name;
-    ASSERT_EQ(VLX_S_OK, copy.GetName(name));
-    EXPECT_EQ("shared", Text(name));
-    ASSERT_EQ(VLX_S_OK, assigned.GetName(name));
-    EXPECT_EQ("shared", Text(name));
+    EXPECT_EQ("shared", NameOf(copy));
+    EXPECT_EQ("shared", NameOf(assigned));
     assigned = assigned;
     EXPECT_TRUE(assigned == copy);
   }
-  EXPECT_EQ(baseline, VLXJBXJNIUtilities::GetGlobalRefCount());
+  EXPECT_EQ(baseline, GlobalRefCount());
 }
 
 // (That the shared library exports it under its plain name is checked by corvexa_exports.)

@@ -1,9 +1,6 @@
 // Texts cross to Java and back byte for byte; malformed UTF-8 is refused before any Java call, with
 // the converter's own code or the translated one as each operation says.
 #include <functional>
-#include <string>
-
-#include <gtest/gtest.h>
 
 #include "TestSupport.h"
 
@@ -27,94 +24,76 @@ TEST(Strings, NamesSurviveARoundTripByteForByte)
   ASSERT_EQ(VLX_S_OK, replica.Build());
   for (const std::string& sample : samples) {
     SCOPED_TRACE(sample.substr(0, 40));
-    ASSERT_EQ(VLX_S_OK, replica.SetName(VLXUnicodeString(sample.data(), static_cast<int>(sample.size()))));
+    ASSERT_EQ(VLX_S_OK, replica.SetName(U(sample)));
     VLXUnicodeString back("stale");
     ASSERT_EQ(VLX_S_OK, replica.GetName(back));
     EXPECT_EQ(sample, Text(back));
   }
 }
 
-TEST(Strings, MalformedUtf8GivesTheRawCodeOrTheTranslatedOneAsEachOperationSays)
-{
-  VLXKDMReplica replica;
-  ASSERT_EQ(VLX_S_OK, replica.Build(VLXUnicodeString("kept")));
-  const char* const malformed[] = {"bad \xC3\x28 byte", "\xED\xA0\x80 surrogate", "\xC0\xAF overlong", "cut \xE6\x95",
-                                   "\xF5\x80\x80\x80 too big"};
-  for (const char* text : malformed) {
-    SCOPED_TRACE(text);
-    ClearLastError();
-    // SetName returns the converter's own code, untranslated.
-    const long raw = replica.SetName(VLXUnicodeString(text));
-    EXPECT_LT(raw, 0);
-    EXPECT_NE(VLX_E_FAIL, raw);
-    const LastError error = PeekLastError();
-    EXPECT_NE(std::string::npos, error.text.find("UTF-8")) << error.text;
-
-    // GetClassDef passes the same failure through the error translation.
-    VLXKDMClassDef classDef;
-    EXPECT_EQ(VLX_E_FAIL, replica.GetClassDef(VLXUnicodeString(text), classDef));
-    EXPECT_EQ(nullptr, classDef.GetHandle());
-  }
-  VLXUnicodeString name;
-  ASSERT_EQ(VLX_S_OK, replica.GetName(name));
-  EXPECT_EQ("kept", Text(name));
-}
-
-// Which operations return the converter's code as it is (VLX_E_INVALIDARG) and which translate it
-// (VLX_E_FAIL); either way the out-parameters and the Java side are left alone.
+// Each kind of malformed text, as an argument of each operation: the converter's code as it is
+// (VLX_E_INVALIDARG) or translated (VLX_E_FAIL); the out-parameters and the Java side are left alone.
 TEST(Strings, AMalformedTextArgumentGivesEachOperationsOwnCode)
 {
   SampleReplica s;
+  ASSERT_EQ(VLX_S_OK, s.replica.SetName(U("kept")));
   VLXKDMInstance instance = s.Create();
   ASSERT_EQ(VLX_S_OK, instance.SetValue(0, 42));
   VLXKDMModelSet models;
   ASSERT_EQ(VLX_S_OK, s.replica.GetModels(models));
   VLXKDMAttributeDef attribute;
-  ASSERT_EQ(VLX_S_OK, attribute.Build(VLXUnicodeString("a"), VLXKDMAttributeType::String));
+  ASSERT_EQ(VLX_S_OK, attribute.Build(U("a"), VLXKDMAttributeType::String));
   VLXKDMAttributeDef copy(attribute);
-  const VLXUnicodeString bad("bad \xC3\x28 name");
-  const VLXListOfVLXUnicodeString badList = ListOf<VLXListOfVLXUnicodeString>({VLXUnicodeString("fine"), bad});
+  VLXKDMClassDef classDef;
   VLXBoolean flag = 9;
   int number = 9;
-  VLXKDMInstanceValue value;
+  VLXKDMInstanceValue value, holder;
   value.SetInteger(8);
-  VLXKDMInstanceValue holder;
   holder.SetInteger(4);
-  const struct {
-    const char* what;
-    long expected;
-    std::function<long()> call;
-  } cases[] = {
-      {"SetName", VLX_E_INVALIDARG, [&] { return s.replica.SetName(bad); }},
-      {"ModelSet::Includes", VLX_E_INVALIDARG, [&] { return models.Includes(bad, flag); }},
-      {"Instance::IsValuated", VLX_E_INVALIDARG, [&] { return instance.IsValuated(bad, flag); }},
-      {"Instance::GetValue", VLX_E_INVALIDARG, [&] { return instance.GetValue(bad, value); }},
-      {"AttributeDef::SetQKAComment", VLX_E_INVALIDARG, [&] { return attribute.SetQKAComment(bad); }},
-      {"AttributeDef::SetTargetNames", VLX_E_INVALIDARG, [&] { return attribute.SetTargetNames(badList); }},
-      {"AttributeDef::Build", VLX_E_INVALIDARG, [&] { return copy.Build(bad, VLXKDMAttributeType::Integer); }},
-      {"ModelSet::IndexOf", VLX_E_FAIL, [&] { return models.IndexOf(bad, number); }},
-      {"AttributeDef::SetUuid", VLX_E_FAIL, [&] { return attribute.SetUuid(bad); }},
-      {"AttributeDef::SetTargetRefs", VLX_E_FAIL, [&] { return attribute.SetTargetRefs(badList); }},
-      {"Instance::ClearValue", VLX_E_FAIL, [&] { return instance.ClearValue(bad); }},
-      {"Instance::SetID", VLX_E_FAIL, [&] { return instance.SetID(bad); }},
-      {"Instance::SetValue(name, int)", VLX_E_FAIL, [&] { return instance.SetValue(bad, 5); }},
-      {"Instance::SetValue(name, text)", VLX_E_FAIL,
-       [&] { return instance.SetValue(VLXUnicodeString("string"), bad); }},
-      // The holder gets its Java form before the name is converted.
-      {"Instance::SetValue(name, holder)", VLX_E_FAIL, [&] { return instance.SetValue(bad, holder); }},
-  };
-  for (const auto& c : cases) {
-    SCOPED_TRACE(c.what);
-    ClearLastError();
-    EXPECT_EQ(c.expected, c.call());
-    EXPECT_TRUE(Has(PeekLastError().text, "UTF-8")) << PeekLastError().text;
+  for (const char* malformed : {"bad \xC3\x28 byte", "\xED\xA0\x80 surrogate", "\xC0\xAF overlong", "cut \xE6\x95",
+                                "\xF5\x80\x80\x80 too big"}) {
+    const VLXUnicodeString bad(malformed);
+    const VLXListOfVLXUnicodeString badList = ListOf<VLXListOfVLXUnicodeString>({U("fine"), bad});
+    const struct {
+      const char* what;
+      long expected;
+      std::function<long()> call;
+    } cases[] = {
+        {"SetName", VLX_E_INVALIDARG, [&] { return s.replica.SetName(bad); }},
+        {"ModelSet::Includes", VLX_E_INVALIDARG, [&] { return models.Includes(bad, flag); }},
+        {"Instance::IsValuated", VLX_E_INVALIDARG, [&] { return instance.IsValuated(bad, flag); }},
+        {"Instance::GetValue", VLX_E_INVALIDARG, [&] { return instance.GetValue(bad, value); }},
+        {"AttributeDef::SetQKAComment", VLX_E_INVALIDARG, [&] { return attribute.SetQKAComment(bad); }},
+        {"AttributeDef::SetTargetNames", VLX_E_INVALIDARG, [&] { return attribute.SetTargetNames(badList); }},
+        {"AttributeDef::Build", VLX_E_INVALIDARG, [&] { return copy.Build(bad, VLXKDMAttributeType::Integer); }},
+        {"Replica::GetClassDef", VLX_E_FAIL, [&] { return s.replica.GetClassDef(bad, classDef); }},
+        {"ModelSet::IndexOf", VLX_E_FAIL, [&] { return models.IndexOf(bad, number); }},
+        {"AttributeDef::SetUuid", VLX_E_FAIL, [&] { return attribute.SetUuid(bad); }},
+        {"AttributeDef::SetTargetRefs", VLX_E_FAIL, [&] { return attribute.SetTargetRefs(badList); }},
+        {"Instance::ClearValue", VLX_E_FAIL, [&] { return instance.ClearValue(bad); }},
+        {"Instance::SetID", VLX_E_FAIL, [&] { return instance.SetID(bad); }},
+        {"Instance::SetValue(name, int)", VLX_E_FAIL, [&] { return instance.SetValue(bad, 5); }},
+        {"Instance::SetValue(name, text)", VLX_E_FAIL, [&] { return instance.SetValue(U("string"), bad); }},
+        // The holder gets its Java form before the name is converted.
+        {"Instance::SetValue(name, holder)", VLX_E_FAIL, [&] { return instance.SetValue(bad, holder); }},
+    };
+    for (const auto& c : cases) {
+      SCOPED_TRACE(std::string(c.what) + " with " + malformed);
+      ClearLastError();
+      EXPECT_EQ(c.expected, c.call());
+      EXPECT_TRUE(Has(PeekLastError().text, "UTF-8")) << PeekLastError().text;
+    }
   }
   EXPECT_EQ(9, flag);
   EXPECT_EQ(9, number);
   EXPECT_EQ(8, value.GetInteger());
   EXPECT_EQ(nullptr, value.GetHandle());
   EXPECT_NE(nullptr, holder.GetHandle());
+  EXPECT_EQ(nullptr, classDef.GetHandle());
   EXPECT_TRUE(copy == attribute);
+  VLXUnicodeString name;
+  ASSERT_EQ(VLX_S_OK, s.replica.GetName(name));
+  EXPECT_EQ("kept", Text(name));
   VLXKDMInstanceValue kept;
   ASSERT_EQ(VLX_S_OK, instance.GetValue(0, kept));
   EXPECT_EQ(42, kept.GetInteger());

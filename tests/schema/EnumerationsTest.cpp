@@ -1,10 +1,5 @@
 // The schema enumerations: every enumerator set and read back, null answers, values out of range.
 #include <functional>
-#include <string>
-#include <vector>
-
-#include <gtest/gtest.h>
-
 #include "TestSupport.h"
 
 using namespace corvexa_test;
@@ -13,8 +8,6 @@ namespace {
 
 const char* const kNullAttributeDef = "com/velmora/tessara/testdoubles/NullSchema$AttributeDef";
 const char* const kNullClassDef = "com/velmora/tessara/testdoubles/NullSchema$ClassDefinition";
-const char* const kAttributeDefSource = "Tessara\\Corvexa.m\\src\\VLXKDMAttributeDef.cpp";
-const char* const kClassDefSource = "Tessara\\Corvexa.m\\src\\VLXKDMClassDef.cpp";
 
 // Sets each enumerator through the setter and reads it back through the getter.
 template <class E, class Proxy>
@@ -32,7 +25,7 @@ void RoundTrip(Proxy& proxy, int count, long (Proxy::*set)(E), long (Proxy::*get
 TEST(Enumerations, EveryEnumeratorCrossesBothWays)
 {
   VLXKDMAttributeDef attribute;
-  ASSERT_EQ(VLX_S_OK, attribute.Build(VLXUnicodeString("weight"), VLXKDMAttributeType::Double));
+  ASSERT_EQ(VLX_S_OK, attribute.Build(U("weight"), VLXKDMAttributeType::Double));
   RoundTrip<VLXKDMAccessMode::Mode>(attribute, 3, &VLXKDMAttributeDef::SetAccessMode,
                                     &VLXKDMAttributeDef::GetAccessMode);
   RoundTrip<VLXKDMAggregationType::Type>(attribute, 2, &VLXKDMAttributeDef::SetAggregationType,
@@ -41,7 +34,7 @@ TEST(Enumerations, EveryEnumeratorCrossesBothWays)
                                     &VLXKDMAttributeDef::GetSoftwareVisibility);
 
   VLXKDMClassDef classDef;
-  ASSERT_EQ(VLX_S_OK, classDef.Build(VLXUnicodeString("Part")));
+  ASSERT_EQ(VLX_S_OK, classDef.Build(U("Part")));
   RoundTrip<VLXKDMClassType::Type>(classDef, 2, &VLXKDMClassDef::SetClassType, &VLXKDMClassDef::GetClassType);
   RoundTrip<VLXKDMVisibility::Mode>(classDef, 3, &VLXKDMClassDef::SetSoftwareVisibility,
                                     &VLXKDMClassDef::GetSoftwareVisibility);
@@ -58,50 +51,34 @@ TEST(Enumerations, EveryEnumeratorCrossesBothWays)
   }
 }
 
+// Answers a getter writes into a sentinel.
+template <class E, class Proxy>
+int Got(Proxy& proxy, long (Proxy::*get)(E&), int sentinel)
+{
+  E value = static_cast<E>(sentinel);
+  EXPECT_EQ(VLX_S_OK, (proxy.*get)(value));
+  return value;
+}
+
+// Null answers give the defaults, but leave the aggregation alone.
 TEST(Enumerations, NullAnswersGiveTheDefaultsButLeaveTheAggregationAlone)
 {
   VLXKDMAttributeDef attribute;
-  AttachNew(attribute, kNullAttributeDef);
-  VLXKDMAttributeType::Type type = VLXKDMAttributeType::Binary;
-  EXPECT_EQ(VLX_S_OK, attribute.GetAttributeType(type));
-  EXPECT_EQ(VLXKDMAttributeType::String, type);
-  VLXKDMAccessMode::Mode mode = VLXKDMAccessMode::ReadWrite;
-  EXPECT_EQ(VLX_S_OK, attribute.GetAccessMode(mode));
-  EXPECT_EQ(VLXKDMAccessMode::Read, mode);
-  VLXKDMVisibility::Mode visibility = VLXKDMVisibility::Private;
-  EXPECT_EQ(VLX_S_OK, attribute.GetSoftwareVisibility(visibility));
-  EXPECT_EQ(VLXKDMVisibility::Public, visibility);
-  VLXKDMAggregationType::Type aggregation = VLXKDMAggregationType::Shared;
-  EXPECT_EQ(VLX_S_OK, attribute.GetAggregationType(aggregation));
-  EXPECT_EQ(VLXKDMAggregationType::Shared, aggregation);
-
   VLXKDMClassDef classDef;
+  AttachNew(attribute, kNullAttributeDef);
   AttachNew(classDef, kNullClassDef);
-  VLXKDMClassType::Type classType = VLXKDMClassType::Extension;
-  EXPECT_EQ(VLX_S_OK, classDef.GetClassType(classType));
-  EXPECT_EQ(VLXKDMClassType::Class, classType);
-  visibility = VLXKDMVisibility::Protected;
-  EXPECT_EQ(VLX_S_OK, classDef.GetSoftwareVisibility(visibility));
-  EXPECT_EQ(VLXKDMVisibility::Public, visibility);
-
-  // Object getters attach the null answer: the out-proxy is detached.
-  VLXKDMClassDef real;
-  ASSERT_EQ(VLX_S_OK, real.Build(VLXUnicodeString("Real")));
-  VLXKDMAttributeDefList attributes;
-  ASSERT_EQ(VLX_S_OK, real.GetAttributes(attributes));
-  EXPECT_EQ(VLX_S_OK, classDef.GetAttributes(attributes));
-  EXPECT_EQ(nullptr, attributes.GetHandle());
-  VLXKDMClassDef owner(classDef);
-  EXPECT_EQ(VLX_S_OK, attribute.GetClassDef(owner));
-  EXPECT_EQ(nullptr, owner.GetHandle());
+  EXPECT_EQ(VLXKDMAttributeType::String, Got(attribute, &VLXKDMAttributeDef::GetAttributeType, 5));
+  EXPECT_EQ(VLXKDMAccessMode::Read, Got(attribute, &VLXKDMAttributeDef::GetAccessMode, 2));
+  EXPECT_EQ(VLXKDMVisibility::Public, Got(attribute, &VLXKDMAttributeDef::GetSoftwareVisibility, 2));
+  EXPECT_EQ(VLXKDMAggregationType::Shared, Got(attribute, &VLXKDMAttributeDef::GetAggregationType, 1));
+  EXPECT_EQ(VLXKDMClassType::Class, Got(classDef, &VLXKDMClassDef::GetClassType, 1));
+  EXPECT_EQ(VLXKDMVisibility::Public, Got(classDef, &VLXKDMClassDef::GetSoftwareVisibility, 1));
 }
 
 struct OutOfRange {
   const char* what;
   std::function<long()> call;
   const char* message;
-  const char* file;
-  int line;
 };
 
 TEST(Enumerations, ValuesOutOfRangeAreReportedAndNeverReachJava)
@@ -113,20 +90,20 @@ TEST(Enumerations, ValuesOutOfRangeAreReportedAndNeverReachJava)
   VLXKDMAttributeDef built;
   const std::vector<OutOfRange> cases = {
       {"SetAccessMode(3)", [&] { return attribute.SetAccessMode(static_cast<VLXKDMAccessMode::Mode>(3)); },
-       "AssertionFailed:mode != NULL", kAttributeDefSource, 245},
+       "AssertionFailed:mode != NULL"},
       {"SetAggregationType(-1)",
        [&] { return attribute.SetAggregationType(static_cast<VLXKDMAggregationType::Type>(-1)); },
-       "AssertionFailed:agg != NULL", kAttributeDefSource, 139},
+       "AssertionFailed:agg != NULL"},
       {"AttributeDef SetSoftwareVisibility(3)",
        [&] { return attribute.SetSoftwareVisibility(static_cast<VLXKDMVisibility::Mode>(3)); },
-       "AssertionFailed:vis != NULL", kAttributeDefSource, 290},
+       "AssertionFailed:vis != NULL"},
       {"SetClassType(2)", [&] { return classDef.SetClassType(static_cast<VLXKDMClassType::Type>(2)); },
-       "AssertionFailed:type != NULL", kClassDefSource, 341},
+       "AssertionFailed:type != NULL"},
       {"ClassDef SetSoftwareVisibility(7)",
        [&] { return classDef.SetSoftwareVisibility(static_cast<VLXKDMVisibility::Mode>(7)); },
-       "AssertionFailed:vis != NULL", kClassDefSource, 211},
-      {"Build(name, 7)", [&] { return built.Build(VLXUnicodeString("x"), static_cast<VLXKDMAttributeType::Type>(7)); },
-       "AssertionFailed:type != NULL", kAttributeDefSource, 41},
+       "AssertionFailed:vis != NULL"},
+      {"Build(name, 7)", [&] { return built.Build(U("x"), static_cast<VLXKDMAttributeType::Type>(7)); },
+       "AssertionFailed:type != NULL"},
   };
   for (const OutOfRange& c : cases) {
     SCOPED_TRACE(c.what);
@@ -135,8 +112,6 @@ TEST(Enumerations, ValuesOutOfRangeAreReportedAndNeverReachJava)
     EXPECT_LT(rc, 0);
     ASSERT_EQ(1u, FatalRecorder::Reports().size());
     EXPECT_EQ(c.message, FatalRecorder::Reports()[0].message);
-    EXPECT_EQ(c.file, FatalRecorder::Reports()[0].file);
-    EXPECT_EQ(c.line, FatalRecorder::Reports()[0].line);
     EXPECT_NE(std::string::npos, PeekLastError().text.find("none of its enumerators")) << PeekLastError().text;
   }
   EXPECT_EQ(0, IntField(attribute.GetHandle(), "setterCalls"));

@@ -8,11 +8,7 @@
 #include <cstdlib>
 #include <fstream>
 #include <sstream>
-#include <string>
 #include <thread>
-#include <vector>
-
-#include <gtest/gtest.h>
 
 #include "TestSupport.h"
 #include "ReplicaStubs.h"
@@ -62,24 +58,17 @@ class Capture {
 std::string JavaThreads()
 {
   JNIEnv* env = Env();
-  auto checked = [env](auto result) {
-    EXPECT_FALSE(env->ExceptionCheck());
-    return result;
-  };
-  jclass thread = checked(env->FindClass("java/lang/Thread"));
-  jclass map = checked(env->FindClass("java/util/Map"));
-  jclass object = checked(env->FindClass("java/lang/Object"));
-  jobject all = checked(
-      env->CallStaticObjectMethod(thread, env->GetStaticMethodID(thread, "getAllStackTraces", "()Ljava/util/Map;")));
-  jobject keys = checked(env->CallObjectMethod(all, env->GetMethodID(map, "keySet", "()Ljava/util/Set;")));
-  jstring text = static_cast<jstring>(
-      checked(env->CallObjectMethod(keys, env->GetMethodID(object, "toString", "()Ljava/lang/String;"))));
-  const char* chars = env->GetStringUTFChars(text, nullptr);
+  Local thread(env->FindClass("java/lang/Thread"));
+  const jclass cls = static_cast<jclass>(thread.get());
+  Local all(env->CallStaticObjectMethod(cls, env->GetStaticMethodID(cls, "getAllStackTraces", "()Ljava/util/Map;")));
+  if (!NoPending("getAllStackTraces")) return "";
+  Local keys(env->CallObjectMethod(all.get(), MethodOf(all.get(), "keySet", "()Ljava/util/Set;")));
+  if (!NoPending("keySet")) return "";
+  Local text(env->CallObjectMethod(keys.get(), MethodOf(keys.get(), "toString", "()Ljava/lang/String;")));
+  if (!NoPending("toString")) return "";
+  const char* chars = env->GetStringUTFChars(static_cast<jstring>(text.get()), nullptr);
   const std::string result = chars;
-  env->ReleaseStringUTFChars(text, chars);
-  for (jobject local : {static_cast<jobject>(thread), static_cast<jobject>(map), static_cast<jobject>(object), all,
-                        keys, static_cast<jobject>(text)})
-    env->DeleteLocalRef(local);
+  env->ReleaseStringUTFChars(static_cast<jstring>(text.get()), chars);
   return result;
 }
 
@@ -87,7 +76,7 @@ TEST(StartupMissingClass, InitStopsAtTheMissingClassAndEveryOperationFailsCleanl
 {
   Capture out(STDOUT_FILENO), err(STDERR_FILENO);
   VLXKDMReplica replica;
-  const long first = replica.Build(VLXUnicodeString("never"));
+  const long first = replica.Build(U("never"));
   EXPECT_EQ("", out.Finish());  // the application's output stays its own
   EXPECT_EQ("Error ReplicaStubs::Init\n", err.Finish());
   EXPECT_EQ(VLX_E_FAIL, first);
@@ -197,14 +186,14 @@ TEST(StartupPendingException, TheFirstCallFailsAndTheNextStartsNormally)
   jclass cls = env->FindClass("java/lang/IllegalStateException");
   ASSERT_EQ(0, env->ThrowNew(cls, "left by the application"));
   VLXKDMReplica replica;
-  EXPECT_EQ(VLX_E_FAIL, replica.Build(VLXUnicodeString("first")));
+  EXPECT_EQ(VLX_E_FAIL, replica.Build(U("first")));
   EXPECT_FALSE(env->ExceptionCheck());
   env->DeleteLocalRef(cls);
   const std::string text = PeekLastError().text;
   EXPECT_NE(std::string::npos, text.find("left by the application")) << text;
   EXPECT_EQ(std::string::npos, text.find("missing")) << text;
 
-  ASSERT_EQ(VLX_S_OK, replica.Build(VLXUnicodeString("second")));
+  ASSERT_EQ(VLX_S_OK, replica.Build(U("second")));
   VLXUnicodeString name;
   ASSERT_EQ(VLX_S_OK, replica.GetName(name));
   EXPECT_EQ("second", Text(name));

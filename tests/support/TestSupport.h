@@ -38,8 +38,6 @@ inline JNIEnv* Env()
   return env;
 }
 
-// ---- Texts ------------------------------------------------------------------------------------
-
 inline std::string Text(const VLXUnicodeString& s) { return std::string(s.c_str(), s.GetLengthInByte()); }
 inline VLXUnicodeString U(const std::string& s) { return VLXUnicodeString(s.data(), static_cast<int>(s.size())); }
 inline std::string Texts(const VLXListOfVLXUnicodeString& list)
@@ -49,8 +47,6 @@ inline std::string Texts(const VLXListOfVLXUnicodeString& list)
   return out;
 }
 inline bool Has(const std::string& text, const std::string& part) { return text.find(part) != std::string::npos; }
-
-// ---- The last error ---------------------------------------------------------------------------
 
 struct LastError {
   bool present = false;
@@ -82,8 +78,6 @@ inline std::vector<std::string> Reports()
   for (const FatalReport& r : FatalRecorder::Reports()) out.push_back(r.message + "@" + std::to_string(r.line));
   return out;
 }
-
-// ---- Java objects made and read by the tests themselves ----------------------------------------
 
 // A local reference deleted at the end of the scope.
 class Local {
@@ -121,36 +115,34 @@ jobject New(const char* path, const char* signature = "()V", A... args)
 {
   JNIEnv* env = Env();
   Local cls(env->FindClass(path));
-  if (!NoPending(path) || !cls.get()) return nullptr;
+  if (!NoPending(path)) return nullptr;
   const jmethodID ctor = env->GetMethodID(static_cast<jclass>(cls.get()), "<init>", signature);
-  if (!NoPending(signature) || !ctor) return nullptr;
+  if (!NoPending(signature)) return nullptr;
   jobject made = env->NewObject(static_cast<jclass>(cls.get()), ctor, args...);
   return NoPending(path) ? made : nullptr;
 }
 inline jobject NewDate(jlong ms, const char* cls = "java/util/Date") { return New(cls, "(J)V", ms); }
 
-// Calls a method answering a J of object (a test failure and J() when it throws).
-template <class J>
-J CallOn(jobject object, const char* name, const char* signature)
+inline jmethodID MethodOf(jobject object, const char* name, const char* signature)
 {
-  JNIEnv* env = Env();
-  Local cls(env->GetObjectClass(object));
-  const jmethodID method = env->GetMethodID(static_cast<jclass>(cls.get()), name, signature);
-  J value{};
-  if constexpr (std::is_same_v<J, jlong>)
-    value = env->CallLongMethod(object, method);
-  else
-    value = env->CallBooleanMethod(object, method);
-  return NoPending(name) ? value : J{};
+  Local cls(Env()->GetObjectClass(object));
+  return Env()->GetMethodID(static_cast<jclass>(cls.get()), name, signature);
 }
-inline jlong TimeOf(jobject date) { return CallOn<jlong>(date, "getTime", "()J"); }
-inline jboolean BooleanOf(jobject boxed) { return CallOn<jboolean>(boxed, "booleanValue", "()Z"); }
+inline jlong TimeOf(jobject date)
+{
+  const jlong value = Env()->CallLongMethod(date, MethodOf(date, "getTime", "()J"));
+  return NoPending("getTime") ? value : 0;
+}
+inline jboolean BooleanOf(jobject boxed)
+{
+  const jboolean value = Env()->CallBooleanMethod(boxed, MethodOf(boxed, "booleanValue", "()Z"));
+  return NoPending("booleanValue") ? value : 0;
+}
 // An int field of a test double (they count calls).
 inline int IntField(jobject object, const char* field)
 {
-  JNIEnv* env = Env();
-  Local cls(env->GetObjectClass(object));
-  const int value = env->GetIntField(object, env->GetFieldID(static_cast<jclass>(cls.get()), field, "I"));
+  Local cls(Env()->GetObjectClass(object));
+  const int value = Env()->GetIntField(object, Env()->GetFieldID(static_cast<jclass>(cls.get()), field, "I"));
   return NoPending(field) ? value : -1;
 }
 
@@ -158,9 +150,8 @@ inline int IntField(jobject object, const char* field)
 inline bool IsExactly(jobject object, const char* path)
 {
   if (!object) return false;
-  JNIEnv* env = Env();
-  Local cls(env->GetObjectClass(object)), expected(env->FindClass(path));
-  return NoPending(path) && env->IsSameObject(cls.get(), expected.get()) == JNI_TRUE;
+  Local cls(Env()->GetObjectClass(object)), expected(Env()->FindClass(path));
+  return NoPending(path) && Env()->IsSameObject(cls.get(), expected.get()) == JNI_TRUE;
 }
 
 // An array of class elementClass holding the given objects (nulls allowed).
@@ -189,20 +180,14 @@ void AttachNew(Proxy& proxy, const char* path)
   ASSERT_EQ(VLX_S_OK, proxy.SetHandle(Env(), object.get()));
 }
 
-// A proxy attached to a new Java instance of no replica.
-inline VLXKDMInstance NewInstance()
-{
-  VLXKDMInstance instance;
-  AttachNew(instance, kInstanceClass);
-  return instance;
-}
-
+// Proxies attached to new Java instances of no replica.
 inline std::vector<VLXKDMInstance> NewInstances(int count)
 {
-  std::vector<VLXKDMInstance> out;
-  for (int i = 0; i < count; ++i) out.push_back(NewInstance());
+  std::vector<VLXKDMInstance> out(static_cast<size_t>(count));
+  for (VLXKDMInstance& instance : out) AttachNew(instance, kInstanceClass);
   return out;
 }
+inline VLXKDMInstance NewInstance() { return NewInstances(1)[0]; }
 
 inline VLXTime Seconds(time_t s)
 {
@@ -219,23 +204,6 @@ List ListOf(std::initializer_list<T> values)
   return list;
 }
 
-// ---- Reference counts ---------------------------------------------------------------------------
-
-namespace detail {
-struct LocalRootCount {
-  jlong threadId;
-  long count;
-};
-inline jint JNICALL CountLocalRoot(jvmtiHeapReferenceKind kind, const jvmtiHeapReferenceInfo* info, jlong, jlong, jlong,
-                                   jlong*, jlong*, jint, void* data)
-{
-  LocalRootCount* counter = static_cast<LocalRootCount*>(data);
-  if (kind == JVMTI_HEAP_REFERENCE_JNI_LOCAL && info && info->jni_local.thread_id == counter->threadId)
-    ++counter->count;
-  return 0;  // roots only
-}
-}  // namespace detail
-
 // The calling thread's live JNI local references, counted by a heap walk of the JVM's tool
 // interface (it reports each as a root with its thread); -1 with a test failure when it cannot.
 inline long LocalRefCount()
@@ -247,19 +215,28 @@ inline long LocalRefCount()
     ADD_FAILURE() << "no tool interface to count local references with";
     return -1;
   }
-  jvmtiCapabilities wanted = {};
-  wanted.can_tag_objects = 1;
-  detail::LocalRootCount counter{0, 0};
+  struct Counter {
+    jlong thread;
+    long count;
+  } counter{0, 0};
   {
-    Local threadClass(env->FindClass("java/lang/Thread"));
-    const jclass cls = static_cast<jclass>(threadClass.get());
-    Local thread(
-        env->CallStaticObjectMethod(cls, env->GetStaticMethodID(cls, "currentThread", "()Ljava/lang/Thread;")));
+    Local cls(env->FindClass("java/lang/Thread"));
+    const jclass thread = static_cast<jclass>(cls.get());
+    Local current(
+        env->CallStaticObjectMethod(thread, env->GetStaticMethodID(thread, "currentThread", "()Ljava/lang/Thread;")));
     if (!NoPending("Thread.currentThread")) return -1;
-    counter.threadId = CallOn<jlong>(thread.get(), "getId", "()J");
+    counter.thread = env->CallLongMethod(current.get(), MethodOf(current.get(), "getId", "()J"));
+    if (!NoPending("the current thread's id")) return -1;
   }
   jvmtiHeapCallbacks callbacks = {};
-  callbacks.heap_reference_callback = &detail::CountLocalRoot;
+  callbacks.heap_reference_callback = [](jvmtiHeapReferenceKind kind, const jvmtiHeapReferenceInfo* info, jlong, jlong,
+                                         jlong, jlong*, jlong*, jint, void* data) -> jint {
+    Counter* c = static_cast<Counter*>(data);
+    if (kind == JVMTI_HEAP_REFERENCE_JNI_LOCAL && info && info->jni_local.thread_id == c->thread) ++c->count;
+    return 0;  // roots only
+  };
+  jvmtiCapabilities wanted = {};
+  wanted.can_tag_objects = 1;
   const bool walked = jvmti->AddCapabilities(&wanted) == JVMTI_ERROR_NONE &&
                       jvmti->FollowReferences(0, nullptr, nullptr, &callbacks, &counter) == JVMTI_ERROR_NONE;
   jvmti->DisposeEnvironment();
@@ -269,34 +246,23 @@ inline long LocalRefCount()
 
 inline long GlobalRefCount() { return VLXJBXJNIUtilities::GetGlobalRefCount(); }
 
-// ---- A replica with an attribute of every type ------------------------------------------------
-
 struct AttributeShape {
   const char* name;
   VLXKDMAttributeType::Type type;
   bool multi;
 };
 
-// The attributes of the class "Sample": one of each type, then one list of each type, so that the
-// attribute at position p (from 0) is single for p < 7 and a list of the same type at p + 7.
+// The attributes of the class "Sample": one of each type (Integer to Relationship), then a list of
+// each, so that the attribute at position p (from 0) is single for p < 7 and its list is at p + 7.
 inline const std::vector<AttributeShape>& SampleAttributes()
 {
-  static const std::vector<AttributeShape> attributes = {
-      {"integer", VLXKDMAttributeType::Integer, false},
-      {"double", VLXKDMAttributeType::Double, false},
-      {"string", VLXKDMAttributeType::String, false},
-      {"date", VLXKDMAttributeType::Date, false},
-      {"boolean", VLXKDMAttributeType::Boolean, false},
-      {"binary", VLXKDMAttributeType::Binary, false},
-      {"instance", VLXKDMAttributeType::Relationship, false},
-      {"integers", VLXKDMAttributeType::Integer, true},
-      {"doubles", VLXKDMAttributeType::Double, true},
-      {"strings", VLXKDMAttributeType::String, true},
-      {"dates", VLXKDMAttributeType::Date, true},
-      {"booleans", VLXKDMAttributeType::Boolean, true},
-      {"binaries", VLXKDMAttributeType::Binary, true},
-      {"instances", VLXKDMAttributeType::Relationship, true},
-  };
+  static const std::vector<AttributeShape> attributes = [] {
+    const char* const names[] = {"integer",  "double",  "string",  "date",  "boolean",  "binary",   "instance",
+                                 "integers", "doubles", "strings", "dates", "booleans", "binaries", "instances"};
+    std::vector<AttributeShape> out;
+    for (int p = 0; p < 14; ++p) out.push_back({names[p], static_cast<VLXKDMAttributeType::Type>(p % 7), p >= 7});
+    return out;
+  }();
   return attributes;
 }
 
@@ -305,8 +271,8 @@ inline void AddClass(VLXKDMReplica& replica, const char* className, const std::v
                      VLXKDMModel& model)
 {
   VLXKDMClassDef classDef;
-  ASSERT_EQ(VLX_S_OK, classDef.Build(VLXUnicodeString(className)));
   VLXKDMAttributeDefList list;
+  ASSERT_EQ(VLX_S_OK, classDef.Build(VLXUnicodeString(className)));
   ASSERT_EQ(VLX_S_OK, classDef.GetAttributes(list));
   for (const AttributeShape& shape : attributes) {
     VLXKDMAttributeDef attribute;
@@ -314,8 +280,8 @@ inline void AddClass(VLXKDMReplica& replica, const char* className, const std::v
     ASSERT_EQ(VLX_S_OK, attribute.SetMultiValuation(shape.multi ? 1 : 0));
     ASSERT_EQ(VLX_S_OK, list.Add(attribute));
   }
-  ASSERT_EQ(VLX_S_OK, model.Build(classDef));
   VLXKDMModelSet models;
+  ASSERT_EQ(VLX_S_OK, model.Build(classDef));
   ASSERT_EQ(VLX_S_OK, replica.GetModels(models));
   ASSERT_EQ(VLX_S_OK, models.Add(model));
 }

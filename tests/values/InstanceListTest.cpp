@@ -1,21 +1,19 @@
 // The list of instance proxies: construction, equality by Java identity, search, de-duplication,
 // resizing, the two Array forms, sorting, copies, and the global references its elements hold.
-#include <string>
-#include <vector>
-
-#include <gtest/gtest.h>
-
 #include "TestSupport.h"
 
 using namespace corvexa_test;
 
 namespace {
 
+std::vector<VLXKDMInstance>* gOrder = nullptr;
+
 class InstanceList : public ::testing::Test {
  protected:
   // Five distinct Java instances, A to E.
   std::vector<VLXKDMInstance> o = NewInstances(5);
   const VLXKDMInstance &A = o[0], &B = o[1], &C = o[2], &D = o[3], &E = o[4];
+  const long baseline = GlobalRefCount();
 
   // Proxies of their own (not the ones above) for the objects listed.
   VLXListValVLXKDMInstance Of(std::initializer_list<const VLXKDMInstance*> items)
@@ -36,9 +34,11 @@ class InstanceList : public ::testing::Test {
     }
     return out;
   }
+  // Every test's lists are gone by its end: their references are given back.
+  void TearDown() override { EXPECT_EQ(baseline, GlobalRefCount()); }
 };
 
-TEST_F(InstanceList, ConstructorsCopyTheGivenProxiesSkippingNullPointers)
+TEST_F(InstanceList, ConstructorsCopySkippingNullPointersAndEqualityIsJavaIdentity)
 {
   VLXKDMInstance* pointers[] = {&o[0], nullptr, &o[2]};
   EXPECT_EQ("AC", Letters(VLXListValVLXKDMInstance(pointers, 3)));
@@ -46,83 +46,60 @@ TEST_F(InstanceList, ConstructorsCopyTheGivenProxiesSkippingNullPointers)
   EXPECT_EQ("", Letters(VLXListValVLXKDMInstance(o.data(), 0)));
   EXPECT_EQ("", Letters(VLXListValVLXKDMInstance(pointers, -1)));
   EXPECT_EQ(0, VLXListValVLXKDMInstance(10, 99).Size());
+  EXPECT_NE(VLXListValVLXKDMInstance(pointers, 3)[1].GetHandle(), o[0].GetHandle());  // a reference of its own
 
-  VLXListValVLXKDMInstance list(pointers, 3);
-  EXPECT_NE(list[1].GetHandle(), o[0].GetHandle());  // a copy with a reference of its own
-}
-
-TEST_F(InstanceList, EqualityIsJavaIdentityPositionByPosition)
-{
   const VLXListValVLXKDMInstance abc = Of({&A, &B, &C});
-  EXPECT_TRUE(abc == Of({&A, &B, &C}));
-  EXPECT_FALSE(abc != Of({&A, &B, &C}));
-  EXPECT_TRUE(abc != Of({&A, &C, &B}));
-  EXPECT_TRUE(abc != Of({&A, &B}));
-  EXPECT_TRUE(abc == abc);
+  EXPECT_TRUE(abc == Of({&A, &B, &C}) && !(abc != Of({&A, &B, &C})) && abc == abc);
+  EXPECT_TRUE(abc != Of({&A, &C, &B}) && abc != Of({&A, &B}));
   EXPECT_TRUE(VLXListValVLXKDMInstance() == VLXListValVLXKDMInstance());
   VLXListValVLXKDMInstance unattached;
   unattached.Append(VLXKDMInstance());
-  EXPECT_TRUE(unattached != Of({&A}));
-  EXPECT_TRUE(unattached == VLXListValVLXKDMInstance(unattached));
+  EXPECT_TRUE(unattached != Of({&A}) && unattached == VLXListValVLXKDMInstance(unattached));
 }
 
 TEST_F(InstanceList, LocateFindsTheFirstEqualElementFromAPosition)
 {
   const VLXListValVLXKDMInstance list = Of({&A, &B, &C, &B});
-  const VLXKDMInstance x(B);  // another proxy of the same object
-  EXPECT_EQ(2, list.Locate(x, 1));
-  EXPECT_EQ(2, list.Locate(x, 2));
-  EXPECT_EQ(4, list.Locate(x, 3));
-  EXPECT_EQ(0, list.Locate(x, 5));
-  EXPECT_EQ(0, list.Locate(x, 1000));
-  EXPECT_EQ(2, list.Locate(x, 0));  // a start below 1 counts as 1
+  const VLXKDMInstance x(B);                                                 // another proxy of the same object
+  const int starts[] = {1, 2, 3, 5, 1000, 0}, found[] = {2, 2, 4, 0, 0, 2};  // a start below 1 counts as 1
+  for (int i = 0; i < 6; ++i) EXPECT_EQ(found[i], list.Locate(x, starts[i])) << starts[i];
   EXPECT_EQ(0, list.Locate(D, 1));
   EXPECT_EQ(0, list.Locate(VLXKDMInstance(), 1));
 }
 
 TEST_F(InstanceList, RemoveDuplicatesKeepsFirstOccurrencesInOrder)
 {
-  const long baseline = VLXJBXJNIUtilities::GetGlobalRefCount();
-  {
-    VLXListValVLXKDMInstance list = Of({&A, &B, &A, &A, &C});
-    EXPECT_EQ(2, list.RemoveDuplicates());
-    EXPECT_EQ("ABC", Letters(list));
-    EXPECT_EQ(baseline + 3, VLXJBXJNIUtilities::GetGlobalRefCount());  // the removed copies are released
-
-    list = Of({&D, &D, &D, &D});
-    EXPECT_EQ(3, list.RemoveDuplicates());
-    EXPECT_EQ("D", Letters(list));
-    EXPECT_EQ(0, list.RemoveDuplicates());
-    VLXListValVLXKDMInstance empty;
-    EXPECT_EQ(0, empty.RemoveDuplicates());
-  }
-  EXPECT_EQ(baseline, VLXJBXJNIUtilities::GetGlobalRefCount());
+  VLXListValVLXKDMInstance list = Of({&A, &B, &A, &A, &C}), empty;
+  EXPECT_EQ(2, list.RemoveDuplicates());
+  EXPECT_EQ("ABC", Letters(list));
+  EXPECT_EQ(baseline + 3, GlobalRefCount());  // the removed copies are released
+  list = Of({&D, &D, &D, &D});
+  EXPECT_EQ(3, list.RemoveDuplicates());
+  EXPECT_EQ("D", Letters(list));
+  EXPECT_EQ(0, list.RemoveDuplicates());
+  EXPECT_EQ(0, empty.RemoveDuplicates());
 }
 
 TEST_F(InstanceList, SizeGrowsWithCopiesOfTheFillerAndShrinksFromTheEnd)
 {
   FatalRecorder recorder;
-  const long baseline = VLXJBXJNIUtilities::GetGlobalRefCount();
-  {
-    VLXListValVLXKDMInstance list = Of({&A, &B});
-    list.Size(5, &E);
-    EXPECT_EQ("ABEEE", Letters(list));
-    list.Size(5, nullptr);
-    EXPECT_EQ("ABEEE", Letters(list));
-    list.Size(1, nullptr);
-    EXPECT_EQ("A", Letters(list));
-    EXPECT_EQ(baseline + 1, VLXJBXJNIUtilities::GetGlobalRefCount());
-    list.Size(3, nullptr);  // a null filler: unattached proxies
-    EXPECT_EQ("A--", Letters(list));
-    list.Size(4, &list[1]);  // the filler may be an element of the list itself
-    EXPECT_EQ("A--A", Letters(list));
-    list.Size(-1, &A);
-    EXPECT_EQ(4, list.Size());
-    EXPECT_EQ(1u, FatalRecorder::Reports().size());
-    list.Size(0, nullptr);
-    EXPECT_EQ(0, list.Size());
-  }
-  EXPECT_EQ(baseline, VLXJBXJNIUtilities::GetGlobalRefCount());
+  VLXListValVLXKDMInstance list = Of({&A, &B});
+  list.Size(5, &E);
+  EXPECT_EQ("ABEEE", Letters(list));
+  list.Size(5, nullptr);
+  EXPECT_EQ("ABEEE", Letters(list));
+  list.Size(1, nullptr);
+  EXPECT_EQ("A", Letters(list));
+  EXPECT_EQ(baseline + 1, GlobalRefCount());
+  list.Size(3, nullptr);  // a null filler: unattached proxies
+  EXPECT_EQ("A--", Letters(list));
+  list.Size(4, &list[1]);  // the filler may be an element of the list itself
+  EXPECT_EQ("A--A", Letters(list));
+  list.Size(-1, &A);
+  EXPECT_EQ(4, list.Size());
+  EXPECT_EQ(1u, FatalRecorder::Reports().size());
+  list.Size(0, nullptr);
+  EXPECT_EQ(0, list.Size());
 }
 
 TEST_F(InstanceList, ArrayOfPointersExposesTheListsOwnElementsAndArrayOfProxiesCopies)
@@ -133,7 +110,6 @@ TEST_F(InstanceList, ArrayOfPointersExposesTheListsOwnElementsAndArrayOfProxiesC
   for (int i = 0; i < 3; ++i) EXPECT_EQ(&list[i + 1], pointers[i]);
   ASSERT_EQ(VLX_S_OK, pointers[1]->SetHandle(Env(), D.GetHandle()));
   EXPECT_EQ("ADC", Letters(list));
-
   VLXKDMInstance proxies[3];
   list.Array(proxies);
   EXPECT_TRUE(proxies[0] == A && proxies[1] == D && proxies[2] == C);
@@ -155,7 +131,7 @@ TEST_F(InstanceList, CopiesAndAssignmentsAreIndependent)
     EXPECT_NE(target[1].GetHandle(), copy[1].GetHandle());
   }
   EXPECT_EQ("AB", Letters(target));
-  target = target;  // changes nothing
+  target = target;
   EXPECT_EQ("AB", Letters(target));
   target.RemoveAll(VLXCollec::KeepMemory);
   EXPECT_EQ(0, target.Size());
@@ -164,7 +140,6 @@ TEST_F(InstanceList, CopiesAndAssignmentsAreIndependent)
 }
 
 // Orders elements by the letter of their object (so by identity, not by proxy address).
-std::vector<VLXKDMInstance>* gOrder = nullptr;
 int ByLetter(VLXKDMInstance* a, VLXKDMInstance* b)
 {
   auto rank = [](VLXKDMInstance* x) {
@@ -185,36 +160,23 @@ TEST_F(InstanceList, QuickSortMovesOnlyPointersAndCompareComparesPositionByPosit
   EXPECT_EQ("AABCE", Letters(list));
   EXPECT_EQ(before[1], &list[1]);  // the first A stays the first A: same element object
   EXPECT_EQ(before[4], &list[2]);
-
   EXPECT_EQ(0, VLXListValVLXKDMInstance::Compare(list, Of({&A, &A, &B, &C, &E}), &ByLetter));
   EXPECT_LT(VLXListValVLXKDMInstance::Compare(list, Of({&A, &B}), &ByLetter), 0);
   EXPECT_GT(VLXListValVLXKDMInstance::Compare(list, Of({&A, &A}), &ByLetter), 0);
   gOrder = nullptr;
 }
 
-TEST_F(InstanceList, AHundredThousandElementsAreCopiedCrossToJavaAndAreReleased)
+TEST_F(InstanceList, AHundredThousandElementsAreCopiedAndReleased)
 {
-  const long baseline = VLXJBXJNIUtilities::GetGlobalRefCount();
-  {
-    VLXListValVLXKDMInstance list(100000);
-    for (int i = 0; i < 100000; ++i) list.Append(o[static_cast<size_t>(i % 5)]);
-    VLXListValVLXKDMInstance copy(list);
-    EXPECT_TRUE(copy == list);
-    EXPECT_EQ(baseline + 200000, VLXJBXJNIUtilities::GetGlobalRefCount());
-    EXPECT_EQ(99995, copy.RemoveDuplicates());
-    EXPECT_EQ("ABCDE", Letters(copy));
-
-    VLXKDMInstanceValue value;
-    value.SetListOfInstance(list);
-    ASSERT_EQ(VLX_S_OK, value.BuildRemote());
-    VLXKDMInstanceValue read;
-    ASSERT_EQ(VLX_S_OK, read.SetHandle(Env(), value.GetHandle()));
-    ASSERT_EQ(VLX_S_OK, read.BuildLocal());
-    EXPECT_TRUE(read.GetListOfInstance() == list);
-    list.Size(10, nullptr);
-    EXPECT_EQ(10, list.Size());
-  }
-  EXPECT_EQ(baseline, VLXJBXJNIUtilities::GetGlobalRefCount());
+  VLXListValVLXKDMInstance list(100000);
+  for (int i = 0; i < 100000; ++i) list.Append(o[static_cast<size_t>(i % 5)]);
+  VLXListValVLXKDMInstance copy(list);
+  EXPECT_TRUE(copy == list);
+  EXPECT_EQ(baseline + 200000, GlobalRefCount());
+  EXPECT_EQ(99995, copy.RemoveDuplicates());
+  EXPECT_EQ("ABCDE", Letters(copy));
+  list.Size(10, nullptr);
+  EXPECT_EQ(10, list.Size());
 }
 
 TEST_F(InstanceList, APositionOutOfRangeIsReportedAndAnsweredWithAnUnattachedProxy)
