@@ -188,6 +188,23 @@ long FromBinary(World& w, Outs& o)
   EXPECT_EQ(VLX_S_OK, VLXKDMReplica::GetBinaryFromReplica(w.r, 1, bytes));
   return VLXKDMReplica::GetReplicaFromBinary(bytes, 1, o.r);
 }
+// A limit past 32 bits set and read back (o.n becomes 1 when it came back whole); the default again.
+long LimitBack(Outs& o)
+{
+  long long back = 0;
+  long rc = VLXKDMReplica::SetLimit(U("maxInflatedSize"), 1LL << 33);
+  if (rc >= 0) rc = VLXKDMReplica::GetLimit(U("maxInflatedSize"), back);
+  if (back == 1LL << 33) o.n = 1;
+  VLXKDMReplica::SetLimit(U("maxInflatedSize"), 1LL << 30);
+  return rc;
+}
+long FolderBack(Outs& o)
+{
+  long rc = VLXKDMReplica::SetSchemaFolder(U("/"));
+  if (rc >= 0) rc = VLXKDMReplica::GetSchemaFolder(o.s);
+  VLXKDMReplica::SetSchemaFolder(U(""));
+  return rc;
+}
 const std::string& DocumentFile()
 {
   static const std::string path = [] {
@@ -248,6 +265,10 @@ const Operation kOperations[] = {
     FREE(REP "SetSchemaLocation(const VLXUnicodeString&)", "", VLXKDMReplica::SetSchemaLocation(U(""))),
     OP(REP "GetSchemaLocation(VLXUnicodeString&)", "text", w.r.GetSchemaLocation(o.s)),
     FREE(REP "SetFeature(const VLXUnicodeString&, VLXBoolean)", "", VLXKDMReplica::SetFeature(U("indent"), 1)),
+    FREE(REP "SetLimit(const VLXUnicodeString&, long long)", "", VLXKDMReplica::SetLimit(U("maxElementDepth"), 256)),
+    FREE(REP "GetLimit(const VLXUnicodeString&, long long&)", "number=1", LimitBack(o)),
+    FREE(REP "SetSchemaFolder(const VLXUnicodeString&)", "", VLXKDMReplica::SetSchemaFolder(U(""))),
+    FREE(REP "GetSchemaFolder(VLXUnicodeString&)", "text=/", FolderBack(o)),
     OP(REP "InsertSchemaFile(const VLXUnicodeString&)", "classDef",
        THEN(w.r.InsertSchemaFile(U(kExamples + "/inventory.xsd")), w.r.GetClassDef(U("Bolt"), o.c))),
     OP(REP "InsertSchemaString(const VLXUnicodeString&)", "classDef",
