@@ -113,6 +113,62 @@ final class Limits {
             }
         }
 
+        /** Sees {@code n} characters; runs of text and of attribute values are passed over in one loop. */
+        void see(char[] b, int off, int n) throws Exceeded {
+            for (int i = off, end = off + n; i < end; i++) {
+                int j = i;
+                if (state == TEXT) {
+                    while (j < end && b[j] != '<') {
+                        j++;
+                    }
+                } else if (state == QUOTED) {
+                    while (j < end && b[j] != quote) {
+                        j++;
+                    }
+                }
+                i = skipped(i, j, end);
+                if (i < end) {
+                    see(b[i]);
+                }
+            }
+        }
+
+        /** {@link #see(char[], int, int)} for bytes (of an encoding whose markup is ASCII). */
+        void see(byte[] b, int off, int n) throws Exceeded {
+            for (int i = off, end = off + n; i < end; i++) {
+                int j = i;
+                if (state == TEXT) {
+                    while (j < end && b[j] != '<') {
+                        j++;
+                    }
+                } else if (state == QUOTED) {
+                    while (j < end && b[j] != quote) {
+                        j++;
+                    }
+                }
+                i = skipped(i, j, end);
+                if (i < end) {
+                    see(b[i] & 0xFF);
+                }
+            }
+        }
+
+        /** Counts the units from i to j passed over as text or attribute value; returns j. */
+        private int skipped(int i, int j, int end) throws Exceeded {
+            if (j > i) {
+                size += j - i;
+                run += j - i;
+                if (size > maxSize) {
+                    throw new Exceeded(exceeded("the document", "maxDocumentSize", maxSize));
+                }
+                if (run > (state == TEXT ? maxText : maxAttribute)) {
+                    throw new Exceeded(state == TEXT ? exceeded("a text", "maxTextLength", maxText)
+                            : exceeded("an attribute value", "maxAttributeLength", maxAttribute));
+                }
+            }
+            return j;
+        }
+
         void see(int c) throws Exceeded {
             if (++size > maxSize) {
                 throw new Exceeded(exceeded("the document", "maxDocumentSize", maxSize));
@@ -186,8 +242,8 @@ final class Limits {
             @Override
             public int read(char[] b, int off, int len) throws IOException {
                 int n = super.read(b, off, len);
-                for (int i = 0; i < n; i++) {
-                    scan.see(b[off + i]);
+                if (n > 0) {
+                    scan.see(b, off, n);
                 }
                 return n;
             }
@@ -264,10 +320,10 @@ final class Limits {
             @Override
             public int read(byte[] b, int off, int len) throws IOException {
                 int n = super.read(b, off, len);
-                for (int i = 0; i < n; i++) {
-                    if (width == 1) {
-                        scan.see(b[off + i] & 0xFF);
-                    } else {
+                if (n > 0 && width == 1) {
+                    scan.see(b, off, n);
+                } else {
+                    for (int i = 0; i < n; i++) {
                         byteSeen(b[off + i] & 0xFF);
                     }
                 }
