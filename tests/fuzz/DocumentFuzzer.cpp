@@ -7,11 +7,15 @@
 //
 // "<harness> --write-seeds DIR" writes seed inputs for its reader into DIR, made by the library from
 // a replica built here (every attribute type, committed data and pending changes), and exits.
+#include <cctype>
 #include <cstdio>
 #include <cstdlib>
 #include <cstring>
 #include <fstream>
+#include <set>
 #include <string>
+
+#include <zlib.h>
 
 #include "VLXError.h"
 #include "VLXKDMAttributeDef.h"
@@ -41,13 +45,46 @@ std::string LastError(long rc)
   return text;
 }
 
+void PutU32(std::string& bytes, size_t at, uLong value)
+{
+  for (int i = 0; i < 4; ++i) bytes[at + i] = static_cast<char>((value >> (24 - 8 * i)) & 0xFF);
+}
+
+// Inputs of the byte readers that start with the header's magic get its lengths and checksum made
+// right, so that mutations reach the payload reader instead of failing the checksum. For the
+// compressed reader, an uncompressed frame is deflated here; a compressed one (flags bit 0) keeps
+// its stream and announced length, for the inflating steps. Other inputs are read as they are.
+std::string Framed(std::string input)
+{
+  const size_t kHeader = 20;
+  if (input.size() < kHeader || input.compare(0, 4, "CVRB") != 0) return input;
+  auto payload = reinterpret_cast<const Bytef*>(input.data() + kHeader);
+  uInt length = static_cast<uInt>(input.size() - kHeader);
+  if (kReader == kCompressed && (input[5] & 1) == 0) {
+    uLongf deflatedLength = compressBound(length);
+    std::string deflated(deflatedLength, '\0');
+    compress(reinterpret_cast<Bytef*>(&deflated[0]), &deflatedLength, payload, length);
+    PutU32(input, 8, length);
+    PutU32(input, 16, crc32(0, payload, length));
+    input.replace(kHeader, std::string::npos, deflated, 0, deflatedLength);
+    input[5] = static_cast<char>(input[5] | 1);
+  } else if (kReader == kBytes) {
+    PutU32(input, 8, length);
+    PutU32(input, 16, crc32(0, payload, length));
+  }
+  PutU32(input, 12, static_cast<uLong>(input.size() - kHeader));
+  return input;
+}
+
 long Read(const std::string& document, VLXKDMReplica& replica)
 {
   switch (kReader) {
     case kBytes:
-    case kCompressed:
-      return VLXKDMReplica::GetReplicaFromBinary(VLXBinary(document.data(), static_cast<int>(document.size())),
+    case kCompressed: {
+      const std::string framed = Framed(document);
+      return VLXKDMReplica::GetReplicaFromBinary(VLXBinary(framed.data(), static_cast<int>(framed.size())),
                                                  kReader == kCompressed, replica);
+    }
     case kXml:
       return VLXKDMReplica::ReadFromXmlString(U(document), replica);
     case kXsd: {
@@ -88,15 +125,20 @@ long Write(VLXKDMReplica& replica, std::string& document)
 }
 
 // What became of an input, as a feature for libFuzzer: the parsing happens in Java, out of reach of
-// the coverage instrumentation, so each distinct reason of refusal (the message without its
-// numbers and quoted parts) and each size class of accepted writing count as new coverage.
+// the coverage instrumentation, so each distinct reason of refusal (the message up to its sixth
+// colon, without numbers and quoted parts: the parser's own detail is left out) and each size
+// class of accepted writing count as new coverage.
+long g_inputs = 0, g_accepted = 0;
+
 __attribute__((section("__libfuzzer_extra_counters"))) unsigned char g_outcomes[4096];
 
 void Outcome(const std::string& text, size_t sizeClass = 0)
 {
   size_t hash = 14695981039346656037ULL + sizeClass;
   bool quoted = false;
+  int colons = 0;
   for (char c : text) {
+    if (c == ':' && ++colons == 6) break;
     if (c == '\'' || c == '"') quoted = !quoted;
     if (quoted || (c >= '0' && c <= '9')) continue;
     hash = (hash ^ static_cast<unsigned char>(c)) * 1099511628211ULL;
@@ -193,16 +235,37 @@ void WriteSeed(const std::string& path, const std::string& content)
   std::ofstream(path, std::ios::binary) << content;
 }
 
+// A libFuzzer dictionary of the names and markup of an XML text.
+void WriteDictionary(const std::string& path, const std::string& xml)
+{
+  std::set<std::string> words = {"<", "</", "/>", ">", "=\"", "<!--", "-->", "<![CDATA[", "]]>", "&amp;", "&#"};
+  for (size_t at = 0; at < xml.size();) {
+    size_t end = at;
+    while (end < xml.size() && (std::isalnum(static_cast<unsigned char>(xml[end])) || std::strchr("_:.-", xml[end])))
+      ++end;
+    if (end - at > 1 && end - at < 64) words.insert(xml.substr(at, end - at));
+    at = end + 1;
+  }
+  std::ofstream out(path);
+  for (const std::string& word : words) {
+    out << '"';
+    for (char c : word) out << (c == '"' || c == '\\' ? "\\" : "") << c;
+    out << "\"\n";
+  }
+}
+
 int WriteSeeds(const std::string& dir)
 {
   VLXKDMReplica plant, empty;
   BuildPlant(plant);
   SEED_CHECK(empty.Build(VLXUnicodeString("empty")));
   if (kReader == kBytes || kReader == kCompressed) {
+    // Uncompressed frames for both readers (Framed deflates them for the compressed one), and
+    // compressed ones for the compressed reader.
     VLXKDMReplica* replicas[] = {&plant, &empty};
-    for (int i = 0; i < 2; ++i) {
+    for (int i = 0; i < (kReader == kCompressed ? 4 : 2); ++i) {
       VLXBinary bytes;
-      SEED_CHECK(VLXKDMReplica::GetBinaryFromReplica(*replicas[i], kReader == kCompressed, bytes));
+      SEED_CHECK(VLXKDMReplica::GetBinaryFromReplica(*replicas[i % 2], i >= 2, bytes));
       WriteSeed(dir + "/seed-" + std::to_string(i),
                 std::string(reinterpret_cast<const char*>(bytes.getData()), static_cast<size_t>(bytes.getLength())));
     }
@@ -210,6 +273,7 @@ int WriteSeeds(const std::string& dir)
     VLXUnicodeString xsd;
     SEED_CHECK(plant.GetXsd(xsd));
     WriteSeed(dir + "/seed-plant", Text(xsd));
+    WriteDictionary(dir + ".dict", Text(xsd));
   } else {
     // With the schema embedded, with and without pending changes; and without it, naming a schema
     // file written beside the directory.
@@ -226,6 +290,7 @@ int WriteSeeds(const std::string& dir)
     SEED_CHECK(VLXKDMReplica::SetSchemaLocation(U(schemaFile)));
     SEED_CHECK(plant.GetXml(0, 1, xml));
     WriteSeed(dir + "/seed-located", Text(xml));
+    WriteDictionary(dir + ".dict", Text(xml) + Text(xsd));
     SEED_CHECK(empty.GetXml(1, 0, xml));
     WriteSeed(dir + "/seed-empty", Text(xml));
   }
@@ -238,6 +303,7 @@ int WriteSeeds(const std::string& dir)
 extern "C" int LLVMFuzzerInitialize(int* argc, char*** argv)
 {
   if (*argc == 3 && std::strcmp((*argv)[1], "--write-seeds") == 0) std::exit(WriteSeeds((*argv)[2]));
+  std::atexit([] { std::fprintf(stderr, "corvexa-fuzz: %ld of %ld inputs accepted\n", g_accepted, g_inputs); });
   // Starts the JVM now, before libFuzzer installs its signal handlers and starts timing inputs.
   VLXKDMReplica replica;
   if (VLX_FAILED(replica.Build())) Finding("the JVM could not be started", LastError(VLX_E_FAIL));
@@ -249,7 +315,9 @@ extern "C" int LLVMFuzzerTestOneInput(const uint8_t* data, size_t size)
   const std::string input(reinterpret_cast<const char*>(data), size);
   VLXKDMReplica first, second;
   long rc = Read(input, first);
+  ++g_inputs;
   if (VLX_FAILED(rc)) {
+    if (std::getenv("CORVEXA_FUZZ_VERBOSE")) std::fprintf(stderr, "refused: %s\n", LastError(rc).c_str());
     Outcome(LastError(rc));
     VLXError::VLXCleanLastError();
     return 0;
@@ -261,5 +329,6 @@ extern "C" int LLVMFuzzerTestOneInput(const uint8_t* data, size_t size)
   if (VLX_FAILED(rc = Write(second, rewritten))) Finding("a read writing could not be written", LastError(rc));
   if (written != rewritten) Finding("the two writings differ", "-- first:\n" + written + "\n-- second:\n" + rewritten);
   Outcome("accepted", written.size() / 64);
+  ++g_accepted;
   return 0;
 }
