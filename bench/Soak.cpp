@@ -1,8 +1,8 @@
 // corvexa-soak: a long run of ordinary operations on one replica (create an instance, set and get
 // values, delete, commit), then a churn of short-lived threads that each make a few calls. At each
 // million operations, and every 5,000 threads, it prints the bridge's global reference count, the
-// Java heap in use and the process's resident memory: steady figures mean nothing leaks. Figures,
-// not a test (scripts/run-soak); exits non-zero when an operation fails.
+// Java heap live after a collection, the resident memory and the thread count: steady figures mean
+// nothing leaks. Figures, not a test (scripts/run-soak); exits non-zero when an operation fails.
 //   corvexa-soak [operations (10,000,000)] [threads (20,000)]
 #include <chrono>
 #include <cstdio>
@@ -45,12 +45,15 @@ std::string Status(const std::string& key)
   return "?";
 }
 
+// The Java heap in use after a collection: what is still reachable (retired thread-local buffers
+// of detached threads would otherwise count as used until the next collection).
 long JavaHeapUsedKb()
 {
   JNIEnv* env = nullptr;
   if (VLX_FAILED(VLXJBXJNIUtilities::GetJNIEnv(env, VLXListValVLXUnicodeString()))) return -1;
   jclass cls = env->FindClass("java/lang/Runtime");
   jobject runtime = env->CallStaticObjectMethod(cls, env->GetStaticMethodID(cls, "getRuntime", "()Ljava/lang/Runtime;"));
+  env->CallVoidMethod(runtime, env->GetMethodID(cls, "gc", "()V"));
   const jlong used = env->CallLongMethod(runtime, env->GetMethodID(cls, "totalMemory", "()J")) -
                      env->CallLongMethod(runtime, env->GetMethodID(cls, "freeMemory", "()J"));
   env->DeleteLocalRef(runtime);
@@ -61,7 +64,7 @@ long JavaHeapUsedKb()
 void Report(const char* what, long done)
 {
   const double seconds = std::chrono::duration<double>(std::chrono::steady_clock::now() - g_start).count();
-  std::printf("%-8s %10ld  global refs %6ld  Java heap used %8ld kB  RSS %-10s  threads %-4s  %7.1f s\n", what, done,
+  std::printf("%-8s %10ld  global refs %6ld  Java heap live %8ld kB  RSS %-10s  threads %-4s  %7.1f s\n", what, done,
               VLXJBXJNIUtilities::GetGlobalRefCount(), JavaHeapUsedKb(), Status("VmRSS").c_str(),
               Status("Threads").c_str(), seconds);
   std::fflush(stdout);
@@ -94,8 +97,8 @@ int main(int argc, char** argv)
   Check(model.GetInstances(instances), "GetInstances");
   Report("start", 0);
 
-  // The mix, out of 16: 2 creations (while fewer than 1,000 instances live), 6 sets, 6 gets,
-  // 1 deletion, 1 commit every 1,000th operation (else a get). Choices from a fixed generator.
+  // The mix, out of 16: 2 creations with their three values (sets once 1,000 instances live),
+  // 6 sets, 1 deletion, 7 gets; every 1,000th operation a commit. Choices from a fixed generator.
   std::vector<VLXKDMInstance> live;
   unsigned long state = 12345;
   const VLXUnicodeString nName("n"), sName("s"), dName("d"), text("a value of some length \xE2\x9C\x93");
@@ -109,6 +112,9 @@ int main(int argc, char** argv)
     } else if (!some || (kind < 2 && live.size() < 1000)) {
       live.emplace_back();
       Check(model.CreateInstance(live.back()), "CreateInstance");
+      Check(live.back().SetValue(nName, 0), "SetValue");
+      Check(live.back().SetValue(sName, text), "SetValue");
+      Check(live.back().SetValue(dName, 0.0), "SetValue");
     } else if (kind < 8) {
       Check(kind % 3 == 0   ? some->SetValue(nName, static_cast<int>(op))
             : kind % 3 == 1 ? some->SetValue(sName, text)
@@ -129,6 +135,7 @@ int main(int argc, char** argv)
   // Thread churn: up to 8 at a time, each attached on its first call and detached at its exit.
   VLXKDMInstance shared;
   Check(model.CreateInstance(shared), "CreateInstance");
+  Check(shared.SetValue(nName, 1), "SetValue");
   for (long started = 0; started < threads;) {
     std::vector<std::thread> batch;
     for (int i = 0; i < 8 && started < threads; ++i, ++started)
@@ -137,6 +144,7 @@ int main(int argc, char** argv)
         VLXKDMInstanceValue got;
         Check(model.CreateInstance(own), "CreateInstance (thread)");
         Check(own.SetValue(VLXUnicodeString("n"), static_cast<int>(started)), "SetValue (thread)");
+        Check(own.GetValue(VLXUnicodeString("n"), got), "GetValue (thread)");
         Check(shared.GetValue(VLXUnicodeString("n"), got), "GetValue (thread)");
       });
     for (std::thread& t : batch) t.join();
