@@ -309,6 +309,8 @@ extern "C" int LLVMFuzzerInitialize(int* argc, char*** argv)
   // Starts the JVM now, before libFuzzer installs its signal handlers and starts timing inputs.
   VLXKDMReplica replica;
   if (VLX_FAILED(replica.Build())) Finding("the JVM could not be started", LastError(VLX_E_FAIL));
+  // The located seed names its schema file beside the corpus, in the directory the harness runs in.
+  if (VLX_FAILED(VLXKDMReplica::SetSchemaFolder(U(".")))) Finding("no schema folder", LastError(VLX_E_FAIL));
   return 0;
 }
 
