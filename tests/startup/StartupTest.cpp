@@ -172,9 +172,11 @@ TEST(StartupConcurrent, SixteenFirstCallsAtOnceCreateAndFillTheTableOnce)
   // With every proxy gone, the only global references left are the table's own: 27 classes and
   // 17 constants. A second filling would have doubled them.
   EXPECT_EQ(27 + 17, VLXJBXJNIUtilities::GetGlobalRefCount());
-  // Every thread has left the JVM, the one that created it ("main") too.
+  // Every thread has left the JVM, those the bridge attached (but this one, for the check) and the
+  // one that created it ("main").
   const std::string live = JavaThreads();
   EXPECT_EQ(std::string::npos, live.find("Thread[main,")) << live;
+  EXPECT_EQ(live.find("VLXJBX-attached-"), live.rfind("VLXJBX-attached-")) << "only this one: " << live;
 }
 
 // An exception that the application left pending at the process's first call fails that call,
