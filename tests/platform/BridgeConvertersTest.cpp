@@ -118,6 +118,14 @@ TEST_F(ConverterTest, StringListsCrossElementByElement)
   EXPECT_EQ(out, nullptr);
   const std::string text = TakeLastError().text;
   EXPECT_TRUE(Has(text, "the byte at offset 3 of element 5 of the list is not valid UTF-8 (truncated")) << text;
+
+  // Each element's local reference goes at once: 1000 kept would pass the test's local frame, which
+  // -Xcheck:jni reports.
+  VLXListValVLXUnicodeString many(1000);
+  for (int i = 0; i < 1000; ++i) many.Append("element");
+  ASSERT_EQ(Conv::ConvertToJavaType(env, many, out), VLX_S_OK);
+  ASSERT_EQ(Conv::BuildFromJavaType(env, out, back), VLX_S_OK);
+  EXPECT_TRUE(back == many);
 }
 
 // Any non-zero byte crosses as true; int and double extremes cross exactly, the last element too,
