@@ -102,11 +102,6 @@ inline jlong TimeOf(jobject date)
   const jlong value = Env()->CallLongMethod(date, MethodOf(date, "getTime", "()J"));
   return NoPending("getTime") ? value : 0;
 }
-inline jboolean BooleanOf(jobject boxed)
-{
-  const jboolean value = Env()->CallBooleanMethod(boxed, MethodOf(boxed, "booleanValue", "()Z"));
-  return NoPending("booleanValue") ? value : 0;
-}
 // An int field of a test double (they count calls).
 inline int IntField(jobject object, const char* field)
 {
@@ -133,10 +128,6 @@ inline jobjectArray NewArray(const char* elementClass, const std::vector<jobject
   for (size_t i = 0; i < elements.size() && NoPending("making an array"); ++i)
     env->SetObjectArrayElement(array, static_cast<jsize>(i), elements[i]);
   return NoPending("filling an array") ? array : nullptr;
-}
-inline jobject Element(jobject array, int index)
-{
-  return Env()->GetObjectArrayElement(static_cast<jobjectArray>(array), index);
 }
 inline int Length(jobject array) { return array ? Env()->GetArrayLength(static_cast<jarray>(array)) : -1; }
 inline bool Same(jobject a, jobject b) { return Env()->IsSameObject(a, b) == JNI_TRUE; }

@@ -93,7 +93,7 @@ TEST_F(Converters, SecondsBecomeMillisecondsAndComeBackUnchanged)
   EXPECT_TRUE(IsExactly(array.get(), "[Ljava/util/Date;"));
   ASSERT_EQ(list.Size(), Length(array.get()));
   for (int i = 0; i < list.Size(); ++i) {
-    Local date(Element(array.get(), i));
+    Local date(env->GetObjectArrayElement(static_cast<jobjectArray>(array.get()), i));
     EXPECT_EQ(cases[i] * 1000, TimeOf(date.get()));
   }
 }
@@ -125,7 +125,6 @@ T Boxed(JNIEnv* env, T value, const char* path)
   EXPECT_EQ(VLX_S_OK, Values::ConvertToJavaType(env, value, out));
   Local boxed(out);
   EXPECT_TRUE(IsExactly(boxed.get(), path));
-  EXPECT_TRUE((!std::is_same_v<T, VLXBoolean> || value == BooleanOf(boxed.get())));
   T back = 7;
   EXPECT_EQ(VLX_S_OK, Values::BuildFromJavaType(env, boxed.get(), back));
   return back;
