@@ -169,27 +169,6 @@ TEST(Frame, BuildAttachesANewObjectAndAFailedOneKeepsTheOld)
   EXPECT_EQ(5, position);
 }
 
-// Copies and assignments take global references of their own, outlive their source, and give
-// their references back.
-TEST(Frame, CopiesStayValidAfterTheSourceIsDestroyed)
-{
-  const long baseline = GlobalRefCount();
-  {
-    VLXKDMReplica* source = new VLXKDMReplica;
-    ASSERT_EQ(VLX_S_OK, source->Build(U("shared")));
-    VLXKDMReplica copy(*source), assigned;
-    assigned = *source;
-    EXPECT_TRUE(copy == *source);
-    EXPECT_EQ(baseline + 3, GlobalRefCount());
-    delete source;
-    EXPECT_EQ("shared", NameOf(copy));
-    EXPECT_EQ("shared", NameOf(assigned));
-    assigned = assigned;
-    EXPECT_TRUE(assigned == copy);
-  }
-  EXPECT_EQ(baseline, GlobalRefCount());
-}
-
 // (That the shared library exports it under its plain name is checked by corvexa_exports.)
 TEST(Marker, ReturnsOne) { EXPECT_EQ(1, VELMORA_QKA2_INTERNAL_Corvexa()); }
 

@@ -10,6 +10,8 @@ namespace {
 
 TEST(Strings, NamesSurviveARoundTripByteForByte)
 {
+  std::string euros;  // 8191 units of three bytes each: the converter's pieces hold 8192 units
+  for (int i = 0; i < 8191; ++i) euros += "\xE2\x82\xAC";
   const std::string samples[] = {
       "plain",
       "Zo\xC3\xAB \xC3\x85ngstr\xC3\xB6m, na\xC3\xAFve caf\xC3\xA9",  // Latin accents
@@ -19,6 +21,7 @@ TEST(Strings, NamesSurviveARoundTripByteForByte)
       "\xEF\xBF\xBF edge \xF4\x8F\xBF\xBF",                           // U+FFFF, U+10FFFF
       "",
       std::string(70000, 'x'),
+      euros + "\xF0\x9F\x98\x80 \xEE\x80\x80\xED\x9F\xBF",  // a pair across two pieces, U+E000, U+D7FF
   };
   VLXKDMReplica replica;
   ASSERT_EQ(VLX_S_OK, replica.Build());
@@ -50,8 +53,13 @@ TEST(Strings, AMalformedTextArgumentGivesEachOperationsOwnCode)
   VLXKDMInstanceValue value, holder;
   value.SetInteger(8);
   holder.SetInteger(4);
-  for (const char* malformed : {"bad \xC3\x28 byte", "\xED\xA0\x80 surrogate", "\xC0\xAF overlong", "cut \xE6\x95",
-                                "\xF5\x80\x80\x80 too big"}) {
+  // Each malformed text and the offset of its first bad byte (after the ASCII start copied first).
+  const std::pair<const char*, int> kinds[] = {{"bad \xC3\x28 byte", 4},
+                                               {"\xED\xA0\x80 surrogate", 0},
+                                               {"\xC0\xAF overlong", 0},
+                                               {"cut \xE6\x95", 4},
+                                               {"\xF5\x80\x80\x80 too big", 0}};
+  for (const auto& [malformed, offset] : kinds) {
     const VLXUnicodeString bad(malformed);
     const VLXListOfVLXUnicodeString badList = ListOf<VLXListOfVLXUnicodeString>({U("fine"), bad});
     const struct {
@@ -81,7 +89,9 @@ TEST(Strings, AMalformedTextArgumentGivesEachOperationsOwnCode)
       SCOPED_TRACE(std::string(c.what) + " with " + malformed);
       ClearLastError();
       EXPECT_EQ(c.expected, c.call());
-      EXPECT_TRUE(Has(PeekLastError().text, "UTF-8")) << PeekLastError().text;
+      const std::string text = PeekLastError().text;
+      EXPECT_TRUE(Has(text, "the byte at offset " + std::to_string(offset) + " of ") && Has(text, "not valid UTF-8"))
+          << text;
     }
   }
   EXPECT_EQ(9, flag);

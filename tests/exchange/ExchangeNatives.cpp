@@ -6,7 +6,6 @@
 #include <string>
 
 #include "VLXError.h"
-#include "VLXJBXJNIUtilities.h"
 #include "VLXKDMReplica.h"
 
 namespace {
@@ -78,32 +77,6 @@ JNIEXPORT jboolean JNICALL Java_com_velmora_tessara_exchange_ExchangeNatives_unb
   jobject out = reinterpret_cast<jobject>(&proxy);  // anything but null
   const long rc = proxy.ConvertToJavaType(env, out);
   return rc >= 0 && out == nullptr && proxy.exchangedWithJava == 1;
-}
-
-// Runs every exchange operation count times inside this one native frame: the references the
-// operations keep for the Java caller must not pile up beyond one per iteration, which the caller
-// frees here.
-JNIEXPORT jint JNICALL Java_com_velmora_tessara_exchange_ExchangeNatives_exchangeLoop(JNIEnv* env, jclass,
-                                                                                      jobject replica, jobject holder,
-                                                                                      jint count)
-{
-  for (jint i = 0; i < count; ++i) {
-    VLXKDMReplica proxy;
-    if (proxy.BuildFromJavaType(env, replica) < 0) return i;
-    jobject out = nullptr;
-    if (proxy.ConvertToJavaType(env, out) < 0) return i;
-    env->DeleteLocalRef(out);
-    jobject filled = holder;
-    if (proxy.ConvertToJavaHolder(env, filled) < 0) return i;
-    VLXKDMReplica back;
-    if (back.BuildFromJavaHolder(env, holder) < 0 || !(back == proxy)) return i;
-  }
-  return count;
-}
-
-JNIEXPORT jlong JNICALL Java_com_velmora_tessara_exchange_ExchangeNatives_globalRefCount(JNIEnv*, jclass)
-{
-  return VLXJBXJNIUtilities::GetGlobalRefCount();
 }
 
 JNIEXPORT jstring JNICALL Java_com_velmora_tessara_exchange_ExchangeNatives_lastError(JNIEnv* env, jclass)

@@ -170,10 +170,6 @@ TYPED_TEST(ValueList, OutOfRangePositionsAreReportedAndHarmlessWhenTheHandlerRet
   EXPECT_TRUE(list == this->Of({1, 2}));
 }
 
-struct Item {
-  int key, serial;
-};
-int ByKey(Item* a, Item* b) { return a->key - b->key; }
 int ByPointedInt(const void* a, const void* b) { return *static_cast<const int*>(a) - *static_cast<const int*>(b); }
 
 TEST(RawCollPV, PositionsLocateSizeStorageAndOutOfRangeReports)
@@ -213,32 +209,18 @@ TEST(RawCollPV, PositionsLocateSizeStorageAndOutOfRangeReports)
   EXPECT_EQ(static_cast<const VLXRawCollPV&>(list)[0], nullptr);
   VLXCollecRoot* root = new VLXRawCollPV(8);
   delete root;  // virtual destructor: no leak under the sanitizer
-}
-
-TEST(RawCollPV, SortsAreStableAndCompareOrdersElementwiseThenBySize)
-{
-  int values[] = {5, -2, 9, 0, 5, 3};
+  // Sorts are stable; without a comparison pointers compare by address. (Comparing lists:
+  // values/InstanceListTest, through the instance list built on this one.)
+  int values[] = {5, -2, 9, 5};
   VLXRawCollPV ints;
   for (int& v : values) ints.Append(&v);
+  VLXRawCollPV copy(ints);
   ints.QuickSort(&ByPointedInt);
-  const int order[] = {1, 3, 5, 0, 4, 2};  // the two 5s keep their order
-  for (int p = 1; p <= 6; ++p) EXPECT_EQ(ints[p], &values[order[p - 1]]) << p;
-
-  Item items[] = {{3, 0}, {1, 1}, {3, 2}, {2, 3}};
-  VLXRawCollPV list, prefix;
-  for (Item& i : items) list.Append(&i);
-  VLXRawCollPV copy(list);
-  list.QuickSort(&ByKey);
-  const int serials[] = {1, 3, 0, 2};
-  for (int p = 1; p <= 4; ++p) EXPECT_EQ(static_cast<Item*>(list[p])->serial, serials[p - 1]) << p;
-  EXPECT_EQ(static_cast<Item*>(copy[1])->serial, 0) << "the copy is a separate list";
-  prefix.Append(list[1]);
-  EXPECT_EQ(VLXRawCollPV::Compare(list, list, &ByKey), 0);
-  EXPECT_GT(VLXRawCollPV::Compare(copy, list, &ByKey), 0) << "key 3 against key 1 at position 1";
-  EXPECT_LT(VLXRawCollPV::Compare(prefix, list, &ByKey), 0) << "a prefix is smaller";
-  EXPECT_GT(VLXRawCollPV::Compare(list, prefix, &ByKey), 0);
-  EXPECT_LT(VLXRawCollPV::Compare(&values[0], &values[1]), 0) << "pointers compare by address";
-  EXPECT_GT(VLXRawCollPV::Compare(&values[1], &values[0]), 0);
+  EXPECT_TRUE(ints[1] == &values[1] && ints[2] == &values[0] && ints[3] == &values[3] && ints[4] == &values[2]);
+  copy.RemovePosition(2);
+  copy.Append(&values[1]);
+  copy.QuickSort(nullptr);
+  EXPECT_TRUE(copy[1] == &values[0] && copy[2] == &values[1] && copy[4] == &values[3]) << "a separate list";
   EXPECT_LT(VLXRawCollPV::Compare(nullptr, &values[0]), 0);
 }
 
@@ -258,14 +240,6 @@ struct CountedError : VLXError {
   using VLXError::VLXError;
   ~CountedError() override { ++g_destroyed; }
 };
-
-TEST(ResultCodes, FailuresAreNegativeLongsOnThisPlatform)
-{
-  for (long code : {VLX_E_FAIL, VLX_E_INVALIDARG, VLX_E_OUTOFMEMORY, VLX_E_NOTIMPL, VLX_E_NOINTERFACE})
-    EXPECT_TRUE(code < 0 && VLX_FAILED(code) && !VLX_SUCCEEDED(code)) << std::hex << code;
-  EXPECT_EQ(VLX_E_FAIL, -2147467259L);
-  EXPECT_TRUE(VLX_SUCCEEDED(VLX_S_OK) && VLX_SUCCEEDED(1));
-}
 
 TEST(BaseUnknown, TheLastReleaseDeletesEvenUnderConcurrentAddRefAndRelease)
 {

@@ -25,7 +25,7 @@ TEST_F(LookupTest, ClassLookupMakesACountedGlobalReferenceOrReportsWhyNot)
   EXPECT_EQ(cls, sentinel);
   EXPECT_FALSE(env->ExceptionCheck());
   EXPECT_EQ(Util::GetGlobalRefCount(), before);
-  const ErrorView e = TakeLastError();
+  const LastError e = TakeLastError();
   EXPECT_EQ(e.id, VLXJBXMessages::LookupFailed);
   EXPECT_TRUE(Has(e.text, "class 'com/nowhere/Missing' could not be found")) << e.text;
   EXPECT_TRUE(Has(e.text, "java.lang.NoClassDefFoundError")) << e.text;
@@ -68,7 +68,7 @@ TEST_F(LookupTest, MemberLookupsNameTheMemberTheSignatureAndTheClass)
                     : c.kind == StaticMethod ? Util::GetStaticMethodID(env, string, c.name, c.signature, method)
                                              : Util::GetStaticFieldID(env, string, c.name, c.signature, field);
     EXPECT_FALSE(env->ExceptionCheck());
-    const ErrorView e = TakeLastError();
+    const LastError e = TakeLastError();
     EXPECT_EQ(VLX_SUCCEEDED(rc), c.failure == nullptr);
     EXPECT_EQ(method != nullptr || field != nullptr, c.failure == nullptr) << "an id exactly when found";
     EXPECT_EQ(e.present, c.failure != nullptr);
@@ -117,7 +117,7 @@ TEST_F(JavaErrorTest, PendingExceptionsAreClearedAndRecordedWithClassMessageAndC
     ASSERT_TRUE(env->ExceptionCheck());
     EXPECT_EQ(Util::HandleJavaError(env, 0, "ctx", nullptr, c.flag), VLX_E_FAIL);
     EXPECT_FALSE(env->ExceptionCheck());
-    const ErrorView e = TakeLastError();
+    const LastError e = TakeLastError();
     EXPECT_EQ(e.id, VLXJBXMessages::JavaException);
     ASSERT_EQ(e.parameters.size(), 4u);
     EXPECT_EQ(e.parameters[0], "ctx");
@@ -137,7 +137,7 @@ TEST_F(JavaErrorTest, WithoutAnExceptionTheCodeDecidesAndTheOperationsOwnErrorIs
   EXPECT_FALSE(TakeLastError().present) << "success records nothing";
 
   EXPECT_EQ(Util::HandleJavaError(env, VLX_E_INVALIDARG, "VLXKDMModel::GetName()", nullptr, 0), VLX_E_FAIL);
-  const ErrorView e = TakeLastError();
+  const LastError e = TakeLastError();
   EXPECT_EQ(e.id, VLXJBXMessages::OperationFailed);
   EXPECT_EQ(e.text, "VLXKDMModel::GetName() failed: it returned the failure code -2147024809 and recorded no cause");
 

@@ -3,9 +3,7 @@
 #include "BridgeSupport.h"
 #include "VLXJBXInternal.h"
 
-#include <cstdlib>
 #include <filesystem>
-#include <fstream>
 
 namespace {
 
@@ -55,27 +53,6 @@ TEST_F(StartupTest, TheProcessJvmWasCreatedOnceWithTheOptionsListAndTheClassPath
   ASSERT_EQ(count, 1);
   EXPECT_EQ(VLXJBXJNIUtilities::GetJavaVM(), vms[0]);
   EXPECT_FALSE(TakeLastError().present);
-}
-
-TEST(StartupConfig, ClassPathPrefersTheSharedJarAndPutsTheVariableFirst)
-{
-  char pattern[] = "/tmp/corvexa-classpath-XXXXXX";
-  ASSERT_NE(mkdtemp(pattern), nullptr);
-  const std::string root = pattern, lib = root + "/lib";
-  std::filesystem::create_directories(root + "/share/corvexa");
-  std::filesystem::create_directories(lib);
-  EXPECT_EQ(VLXJBXDetail::BuildClassPath(nullptr, lib), "") << "no jar anywhere";
-  EXPECT_EQ(VLXJBXDetail::BuildClassPath("a.jar::b:", lib), "a.jar:b");
-  std::ofstream(lib + "/corvexa-replica.jar") << "jar";
-  EXPECT_EQ(VLXJBXDetail::BuildClassPath(nullptr, lib), lib + "/corvexa-replica.jar") << "beside the library";
-  std::ofstream(root + "/share/corvexa/corvexa-replica.jar") << "jar";
-  EXPECT_EQ(VLXJBXDetail::BuildClassPath("x", lib), "x:" + lib + "/../share/corvexa/corvexa-replica.jar")
-      << "installed and build-tree layout first";
-  EXPECT_EQ(VLXJBXDetail::BuildClassPath("x", ""), "x") << "unknown library directory";
-  std::filesystem::remove_all(root);
-  EXPECT_TRUE(VLXJBXDetail::SplitOptions(nullptr).empty() && VLXJBXDetail::SplitOptions(" \t\n").empty());
-  EXPECT_EQ(VLXJBXDetail::SplitOptions("  -Xcheck:jni\t-Xmx64m\n -Dk=v "),
-            (std::vector<std::string>{"-Xcheck:jni", "-Xmx64m", "-Dk=v"}));
 }
 
 }  // namespace

@@ -1,4 +1,4 @@
-// Shared helpers of the bridge tests.
+// Shared helpers of the bridge tests and (through TestSupport.h) of the library's suites.
 #ifndef BridgeSupport_h
 #define BridgeSupport_h
 
@@ -12,24 +12,30 @@
 #include <string>
 #include <vector>
 
-inline std::string Str(const VLXUnicodeString& s) { return std::string(s.c_str(), size_t(s.GetLengthInByte())); }
+inline std::string Text(const VLXUnicodeString& s) { return std::string(s.c_str(), size_t(s.GetLengthInByte())); }
 inline bool Has(const std::string& text, const std::string& part) { return text.find(part) != std::string::npos; }
 
-// The calling thread's last error, read and cleaned.
-struct ErrorView {
+// The calling thread's last error, read as it is (Peek) or read and cleaned (Take).
+struct LastError {
   bool present = false;
   std::string id, text;
   std::vector<std::string> parameters;
+  std::string operation() const { return parameters.empty() ? std::string() : parameters[0]; }
 };
-inline ErrorView TakeLastError()
+inline LastError PeekLastError()
 {
-  ErrorView view;
+  LastError view;
   if (VLXError* e = VLXError::VLXGetLastError(0, nullptr)) {
-    view = {true, e->GetId(), Str(e->GetMessageText()), {}};
-    for (int i = 1; i <= e->GetNLSParameterCount(); ++i) view.parameters.push_back(Str(e->GetNLSParameter(i)));
+    view = {true, e->GetId(), Text(e->GetMessageText()), {}};
+    for (int i = 1; i <= e->GetNLSParameterCount(); ++i) view.parameters.push_back(Text(e->GetNLSParameter(i)));
     e->Release();
-    VLXError::VLXCleanLastError();
   }
+  return view;
+}
+inline LastError TakeLastError()
+{
+  const LastError view = PeekLastError();
+  VLXError::VLXCleanLastError();
   return view;
 }
 

@@ -1,12 +1,8 @@
 // Start-up of the Java side, one scenario per process (ctest runs each with its own environment):
 // a replica jar that lacks a class, a JVM that is not created (no replica jar, options that the JVM
 // refuses or that would end the process), and many first calls at once.
-#include <unistd.h>
-
 #include <atomic>
-#include <cstdio>
 #include <cstdlib>
-#include <fstream>
 #include <sstream>
 #include <thread>
 
@@ -24,35 +20,11 @@ struct TableReader : VLXKDMJavaObject {
   static ReplicaStubs* Table() { return _st.load(); }
 };
 
-// Captures what the process writes to one of its standard streams while it lives.
-class Capture {
- public:
-  explicit Capture(int fd)
-      : _fd(fd), _path("/tmp/corvexa-startup-" + std::to_string(getpid()) + "-" + std::to_string(fd) + ".out")
-  {
-    fflush(nullptr);
-    _saved = dup(_fd);
-    FILE* file = fopen(_path.c_str(), "w");
-    dup2(fileno(file), _fd);
-    fclose(file);
-  }
-  std::string Finish()
-  {
-    fflush(nullptr);
-    dup2(_saved, _fd);
-    close(_saved);
-    std::ifstream in(_path);
-    std::stringstream text;
-    text << in.rdbuf();
-    std::remove(_path.c_str());
-    return text.str();
-  }
-
- private:
-  int _fd;
-  std::string _path;
-  int _saved;
-};
+// The process's standard streams are captured with GoogleTest's own capture (it flushes first).
+using testing::internal::CaptureStderr;
+using testing::internal::CaptureStdout;
+using testing::internal::GetCapturedStderr;
+using testing::internal::GetCapturedStdout;
 
 // The live Java threads, as their set's text ("[Thread[main,5,main], ...]").
 std::string JavaThreads()
@@ -74,11 +46,12 @@ std::string JavaThreads()
 
 TEST(StartupMissingClass, InitStopsAtTheMissingClassAndEveryOperationFailsCleanly)
 {
-  Capture out(STDOUT_FILENO), err(STDERR_FILENO);
+  CaptureStdout();
+  CaptureStderr();
   VLXKDMReplica replica;
   const long first = replica.Build(U("never"));
-  EXPECT_EQ("", out.Finish());  // the application's output stays its own
-  EXPECT_EQ("Error ReplicaStubs::Init\n", err.Finish());
+  EXPECT_EQ("", GetCapturedStdout());  // the application's output stays its own
+  EXPECT_EQ("Error ReplicaStubs::Init\n", GetCapturedStderr());
   EXPECT_EQ(VLX_E_FAIL, first);
   EXPECT_EQ(nullptr, replica.GetHandle());
   LastError error = PeekLastError();
@@ -97,11 +70,11 @@ TEST(StartupMissingClass, InitStopsAtTheMissingClassAndEveryOperationFailsCleanl
   EXPECT_EQ(nullptr, table->Constant(Visibility_Private));
 
   // Later operations fail the same way, without calling Java and without printing again.
-  Capture again(STDERR_FILENO);
+  CaptureStderr();
   VLXUnicodeString name("kept");
   EXPECT_EQ(VLX_E_FAIL, replica.GetName(name));  // not built
   EXPECT_EQ(VLX_E_FAIL, replica.Build());
-  EXPECT_EQ("", again.Finish());
+  EXPECT_EQ("", GetCapturedStderr());
   EXPECT_EQ("kept", Text(name));
   EXPECT_EQ("VLXJBXInfraERR_1010", PeekLastError().id);
   EXPECT_FALSE(Env()->ExceptionCheck());
@@ -112,14 +85,15 @@ TEST(StartupMissingClass, InitStopsAtTheMissingClassAndEveryOperationFailsCleanl
 // call and the next fail with the same explanation.
 TEST(StartupNoJvm, AJvmThatCannotBeCreatedRaisesTheNoEnvironmentError)
 {
-  Capture out(STDOUT_FILENO), err(STDERR_FILENO);
+  CaptureStdout();
+  CaptureStderr();
   VLXKDMReplica replica;
   const long first = replica.Build();
   const LastError firstError = PeekLastError();
   VLXUnicodeString name("kept");
   const long second = replica.GetName(name);
-  EXPECT_EQ("", out.Finish());
-  const std::string diagnostics = err.Finish();
+  EXPECT_EQ("", GetCapturedStdout());
+  const std::string diagnostics = GetCapturedStderr();
   EXPECT_NE(std::string::npos,
             diagnostics.find("Error VLXJBXJNIUtilities::GetJNIEnv\nError VLXJBXJNIUtilities::GetJNIEnv\n"))
       << diagnostics;
@@ -172,9 +146,11 @@ TEST(StartupConcurrent, SixteenFirstCallsAtOnceCreateAndFillTheTableOnce)
   // With every proxy gone, the only global references left are the table's own: 27 classes and
   // 17 constants. A second filling would have doubled them.
   EXPECT_EQ(27 + 17, VLXJBXJNIUtilities::GetGlobalRefCount());
-  // Every thread has left the JVM, the one that created it ("main") too.
+  // Every thread has left the JVM, those the bridge attached (but this one, for the check) and the
+  // one that created it ("main").
   const std::string live = JavaThreads();
   EXPECT_EQ(std::string::npos, live.find("Thread[main,")) << live;
+  EXPECT_EQ(live.find("VLXJBX-attached-"), live.rfind("VLXJBX-attached-")) << "only this one: " << live;
 }
 
 // An exception that the application left pending at the process's first call fails that call,

@@ -3,17 +3,10 @@
 // type. Fatal-error reports are recorded with the platform suites' FatalRecorder.
 #pragma once
 
-#include <jni.h>
 #include <jvmti.h>
 
-#include <string>
-#include <vector>
-
-#include <gtest/gtest.h>
-
+#include "../platform/BridgeSupport.h"
 #include "../platform/FatalRecorder.h"
-#include "VLXError.h"
-#include "VLXJBXJNIUtilities.h"
 #include "VLXKDMAttributeDef.h"
 #include "VLXKDMAttributeDefList.h"
 #include "VLXKDMClassDef.h"
@@ -38,35 +31,11 @@ inline JNIEnv* Env()
   return env;
 }
 
-inline std::string Text(const VLXUnicodeString& s) { return std::string(s.c_str(), s.GetLengthInByte()); }
 inline VLXUnicodeString U(const std::string& s) { return VLXUnicodeString(s.data(), static_cast<int>(s.size())); }
 inline std::string Texts(const VLXListOfVLXUnicodeString& list)
 {
   std::string out;
   for (int i = 1; i <= list.Size(); ++i) out += (i > 1 ? "," : "") + Text(list[i]);
-  return out;
-}
-inline bool Has(const std::string& text, const std::string& part) { return text.find(part) != std::string::npos; }
-
-struct LastError {
-  bool present = false;
-  std::string id;
-  std::vector<std::string> parameters;
-  std::string text;
-  std::string operation() const { return parameters.empty() ? std::string() : parameters[0]; }
-};
-
-// The calling thread's last error, read without changing it.
-inline LastError PeekLastError()
-{
-  LastError out;
-  VLXError* error = VLXError::VLXGetLastError(VLX_E_FAIL, nullptr);
-  if (!error) return out;
-  out.present = true;
-  out.id = error->GetId();
-  for (int i = 1; i <= error->GetNLSParameterCount(); ++i) out.parameters.push_back(Text(error->GetNLSParameter(i)));
-  out.text = Text(error->GetMessageText());
-  error->Release();
   return out;
 }
 inline void ClearLastError() { VLXError::VLXCleanLastError(); }
@@ -133,11 +102,6 @@ inline jlong TimeOf(jobject date)
   const jlong value = Env()->CallLongMethod(date, MethodOf(date, "getTime", "()J"));
   return NoPending("getTime") ? value : 0;
 }
-inline jboolean BooleanOf(jobject boxed)
-{
-  const jboolean value = Env()->CallBooleanMethod(boxed, MethodOf(boxed, "booleanValue", "()Z"));
-  return NoPending("booleanValue") ? value : 0;
-}
 // An int field of a test double (they count calls).
 inline int IntField(jobject object, const char* field)
 {
@@ -164,10 +128,6 @@ inline jobjectArray NewArray(const char* elementClass, const std::vector<jobject
   for (size_t i = 0; i < elements.size() && NoPending("making an array"); ++i)
     env->SetObjectArrayElement(array, static_cast<jsize>(i), elements[i]);
   return NoPending("filling an array") ? array : nullptr;
-}
-inline jobject Element(jobject array, int index)
-{
-  return Env()->GetObjectArrayElement(static_cast<jobjectArray>(array), index);
 }
 inline int Length(jobject array) { return array ? Env()->GetArrayLength(static_cast<jarray>(array)) : -1; }
 inline bool Same(jobject a, jobject b) { return Env()->IsSameObject(a, b) == JNI_TRUE; }

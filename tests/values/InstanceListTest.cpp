@@ -166,19 +166,6 @@ TEST_F(InstanceList, QuickSortMovesOnlyPointersAndCompareComparesPositionByPosit
   gOrder = nullptr;
 }
 
-TEST_F(InstanceList, AHundredThousandElementsAreCopiedAndReleased)
-{
-  VLXListValVLXKDMInstance list(100000);
-  for (int i = 0; i < 100000; ++i) list.Append(o[static_cast<size_t>(i % 5)]);
-  VLXListValVLXKDMInstance copy(list);
-  EXPECT_TRUE(copy == list);
-  EXPECT_EQ(baseline + 200000, GlobalRefCount());
-  EXPECT_EQ(99995, copy.RemoveDuplicates());
-  EXPECT_EQ("ABCDE", Letters(copy));
-  list.Size(10, nullptr);
-  EXPECT_EQ(10, list.Size());
-}
-
 TEST_F(InstanceList, APositionOutOfRangeIsReportedAndAnsweredWithAnUnattachedProxy)
 {
   FatalRecorder recorder;

@@ -279,31 +279,4 @@ TEST(ValuePreconditions, AFailedBuildRemoteIsTriedAgain)
   EXPECT_EQ(1, Length(value.GetHandle()));
 }
 
-TEST(ValuePreconditions, EachGetterReportsAValueOfAnotherTypeOrKind)
-{
-  const std::vector<VLXKDMInstance> instances = NewInstances(1);
-  const std::vector<Case> cases = Cases(1, instances);
-#define GET(getter) [](const V& v) { v.getter(); }
-  const std::function<void(const V&)> getters[] = {
-      GET(GetInteger),      GET(GetDouble),     GET(GetBoolean),       GET(GetString),        GET(GetDate),
-      GET(GetBinary),       GET(GetInstance),   GET(GetListOfInteger), GET(GetListOfDouble),  GET(GetListOfBoolean),
-      GET(GetListOfString), GET(GetListOfDate), GET(GetListOfBinary),  GET(GetListOfInstance)};
-  // The getters are in the order of the cases: each reports a value of every other case, once.
-  for (size_t g = 0; g < std::size(getters); ++g) {
-    for (size_t k = 0; k < cases.size(); ++k) {
-      SCOPED_TRACE(std::string(cases[k].name) + " read with the getter of " + cases[g].name);
-      FatalRecorder recorder;
-      VLXKDMInstanceValue value;
-      cases[k].set(value);
-      getters[g](value);
-      EXPECT_EQ(g == k ? 0u : 1u, FatalRecorder::Reports().size());
-    }
-  }
-  // A new value: every getter reports.
-  FatalRecorder recorder;
-  VLXKDMInstanceValue empty;
-  for (const auto& get : getters) get(empty);
-  EXPECT_EQ(14u, FatalRecorder::Reports().size());
-}
-
 }  // namespace

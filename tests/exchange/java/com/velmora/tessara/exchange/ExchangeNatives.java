@@ -22,9 +22,5 @@ final class ExchangeNatives {
 
     static native boolean unbuiltGivesNull();
 
-    static native int exchangeLoop(Replica replica, ReplicaHolder holder, int count);
-
-    static native long globalRefCount();
-
     static native String lastError();
 }
