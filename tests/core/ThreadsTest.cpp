@@ -72,10 +72,16 @@ TEST(Threads, AThreadTheApplicationDetachedWorksOnItsNextCall)
   ASSERT_EQ(0, pthread_key_create(&key, &DetachAtExit));
   std::thread([&] {
     VLXUnicodeString name;
+    void* own = nullptr;
     ASSERT_EQ(VLX_S_OK, replica.GetName(name));
     ASSERT_EQ(JNI_OK, vm->DetachCurrentThread());
     ASSERT_EQ(VLX_S_OK, replica.GetName(name));  // attached again by the library
+    ASSERT_EQ(JNI_OK, vm->DetachCurrentThread());
+    ASSERT_EQ(JNI_OK, vm->AttachCurrentThread(&own, nullptr));  // now the application's, perhaps at the same address
+    pthread_setspecific(key, vm);
+    ASSERT_EQ(VLX_S_OK, replica.GetName(name));
   }).join();
+  EXPECT_EQ(1, g_attachedAtExit.exchange(-1)) << "the library detached the application's attachment";
   std::thread([&] {
     VLXUnicodeString name;
     void *own = nullptr, *still = nullptr;

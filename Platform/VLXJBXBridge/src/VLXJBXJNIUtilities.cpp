@@ -56,10 +56,47 @@ std::once_flag g_detachKeyOnce;
 std::atomic<long> g_attachSerial{0};
 std::atomic<long> g_globalRefs{0};
 
+// The Java thread of the bridge's own attachment of the calling thread (a weak reference). The
+// application may detach that attachment and attach the thread itself, and its new environment
+// may have the old one's address; the Java thread tells the two apart.
+thread_local jweak t_ownThread = nullptr;
+
+// The calling thread's java.lang.Thread (a local reference), or null.
+jobject CurrentJavaThread(JNIEnv* env)
+{
+  LocalRef cls(env, env->FindClass("java/lang/Thread"));
+  const jmethodID current =
+      cls.get() ? env->GetStaticMethodID(static_cast<jclass>(cls.get()), "currentThread", "()Ljava/lang/Thread;")
+                : nullptr;
+  jobject thread = current ? env->CallStaticObjectMethod(static_cast<jclass>(cls.get()), current) : nullptr;
+  if (env->ExceptionCheck()) env->ExceptionClear();
+  return thread;
+}
+
+// Marks the calling thread's attachment as the bridge's own: it is detached at thread exit.
+void OwnAttachment(JavaVM* vm, JNIEnv* env)
+{
+  if (g_detachKeyReady) pthread_setspecific(g_detachKey, vm);
+  if (t_ownThread) env->DeleteWeakGlobalRef(t_ownThread);
+  LocalRef thread(env, CurrentJavaThread(env));
+  t_ownThread = thread.get() ? env->NewWeakGlobalRef(thread.get()) : nullptr;
+}
+
+// Detaches the thread at its exit when it is still attached through the bridge's own attachment.
 void DetachAtThreadExit(void* value)
 {
   t_env = nullptr;
-  static_cast<JavaVM*>(value)->DetachCurrentThread();
+  JavaVM* vm = static_cast<JavaVM*>(value);
+  JNIEnv* env = nullptr;
+  if (vm->GetEnv(reinterpret_cast<void**>(&env), JNI_VERSION_1_8) != JNI_OK) return;
+  bool own = true;
+  if (t_ownThread && !env->ExceptionCheck()) {
+    LocalRef thread(env, CurrentJavaThread(env));
+    own = env->IsSameObject(t_ownThread, thread.get());
+  }
+  if (t_ownThread) env->DeleteWeakGlobalRef(t_ownThread);
+  t_ownThread = nullptr;
+  if (own) vm->DetachCurrentThread();
 }
 
 void MakeDetachKey()
@@ -334,7 +371,7 @@ long SlowGetJNIEnv(JNIEnv*& env, const VLXListValVLXUnicodeString& options)
         g_vm.store(vm, std::memory_order_release);
         // The creating thread is detached at its exit like every thread the bridge attached (the
         // process's main thread runs no key destructor at exit, so it stays with the JVM).
-        if (g_detachKeyReady) pthread_setspecific(g_detachKey, vm);
+        OwnAttachment(vm, created);
         t_env = created;
         env = created;
         return VLX_S_OK;
@@ -350,6 +387,8 @@ long SlowGetJNIEnv(JNIEnv*& env, const VLXListValVLXUnicodeString& options)
     // cached, and never detached by the bridge.
     if (g_detachKeyReady) pthread_setspecific(g_detachKey, nullptr);
     env = static_cast<JNIEnv*>(found);
+    if (t_ownThread) env->DeleteWeakGlobalRef(t_ownThread);
+    t_ownThread = nullptr;
     return VLX_S_OK;
   }
   if (rc != JNI_EDETACHED)
@@ -378,6 +417,7 @@ long SlowGetJNIEnv(JNIEnv*& env, const VLXListValVLXUnicodeString& options)
     return Raise(VLX_E_FAIL, VLXJBXMessages::NoEnvironment,
                  {"VLXJBXJNIUtilities::GetJNIEnv", "the thread-exit hook could not be set"}, __FILE__, __LINE__);
   }
+  OwnAttachment(vm, static_cast<JNIEnv*>(found));
   t_env = static_cast<JNIEnv*>(found);
   env = t_env;
   return VLX_S_OK;
