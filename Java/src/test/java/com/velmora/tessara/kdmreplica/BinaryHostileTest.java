@@ -95,13 +95,13 @@ class BinaryHostileTest {
     @Timeout(120)
     void everyTruncationIsRefused() {
         for (boolean compressed : new boolean[] {false, true}) {
-            byte[] b = Replica.getBinaryFromReplica(generate(7, 8), compressed);
+            byte[] b = Replica.getBinaryFromReplica(sample(true), compressed);
             for (int len = 0; len < b.length; len++) {
                 refused(Arrays.copyOf(b, len), compressed, FACTOR);
             }
         }
         // behind a correct header and checksum: the parser itself must notice
-        byte[] p = payloadOf(Replica.getBinaryFromReplica(generate(8, 8), false), false);
+        byte[] p = payloadOf(Replica.getBinaryFromReplica(sample(true), false), false);
         for (int len = 0; len < p.length; len++) {
             refused(seal(Arrays.copyOf(p, len), false), false, FACTOR);
         }
@@ -111,8 +111,8 @@ class BinaryHostileTest {
     @Timeout(300)
     void randomByteFlipsAreRefusedOrReadAsAValidReplica() {
         Random rnd = new Random(0x5EED_B175L);
-        byte[][] valid = {Replica.getBinaryFromReplica(generate(21, 6), false),
-            Replica.getBinaryFromReplica(generate(22, 6), true)};
+        byte[][] valid = {Replica.getBinaryFromReplica(richWithData(), false),
+            Replica.getBinaryFromReplica(richWithData(), true)};
         String packedDump = dump(Replica.getReplicaFromBinary(valid[1], true));
         // Flips anywhere: the header checks, the inflater or the checksum catch them, except flips
         // of the unused bits that end a deflate stream, which change nothing read.
@@ -179,10 +179,11 @@ class BinaryHostileTest {
 
     /** Bad buffers: what the refusal must name (the first fragment labels the row), and at times where. */
     static Stream<Arguments> refusals() {
-        byte[] plain = Replica.getBinaryFromReplica(generate(5, 3), false);
-        byte[] packed = Replica.getBinaryFromReplica(generate(5, 3), true);
+        Replica sample = sample(true);
+        byte[] plain = Replica.getBinaryFromReplica(sample, false);
+        byte[] packed = Replica.getBinaryFromReplica(sample, true);
         byte[] bomb = deflate(new byte[1 << 20], 256); // 256 MB of zeros in about 250 KB
-        byte[] payload = payloadOf(Replica.getBinaryFromReplica(generate(9, 3), false), false);
+        byte[] payload = payloadOf(plain, false);
         byte[] stream = deflate(payload, 1);
         int at = head(new ByteOut(64), 1, null).n + 12; // the type code of the first class's first attribute
         String[] arrays = {"an Integer", "a Double", "a String", "a Date", "a Boolean", "a Binary", "a Relationship"};
@@ -238,6 +239,7 @@ class BinaryHostileTest {
                 }
             }), false, "super class chain of class 'K1000' is longer than 1000"),
             row(sealed(2, o -> cls(cls(o, "A", "", INT), "B", "A", STRING)), false, "'B.a0' clashes with attribute 'A.a0'"),
+            row(sealed(1, o -> cls(o, "A", "", INT, INT).b[o.n - 8] = '0'), false, "class 'A' has two attributes named 'a0'"),
             Arguments.of("type code", sealed(1, o -> cls(o, "A", "", INT).b[at] = 9), false, at,
                     new String[] {"unknown type code 9 of attribute 'a0'"}),
             row(sealed(1, o -> cls(o, "A", "").b[at - 5] = 0x40), false, "invalid flags 0x40 of class 'A'"),
