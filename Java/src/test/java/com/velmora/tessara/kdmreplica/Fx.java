@@ -6,12 +6,15 @@ import com.velmora.tessara.kdmreplica.vrattributes.AccessMode;
 import com.velmora.tessara.kdmreplica.vrattributes.Visibility;
 import java.io.IOException;
 import java.io.StringReader;
+import java.io.UncheckedIOException;
 import java.lang.management.ManagementFactory;
 import java.lang.reflect.Array;
 import java.net.InetAddress;
 import java.net.ServerSocket;
 import java.net.Socket;
 import java.nio.charset.StandardCharsets;
+import java.nio.file.Files;
+import java.nio.file.Path;
 import java.util.*;
 import java.util.concurrent.atomic.AtomicInteger;
 import javax.xml.XMLConstants;
@@ -69,6 +72,16 @@ final class Fx {
             x.setValue((String) values[i], values[i + 1]);
         }
         return x;
+    }
+
+    /** Writes a text file in UTF-8, making its directory. */
+    static Path write(Path p, String text) {
+        try {
+            Files.createDirectories(p.getParent());
+            return Files.writeString(p, text);
+        } catch (IOException e) {
+            throw new UncheckedIOException(e);
+        }
     }
 
     private static void contains(String m, String... fragments) {
@@ -157,7 +170,11 @@ final class Fx {
         if (v == null) {
             b.append('-');
         } else if (v instanceof String) {
-            b.append(esc((String) v));
+            b.append('"');
+            for (char c : ((String) v).toCharArray()) {
+                b.append(c >= 0x20 && c < 0x7F && c != '"' && c != '\\' ? String.valueOf(c) : String.format("\\u%04x", (int) c));
+            }
+            b.append('"');
         } else if (v instanceof Double) {
             b.append("d").append(Long.toHexString(Double.doubleToRawLongBits((Double) v)));
         } else if (v instanceof Date) {
@@ -181,14 +198,6 @@ final class Fx {
         } else {
             b.append(v);
         }
-    }
-
-    static String esc(String s) {
-        StringBuilder b = new StringBuilder("\"");
-        for (char c : s.toCharArray()) {
-            b.append(c >= 0x20 && c < 0x7F && c != '"' && c != '\\' ? String.valueOf(c) : String.format("\\u%04x", (int) c));
-        }
-        return b.append('"').toString();
     }
 
     /**
@@ -311,6 +320,8 @@ final class Fx {
         xs.get(5).setValue("sInteger", 5); // modified
         all.getInstances().remove(xs.get(2)); // deleted, with the instances it composes
         all.getInstances().remove(xs.get(3)); // composing deleted ones
+        all.createInstance().setID(xs.get(2).getID()); // the deleted one's identifier is free again
+        all.getInstances().remove(all.createInstance()); // created then removed: forgotten
         r.getAttributeDef("mInteger").setAccessMode(AccessMode.Read); // readers fill it all the same
         if (vanished) {
             r.schemaLocation = "file:schemas/\u00e9 s.xsd"; // documents take the process-wide one

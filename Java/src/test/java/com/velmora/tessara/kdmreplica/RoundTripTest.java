@@ -111,7 +111,8 @@ class RoundTripTest {
     /**
      * Every schema property away from its default, a subclass before its super class, every type's
      * edge values, states, pending and deleted instances; in the binary forms also references to
-     * vanished instances and values past tightened constraints.
+     * vanished instances and values past tightened constraints. The read replica refuses the
+     * commit as the original does.
      */
     @ParameterizedTest
     @EnumSource(value = Form.class, names = {"XML_STATES", "XSD_POPULATE_STATES", "BINARY", "BINARY_COMPRESSED"})
@@ -120,40 +121,9 @@ class RoundTripTest {
         Replica back = trip(r, f);
         assertEquals(dump(r), dump(back));
         assertEquals(r.getXsd(), back.getXsd());
-    }
-
-    /**
-     * Created, modified and deleted instances, a deleted and a live instance sharing an identifier, a
-     * live reference to a deleted instance: the read replica refuses the commit as the original does
-     * and, repaired alike, commits to the same replica.
-     */
-    @ParameterizedTest
-    @EnumSource(value = Form.class, names = {"XML_STATES", "XSD_POPULATE_STATES", "BINARY", "BINARY_COMPRESSED"})
-    void statesAndDeletedInstancesComeBack(Form f) throws Exception {
-        Replica r = replica("states", "Part: n Integer, link Relationship");
-        Model part = r.getModels().getItem(0);
-        Instance kept = part.createInstance();
-        Instance gone = inst(part, "n", 7);
-        Instance changed = part.createInstance();
-        gone.setID("p1");
-        r.commit();
-        changed.setValue("n", 1);
-        kept.setValue("link", gone);
-        part.getInstances().remove(gone);
-        part.createInstance().setID("p1"); // the deleted instance's identifier is free again
-        part.getInstances().remove(part.createInstance()); // created then removed: forgotten
-        Replica back = trip(r, f);
-        assertEquals(dump(r), dump(back));
-        assertEquals("Replica 'states' (1 classes, 3 instances, 1 deleted)", back.toString());
-        ReplicaCommitException e1 = assertThrows(ReplicaCommitException.class, r::commit);
-        assertEquals(e1.getViolations(), assertThrows(ReplicaCommitException.class, back::commit).getViolations());
-        for (Replica x : new Replica[] {r, back}) {
-            for (int i = 0; i < 2; i++) {
-                x.getModels().getItem(0).getInstances().getItem(i).clearValue("link");
-            }
-            x.commit();
-        }
-        assertEquals(dump(r), dump(back));
+        assertEquals(r.toString(), back.toString());
+        ReplicaCommitException e = assertThrows(ReplicaCommitException.class, r::commit);
+        assertEquals(e.getViolations(), assertThrows(ReplicaCommitException.class, back::commit).getViolations());
     }
 
     @Test
@@ -244,14 +214,14 @@ class RoundTripTest {
     @Timeout(120)
     void snapshotsTakenWhileOthersWriteAreConsistent() throws Exception {
         Replica r = sample(true);
-        Model m = r.getModels().getItem(0);
+        Model m = r.getModels().getItem(3); // the class of every type, written last
         AtomicBoolean done = new AtomicBoolean();
         AtomicReference<Throwable> failed = new AtomicReference<>();
         Thread changer = new Thread(() -> {
             try {
                 for (int i = 0; !done.get(); i++) {
                     if (i % 2 == 0) {
-                        m.createInstance().setID("w" + i);
+                        m.createInstance().setValue("mString", new String[] {"w" + i, "x"});
                     } else {
                         m.getInstances().remove(m.getInstances().getCount() - 1);
                     }
