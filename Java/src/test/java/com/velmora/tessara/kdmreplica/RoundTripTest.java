@@ -5,6 +5,7 @@ import static org.junit.jupiter.api.Assertions.*;
 
 import java.util.*;
 import java.util.concurrent.atomic.AtomicBoolean;
+import java.util.concurrent.atomic.AtomicInteger;
 import java.util.concurrent.atomic.AtomicReference;
 import org.junit.jupiter.api.AfterEach;
 import org.junit.jupiter.api.Test;
@@ -216,10 +217,11 @@ class RoundTripTest {
         Replica r = sample(true);
         Model m = r.getModels().getItem(3); // the class of every type, written last
         AtomicBoolean done = new AtomicBoolean();
+        AtomicInteger changes = new AtomicInteger();
         AtomicReference<Throwable> failed = new AtomicReference<>();
         Thread changer = new Thread(() -> {
             try {
-                for (int i = 0; !done.get(); i++) {
+                for (int i = 0; !done.get(); i = changes.incrementAndGet()) {
                     if (i % 2 == 0) {
                         m.createInstance().setValue("mString", new String[] {"w" + i, "x"});
                     } else {
@@ -232,7 +234,7 @@ class RoundTripTest {
         });
         changer.start();
         try {
-            for (int i = 0; i < 300; i++) {
+            for (int i = 0; i < 3000 || changes.get() < 100_000 && changer.isAlive(); i++) { // overlapping many changes
                 boolean compressed = i % 2 == 1;
                 byte[] b = Replica.getBinaryFromReplica(r, compressed);
                 assertArrayEquals(b, Replica.getBinaryFromReplica(Replica.getReplicaFromBinary(b, compressed), compressed));
