@@ -2,6 +2,7 @@ package com.velmora.tessara.kdmreplica;
 
 import static org.junit.jupiter.api.Assertions.*;
 
+import java.lang.invoke.MethodType;
 import java.lang.reflect.Executable;
 import java.lang.reflect.Field;
 import java.lang.reflect.Method;
@@ -85,23 +86,9 @@ class BindingTableTest {
         assertTrue(rows.size() > 150, rows.size() + " rows");
     }
 
-    private static String descriptor(Class<?> c) {
-        if (c.isArray()) {
-            return c.getName().replace('.', '/');
-        }
-        if (c.isPrimitive()) {
-            return String.valueOf("ZBCSIJFDV".charAt(List.of(boolean.class, byte.class, char.class, short.class, int.class,
-                    long.class, float.class, double.class, void.class).indexOf(c)));
-        }
-        return "L" + c.getName().replace('.', '/') + ";";
-    }
-
     private static String signature(Executable e) {
-        StringBuilder b = new StringBuilder("(");
-        for (Class<?> p : e.getParameterTypes()) {
-            b.append(descriptor(p));
-        }
-        return b.append(')').append(e instanceof Method ? descriptor(((Method) e).getReturnType()) : "V").toString();
+        return MethodType.methodType(e instanceof Method ? ((Method) e).getReturnType() : void.class,
+                e.getParameterTypes()).toMethodDescriptorString();
     }
 
     @ParameterizedTest(name = "{0} {2}")

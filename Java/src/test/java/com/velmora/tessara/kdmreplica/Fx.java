@@ -6,12 +6,15 @@ import com.velmora.tessara.kdmreplica.vrattributes.AccessMode;
 import com.velmora.tessara.kdmreplica.vrattributes.Visibility;
 import java.io.IOException;
 import java.io.StringReader;
+import java.io.UncheckedIOException;
 import java.lang.management.ManagementFactory;
 import java.lang.reflect.Array;
 import java.net.InetAddress;
 import java.net.ServerSocket;
 import java.net.Socket;
 import java.nio.charset.StandardCharsets;
+import java.nio.file.Files;
+import java.nio.file.Path;
 import java.util.*;
 import java.util.concurrent.atomic.AtomicInteger;
 import javax.xml.XMLConstants;
@@ -23,8 +26,8 @@ import org.junit.jupiter.api.function.Executable;
 /**
  * Helpers of the tests: builders; one canonical dump of a replica (schema, data and states, through
  * public members and the deleted lists, independent of every codec); a replica with every schema
- * property away from its default; a seeded generator of replicas that use every type, property and
- * state; refusal checks; a local listener that counts connections.
+ * property away from its default, and with data of every type, edge values and states; refusal checks;
+ * a local listener that counts connections.
  */
 final class Fx {
     private Fx() {
@@ -69,6 +72,16 @@ final class Fx {
             x.setValue((String) values[i], values[i + 1]);
         }
         return x;
+    }
+
+    /** Writes a text file in UTF-8, making its directory. */
+    static Path write(Path p, String text) {
+        try {
+            Files.createDirectories(p.getParent());
+            return Files.writeString(p, text);
+        } catch (IOException e) {
+            throw new UncheckedIOException(e);
+        }
     }
 
     private static void contains(String m, String... fragments) {
@@ -157,7 +170,11 @@ final class Fx {
         if (v == null) {
             b.append('-');
         } else if (v instanceof String) {
-            b.append(esc((String) v));
+            b.append('"');
+            for (char c : ((String) v).toCharArray()) {
+                b.append(c >= 0x20 && c < 0x7F && c != '"' && c != '\\' ? String.valueOf(c) : String.format("\\u%04x", (int) c));
+            }
+            b.append('"');
         } else if (v instanceof Double) {
             b.append("d").append(Long.toHexString(Double.doubleToRawLongBits((Double) v)));
         } else if (v instanceof Date) {
@@ -181,14 +198,6 @@ final class Fx {
         } else {
             b.append(v);
         }
-    }
-
-    static String esc(String s) {
-        StringBuilder b = new StringBuilder("\"");
-        for (char c : s.toCharArray()) {
-            b.append(c >= 0x20 && c < 0x7F && c != '"' && c != '\\' ? String.valueOf(c) : String.format("\\u%04x", (int) c));
-        }
-        return b.append('"').toString();
     }
 
     /**
@@ -236,7 +245,10 @@ final class Fx {
 
     /** The rich schema with pending instances: texts XML cannot carry, NaN payloads, a missing mandatory value. */
     static Replica richWithData() {
-        Replica r = richSchema();
+        return pending(richSchema());
+    }
+
+    private static Replica pending(Replica r) {
         Instance s = r.getModels().getItem("Supplier_2").createInstance();
         s.setValue("name", "a\u0002");
         s.setValue("since", new Date(-1));
@@ -251,190 +263,77 @@ final class Fx {
         return r;
     }
 
-    private static final String[] TEXTS = {"", "plain", "ünïcödé", "\u0000nul", "tab\tcr\r", "\uD83D\uDE00 pair",
-        "lone \uD800 high", "lone \uDC00 low", "end \uD800", "\uFFFD replacement", "<&>\"'"};
-    private static final double[] DOUBLES = {0.0, -0.0, Double.NaN, Double.longBitsToDouble(0x7ff8000000000123L),
-        Double.POSITIVE_INFINITY, Double.NEGATIVE_INFINITY, Double.MIN_VALUE, Double.MAX_VALUE, 1.5, -1e-300};
-    private static final int[] INTS = {0, 1, -1, 63, 64, -64, -65, Integer.MAX_VALUE, Integer.MIN_VALUE};
-    private static final long[] MILLIS = {0, 1, -1, Long.MAX_VALUE, Long.MIN_VALUE, 1700000000123L, -62135596800000L};
     private static final Class<?>[] ELEMENTS = {int.class, double.class, String.class, Date.class, boolean.class,
         byte[].class, Instance.class};
 
-    static String text(Random rnd) {
-        return rnd.nextInt(3) == 0 ? "t" + rnd.nextInt(1000) : TEXTS[rnd.nextInt(TEXTS.length)];
-    }
-
-    private static Object scalar(AttributeType t, Random rnd, List<Instance> live) {
-        switch (t) {
-            case Integer:
-                return rnd.nextBoolean() ? INTS[rnd.nextInt(INTS.length)] : rnd.nextInt();
-            case Double:
-                return rnd.nextBoolean() ? DOUBLES[rnd.nextInt(DOUBLES.length)] : rnd.nextGaussian();
-            case String:
-                return text(rnd);
-            case Date:
-                return new Date(rnd.nextBoolean() ? MILLIS[rnd.nextInt(MILLIS.length)] : rnd.nextLong());
-            case Boolean:
-                return rnd.nextBoolean();
-            case Binary:
-                byte[] b = new byte[rnd.nextInt(4) == 0 ? 0 : rnd.nextInt(40)];
-                rnd.nextBytes(b);
-                return b;
-            default:
-                return live.get(rnd.nextInt(live.size()));
-        }
-    }
-
-    private static Object value(AttributeDef a, Random rnd, List<Instance> live) {
-        AttributeType t = a.getAttributeType();
-        if (t == AttributeType.Relationship && live.isEmpty()) {
-            return null;
-        }
-        if (!a.isMultiValuated()) {
-            return scalar(t, rnd, live);
-        }
-        Object v = Array.newInstance(ELEMENTS[t.ordinal()], rnd.nextInt(4) == 0 ? 0 : rnd.nextInt(13));
-        for (int i = 0; i < Array.getLength(v); i++) {
-            Array.set(v, i, scalar(t, rnd, live));
-        }
-        return v;
-    }
-
-    private static <T> T pick(Random rnd, T[] values) {
-        return values[rnd.nextInt(values.length)];
-    }
-
-    private static String[] texts(Random rnd) {
-        String[] s = new String[rnd.nextInt(3)];
-        Arrays.setAll(s, i -> text(rnd));
-        return s;
-    }
-
     /**
-     * A replica with up to five classes (some extending others), attributes of every type single
-     * and multi-valued with random properties, committed instances then pending changes: created,
-     * modified and deleted instances, references to deleted ones and to ones removed before any
-     * commit, and constraints tightened past the values held (set directly: the public setters
-     * refuse that, but a replica read from a document or an older binary form can hold such values).
+     * The rich replica plus a class of every type single and multi-valued holding edge values and
+     * identifiers of every kind, committed, then changed: modified, created and deleted instances
+     * (composition included), live references to deleted ones, a read-only attribute with values.
+     * With {@code vanished}, what only the binary forms carry: a reference to an instance removed
+     * before any commit and constraints tightened past the values held (set directly: the setters
+     * refuse that, but a replica read from a binary form can hold such values).
      */
-    static Replica generate(long seed, int instancesPerClass) {
-        Random rnd = new Random(seed);
-        Replica r = new Replica("gen " + seed + " " + text(rnd));
-        r.schemaLocation = rnd.nextBoolean() ? "" : "file:schemas/" + text(rnd) + ".xsd";
-        List<Model> models = new ArrayList<>();
-        for (int i = 0, n = 1 + rnd.nextInt(5); i < n; i++) {
-            ClassDef c = new ClassDef(i == 2 ? "Größe" : "C" + i);
-            if (i > 0 && rnd.nextInt(3) == 0) {
-                c.setSuperName(models.get(rnd.nextInt(i)).getClassDef().getClassName());
-            }
-            c.setUuid(rnd.nextBoolean() ? "" : "uuid-" + seed + "-" + i);
-            c.setQKAComment(text(rnd));
-            c.setQKADerivability(text(rnd));
-            c.setScopeNames(texts(rnd));
-            c.setExtensibility(rnd.nextBoolean());
-            c.setPersistency(rnd.nextBoolean());
-            c.setSoftwareVisibility(pick(rnd, Visibility.values()));
-            c.setClassType(pick(rnd, ClassType.values()));
-            for (int k = 0, na = rnd.nextInt(7); k < na; k++) {
-                AttributeDef a = new AttributeDef("a" + i + "_" + k, pick(rnd, AttributeType.values()));
-                a.setMultiValuation(rnd.nextBoolean());
-                a.setUuid(text(rnd));
-                a.setQKAComment(text(rnd));
-                a.setTargetRefs(texts(rnd));
-                a.setSoftwareVisibility(pick(rnd, Visibility.values()));
-                a.setAggregationType(rnd.nextInt(4) == 0 ? AggregationType.Composition : AggregationType.Shared);
-                a.setAccessMode(rnd.nextBoolean() ? AccessMode.Write : AccessMode.ReadWrite);
-                c.getAttributes().add(a);
-            }
-            Model m = new Model(c);
-            r.getModels().add(m);
-            models.add(m);
+    static Replica sample(boolean vanished) {
+        Replica r = richSchema();
+        Model all = addClass(r, "Gr\u00f6\u00dfe", null);
+        for (AttributeType t : AttributeType.values()) {
+            addAttr(all, "s" + t, t, false);
+            addAttr(all, "m" + t, t, true).setAggregationType(AggregationType.Composition);
         }
-        List<Instance> live = new ArrayList<>();
-        int[] ids = {0};
-        for (Model m : models) {
-            for (int j = 0; j < instancesPerClass; j++) {
-                live.add(setId(m.createInstance(), rnd, ids));
-            }
+        StringBuilder controls = new StringBuilder();
+        for (char c = 0; c < 0x20; c++) {
+            controls.append(c);
         }
-        for (Instance x : live) {
-            fill(x, rnd, live);
+        long year0 = -62135596800001L; // 0000-12-31T23:59:59.999Z, proleptic
+        List<Instance> xs = new ArrayList<>();
+        Object[][] values = {{0, 1, -1, 63, 64, -64, -65, Integer.MAX_VALUE, Integer.MIN_VALUE, 1 << 20},
+            {0.0, -0.0, Double.NaN, Double.longBitsToDouble(0x7ff0000000000123L), Double.longBitsToDouble(
+                0xfff8000000000000L), Double.NEGATIVE_INFINITY, Double.POSITIVE_INFINITY, Double.MIN_VALUE, -Double.MAX_VALUE,
+                0.1, 1.0 / 3, 1e-310, 123456789012345680.0, -1e-300},
+            {"", " lead and trail ", "a\r\nb\rc\n", "\t", controls.toString(), "\ufffe\uffff\ufffd", "lone \ud800 high",
+                "lone \udc00 low", "pair \ud83d\ude00", "back\\slash \\u0041", "]]> <&> \"'", "\u0085\u2028 \u007f \u00fc"},
+            {new Date(0), new Date(-1), new Date(Long.MIN_VALUE), new Date(Long.MAX_VALUE), new Date(year0),
+                new Date(year0 + 1), new Date(-62135596800000L), new Date(253402300800000L), new Date(1700000000123L)},
+            {true, false, false, true, true, false, true, true, true, false},
+            {new byte[0], new byte[] {-1}, new byte[256], new byte[] {0}}};
+        for (int i = 0; i < 256; i++) {
+            ((byte[]) values[5][2])[i] = (byte) i;
+        }
+        for (int i = 0; i < 15; i++) {
+            Instance x = all.createInstance();
+            x.setID(i % 3 == 0 ? null : i % 3 == 1 ? "id" + i + (i == 4 ? "\uDBFF" : "") : new byte[] {(byte) i, -1});
+            for (AttributeType t : AttributeType.values()) {
+                Object[] v = t == AttributeType.Relationship ? xs.toArray() : values[t.ordinal()];
+                if (v.length > 0 && i % 5 != 4) {
+                    x.setValue("s" + t, v[i % v.length]);
+                    Object m = Array.newInstance(ELEMENTS[t.ordinal()], i % (v.length + 1));
+                    for (int k = 0; k < Array.getLength(m); k++) {
+                        Array.set(m, k, v[(k + i) % v.length]);
+                    }
+                    x.setValue("m" + t, m);
+                }
+            }
+            xs.add(x);
         }
         r.commit();
-        // Pending changes: modifications, new instances, removals (with composition).
-        for (Instance x : new ArrayList<>(live)) {
-            int what = rnd.nextInt(6);
-            if (what == 0 && !x.isDeleted()) {
-                fill(x, rnd, live);
-            } else if (what == 1) {
-                Instance y = setId(models.get(rnd.nextInt(models.size())).createInstance(), rnd, ids);
-                fill(y, rnd, live);
-                live.add(y);
-            }
+        xs.get(5).setValue("sInteger", 5); // modified
+        all.getInstances().remove(xs.get(2)); // deleted, with the instances it composes
+        all.getInstances().remove(xs.get(3)); // composing deleted ones
+        all.createInstance().setID(xs.get(2).getID()); // the deleted one's identifier is free again
+        all.getInstances().remove(all.createInstance()); // created then removed: forgotten
+        r.getAttributeDef("mInteger").setAccessMode(AccessMode.Read); // readers fill it all the same
+        if (vanished) {
+            r.schemaLocation = "file:schemas/\u00e9 s.xsd"; // documents take the process-wide one
+            Instance ghost = all.createInstance(); // created, referred to, removed before any commit
+            xs.get(6).setValue("sRelationship", ghost);
+            all.getInstances().remove(ghost);
+            r.getAttributeDef("sString").length = 2;
+            r.getAttributeDef("sRelationship").targetNames = new String[] {"Bolt"};
+            r.getAttributeDef("sBoolean").setMandatory(true);
+            r.getAttributeDef("sDate").setUnicity(true);
         }
-        for (int k = 0; k < 1 + instancesPerClass / 3 && !live.isEmpty(); k++) {
-            Instance x = live.get(rnd.nextInt(live.size()));
-            if (!x.isDeleted()) {
-                r.getModels().getItem(x.getClassDef().getClassName()).getInstances().remove(x);
-            }
-        }
-        live.removeIf(Instance::isDeleted);
-        // A reference to an instance that disappears (created, then removed before a commit).
-        for (Model m : models) {
-            AttributeDef ref = null;
-            for (int k = 0; k < m.getClassDef().getAttributes().getCount() && ref == null; k++) {
-                AttributeDef a = m.getClassDef().getAttributes().getItem(k);
-                ref = a.getAttributeType() == AttributeType.Relationship && !a.isMultiValuated() ? a : null;
-            }
-            if (ref != null && m.getInstances().getCount() > 0 && rnd.nextBoolean()) {
-                Instance holder = m.getInstances().getItem(0);
-                if (!holder.isDeleted() && holder.getClassDef().getAttributes().indexOf(ref) >= 0) {
-                    Instance gone = m.createInstance();
-                    fill(gone, rnd, live);
-                    holder.setValue(ref.getAttributeName(), gone);
-                    m.getInstances().remove(gone);
-                }
-            }
-        }
-        // Constraints tightened afterwards, past the values held, which stay as they are.
-        for (Model m : models) {
-            ClassDef c = m.getClassDef();
-            c.setAbstract(rnd.nextInt(5) == 0);
-            for (int k = 0; k < c.getAttributes().getCount(); k++) {
-                AttributeDef a = c.getAttributes().getItem(k);
-                a.setMandatory(rnd.nextInt(3) == 0);
-                a.setUnicity(rnd.nextInt(3) == 0);
-                a.length = rnd.nextInt(3) == 0 ? rnd.nextInt(5) - 1 : 0;
-                if (rnd.nextInt(4) == 0) {
-                    a.setAccessMode(AccessMode.Read);
-                }
-                if (a.getAttributeType() == AttributeType.Relationship && rnd.nextBoolean()) {
-                    a.targetNames = new String[] {models.get(rnd.nextInt(models.size())).getClassDef().getClassName()};
-                }
-            }
-        }
-        return r;
-    }
-
-    private static Instance setId(Instance x, Random rnd, int[] ids) {
-        int kind = rnd.nextInt(3);
-        int n = ids[0]++;
-        if (kind == 1) {
-            x.setID("id" + n + (rnd.nextBoolean() ? "\uDBFF" : ""));
-        } else if (kind == 2) {
-            x.setID(new byte[] {(byte) n, (byte) (n >> 8), (byte) 0xFF});
-        }
-        return x;
-    }
-
-    private static void fill(Instance x, Random rnd, List<Instance> live) {
-        for (int p = 0; p < x.values.length; p++) {
-            if (rnd.nextInt(4) != 0) {
-                x.setValue(p, value(x.getClassDef().layout[p], rnd, live));
-            } else if (rnd.nextBoolean()) {
-                x.clearValue(p);
-            }
-        }
+        return pending(r);
     }
 
     /** Asserts that the call throws an XmlDocumentException at that line whose message holds every fragment. */

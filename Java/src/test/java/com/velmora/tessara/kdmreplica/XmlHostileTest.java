@@ -74,15 +74,6 @@ class XmlHostileTest {
         net.close();
     }
 
-    private static Path write(Path p, String text) {
-        try {
-            Files.createDirectories(p.getParent());
-            return Files.write(p, text.getBytes(StandardCharsets.UTF_8));
-        } catch (IOException e) {
-            throw new IllegalStateException(e);
-        }
-    }
-
     /** The ways a text reaches the package, by name: documents, schemas, from strings and from files. */
     private Consumer<String> reader(String name) {
         Path file = dir.resolve("sub").resolve(name.startsWith("schema") ? "s.xsd" : "doc.xml");

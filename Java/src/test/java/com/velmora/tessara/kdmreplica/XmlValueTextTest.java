@@ -5,9 +5,10 @@ import static org.junit.jupiter.api.Assertions.*;
 import java.time.Instant;
 import java.time.LocalDate;
 import java.time.ZoneOffset;
+import java.time.format.DateTimeFormatter;
 import java.util.Random;
+import java.util.concurrent.Callable;
 import org.junit.jupiter.api.Test;
-import org.junit.jupiter.api.function.Executable;
 import org.junit.jupiter.params.ParameterizedTest;
 import org.junit.jupiter.params.provider.CsvSource;
 import org.junit.jupiter.params.provider.ValueSource;
@@ -24,41 +25,19 @@ class XmlValueTextTest {
         return (text + "7e ").toCharArray();
     }
 
-    /** The message the String path refuses a text with, or null when it accepts it. */
-    private static String refusal(Executable call) {
+    /** What a reading gives: its value, or the message it was refused with (a String). */
+    private static Object answer(Callable<Object> read) {
         try {
-            call.execute();
-            return null;
+            return read.call();
         } catch (IllegalArgumentException e) {
             return e.getMessage();
-        } catch (Throwable e) {
+        } catch (Exception e) {
             throw new AssertionError(e);
         }
     }
 
-    /** Reads a text of the kind by the String path and by the character path: the same answer or the same refusal. */
-    private static Object read(String kind, String text) throws Throwable {
-        Executable byString;
-        Executable byChars;
-        Object[] got = new Object[2];
-        switch (kind) {
-            case "int":
-                byString = () -> got[0] = ValueTexts.parseInt(text);
-                byChars = () -> got[1] = ValueTexts.parseInt(chars(text), text.length());
-                break;
-            case "double":
-                byString = () -> got[0] = Double.doubleToRawLongBits(ValueTexts.parseDouble(text, null));
-                byChars = () -> got[1] = Double.doubleToRawLongBits(ValueTexts.parseDouble(chars(text), text.length(),
-                        null));
-                break;
-            default:
-                byString = () -> got[0] = ValueTexts.parseBoolean(text);
-                byChars = () -> got[1] = ValueTexts.parseBoolean(chars(text), text.length());
-        }
-        String refused = refusal(byString);
-        assertEquals(refused, refusal(byChars), "the character path answers otherwise");
-        assertEquals(got[0], got[1]);
-        return refused != null ? null : got[0];
+    private static long bits(double d) {
+        return Double.doubleToRawLongBits(d);
     }
 
     /** kind, text, value (empty: refused). */
@@ -77,19 +56,28 @@ class XmlValueTextTest {
         "boolean|true|true", "boolean|1|true", "boolean|false|false", "boolean|0|false", "boolean|' true'|true",
         "boolean|'0 '|false", "boolean|''|", "boolean|True|", "boolean|TRUE|", "boolean|yes|", "boolean|2|",
         "boolean|10|", "boolean|fals|", "boolean|truee|", "boolean|t|"})
-    void numbersAndBooleansAreReadOrRefusedAlikeByBothPaths(String kind, String text, String value) throws Throwable {
-        Object expected = value == null ? null : kind.equals("int") ? (Object) Integer.parseInt(value)
-                : kind.equals("double") ? (Object) Double.doubleToRawLongBits(Double.parseDouble(value))
-                : (Object) Boolean.parseBoolean(value);
-        assertEquals(expected, read(kind, text));
+    void numbersAndBooleansAreReadOrRefusedAlikeByBothPaths(String kind, String text, String value) {
+        char[] c = chars(text);
+        int n = text.length();
+        Object[] got = kind.equals("int") ? new Object[] {answer(() -> ValueTexts.parseInt(text)),
+            answer(() -> ValueTexts.parseInt(c, n))} : kind.equals("double")
+            ? new Object[] {answer(() -> bits(ValueTexts.parseDouble(text, null))),
+                answer(() -> bits(ValueTexts.parseDouble(c, n, null)))}
+            : new Object[] {answer(() -> ValueTexts.parseBoolean(text)), answer(() -> ValueTexts.parseBoolean(c, n))};
+        assertEquals(got[0], got[1], "the character path answers otherwise");
+        if (value == null) {
+            assertTrue(got[0] instanceof String && ((String) got[0]).contains(text.trim()), "refused: " + got[0]);
+        } else {
+            assertEquals(kind.equals("int") ? (Object) Integer.parseInt(value) : kind.equals("double")
+                    ? (Object) bits(Double.parseDouble(value)) : (Object) Boolean.parseBoolean(value), got[0]);
+        }
     }
 
     /** Reads a text both ways and checks the bits against the JDK's reading of the same text. */
     private static void readLikeTheJdk(String text) {
-        long expected = Double.doubleToRawLongBits(Double.parseDouble(text));
-        assertEquals(expected, Double.doubleToRawLongBits(ValueTexts.parseDouble(chars(text), text.length(), null)),
-                text);
-        assertEquals(expected, Double.doubleToRawLongBits(ValueTexts.parseDouble(text, null)), text);
+        long expected = bits(Double.parseDouble(text));
+        assertEquals(expected, bits(ValueTexts.parseDouble(chars(text), text.length(), null)), text);
+        assertEquals(expected, bits(ValueTexts.parseDouble(text, null)), text);
     }
 
     @ParameterizedTest
@@ -108,19 +96,6 @@ class XmlValueTextTest {
         "3.0000000000000004", "-0.0", "+0e-5", "1E22", "1E23", "9007199254740992e-22", "9007199254740993e22"})
     void hardDecimalsAreReadExactly(String text) {
         readLikeTheJdk(text);
-    }
-
-    @Test
-    void writtenDoublesOfTheWholeRangeAreReadExactly() {
-        Random rnd = new Random(20261206);
-        for (int i = 0; i < 200_000; i++) {
-            double d = Double.longBitsToDouble(rnd.nextLong());
-            if (d == d && !Double.isInfinite(d)) {
-                readLikeTheJdk(ValueTexts.formatDouble(d));
-            }
-            // and the common magnitudes, as the benchmark's prices and weights
-            readLikeTheJdk(ValueTexts.formatDouble(rnd.nextDouble() * Math.pow(10, rnd.nextInt(40) - 20)));
-        }
     }
 
     @Test
@@ -153,25 +128,17 @@ class XmlValueTextTest {
         }
     }
 
-    @ParameterizedTest
-    @ValueSource(strings = {"2024-03-01T12:00:00.250Z", "0001-01-01T00:00:00.000Z", "9999-12-31T23:59:59.999Z",
-        "2024-02-29T23:59:59.000Z", "1970-01-01T00:00:00.001Z", "1969-12-31T23:59:59.999Z"})
-    void datesAsWrittenAreRead(String text) {
-        assertEquals(Instant.parse(text).toEpochMilli(), ValueTexts.parseDate(text));
-        assertEquals(Instant.parse(text).toEpochMilli(), ValueTexts.parseDate(chars(text), text.length()));
-        assertEquals(text, ValueTexts.formatDate(ValueTexts.parseDate(text)));
-    }
-
     @Test
     void everyDayOfTheWrittenYearsIsReadAsJavaTimeReadsIt() {
-        // every day of four centuries (leap rules of 100 and 400 years), the first and last days of
-        // the range, and random instants of the whole range
+        // every day of four centuries (leap rules of 100 and 400 years), the first and last instants
+        // of the range, and random instants of the whole range, written and read as java.time does
         LocalDate end = LocalDate.of(2101, 1, 1);
         for (LocalDate d = LocalDate.of(1700, 1, 1); d.isBefore(end); d = d.plusDays(1)) {
             checkDate(d.atTime(23, 59, 59, 999_000_000).toInstant(ZoneOffset.UTC).toEpochMilli());
         }
         checkDate(Instant.parse("0001-01-01T00:00:00Z").toEpochMilli());
         checkDate(Instant.parse("9999-12-31T23:59:59.999Z").toEpochMilli());
+        checkDate(-1);
         Random rnd = new Random(11);
         long first = Instant.parse("0001-01-01T00:00:00Z").toEpochMilli();
         long span = Instant.parse("9999-12-31T23:59:59.999Z").toEpochMilli() - first;
@@ -180,8 +147,12 @@ class XmlValueTextTest {
         }
     }
 
+    private static final DateTimeFormatter WRITTEN = DateTimeFormatter.ofPattern("uuuu-MM-dd'T'HH:mm:ss.SSS'Z'")
+            .withZone(ZoneOffset.UTC);
+
     private static void checkDate(long millis) {
         String text = ValueTexts.formatDate(millis);
+        assertEquals(WRITTEN.format(Instant.ofEpochMilli(millis)), text);
         assertEquals(millis, ValueTexts.parseDate(chars(text), text.length()), text);
         assertEquals(millis, ValueTexts.parseDate(text), text);
     }
@@ -195,9 +166,9 @@ class XmlValueTextTest {
         "2023-12-32T00:00:00.000Z", "2023-01-00T00:00:00.000Z", "2023-01-01T00:00:00.00aZ", "2023-01-01T00:00:00.000z",
         "2023-01-01t00:00:00.000Z"})
     void impossibleDatesOfTheWrittenShapeAreRefusedByBothPaths(String text) {
-        String m = refusal(() -> ValueTexts.parseDate(text));
-        assertTrue(m != null && m.contains("'" + text + "'"), m);
-        assertEquals(m, refusal(() -> ValueTexts.parseDate(chars(text), text.length())));
+        Object m = answer(() -> ValueTexts.parseDate(text));
+        assertTrue(m instanceof String && ((String) m).contains("'" + text + "'"), String.valueOf(m));
+        assertEquals(m, answer(() -> ValueTexts.parseDate(chars(text), text.length())));
     }
 
     @ParameterizedTest

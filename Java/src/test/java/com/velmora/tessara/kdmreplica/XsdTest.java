@@ -3,7 +3,6 @@ package com.velmora.tessara.kdmreplica;
 import static com.velmora.tessara.kdmreplica.Fx.*;
 import static org.junit.jupiter.api.Assertions.*;
 
-import java.nio.charset.StandardCharsets;
 import java.nio.file.Files;
 import java.nio.file.Path;
 import java.util.Arrays;
@@ -137,11 +136,6 @@ class XsdTest {
                 + "</xs:complexContent></xs:complexType></xs:schema>");
         assertEquals("Existing: n Integer,\nMore(Existing): link Relationship [Existing],\n", shape(r));
         inst(r.getModels().getItem("More"), "n", 3);
-    }
-
-    private static Path write(Path p, String text) throws Exception {
-        Files.createDirectories(p.getParent());
-        return Files.write(p, text.getBytes(StandardCharsets.UTF_8));
     }
 
     private static String schema(String body) {
