@@ -3,6 +3,7 @@
 // out-parameters (and out-proxies) are left as they were.
 #pragma once
 
+#include "VLXBinary.h"
 #include "VLXKDMClassDef.h"
 #include "VLXKDMInstance.h"
 #include "VLXKDMInstanceSet.h"
@@ -27,6 +28,11 @@ class CORVEXA_API VLXKDMModel : public VLXKDMJavaObject {
   long GetClassDef(VLXKDMClassDef& classDef);
   // Attaches instances to the model's own (live) instance set.
   long GetInstances(VLXKDMInstanceSet& instances);
+  // The live instance whose identifier is this text (or these bytes), through the model's
+  // identifier index: as fast for a million instances as for ten. To an unbuilt proxy when no
+  // instance has it.
+  long FindInstance(const VLXUnicodeString& id, VLXKDMInstance& instance);
+  long FindInstance(const VLXBinary& id, VLXKDMInstance& instance);
   // Attaches replica to the replica that holds the model; to nothing (not built) when it is in none.
   long GetReplica(VLXKDMReplica& replica);
   // A readable text form of the model.

@@ -39,6 +39,11 @@ class CORVEXA_API VLXKDMReplica : public VLXKDMJavaObject {
   // Attaches attributeDef to the attribute definition named attributeName ("Class.attribute", or a
   // bare name that exactly one class holds); to nothing when there is none.
   long GetAttributeDef(const VLXUnicodeString& attributeName, VLXKDMAttributeDef& attributeDef);
+  // The live instance whose identifier is this text (or these bytes), through each model's
+  // identifier index, models in order (identifiers are unique within a model, so the first model
+  // holding it wins). To an unbuilt proxy when no instance has it.
+  long FindInstance(const VLXUnicodeString& id, VLXKDMInstance& instance);
+  long FindInstance(const VLXBinary& id, VLXKDMInstance& instance);
 
   // ---- Documents. Parsing, validation and writing happen on the Java side; a malformed or hostile
   // document or buffer fails with a last error that says what was wrong, leaving the replica as it

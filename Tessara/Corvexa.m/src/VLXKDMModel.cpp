@@ -30,6 +30,20 @@ long VLXKDMModel::GetInstances(VLXKDMInstanceSet& instances)
   return Call(*this, "VLXKDMModel::GetInstances(VLXKDMInstanceSet&)", slot<Model_getInstances>).returning(instances);
 }
 
+long VLXKDMModel::FindInstance(const VLXUnicodeString& id, VLXKDMInstance& instance)
+{
+  return Call(*this, "VLXKDMModel::FindInstance(const VLXUnicodeString&, VLXKDMInstance&)", slot<Model_findInstance>)
+      .with(id)
+      .returning(instance);
+}
+
+long VLXKDMModel::FindInstance(const VLXBinary& id, VLXKDMInstance& instance)
+{
+  return Call(*this, "VLXKDMModel::FindInstance(const VLXBinary&, VLXKDMInstance&)", slot<Model_findInstance>)
+      .with(id)
+      .returning(instance);
+}
+
 long VLXKDMModel::GetReplica(VLXKDMReplica& replica)
 {
   return Call(*this, "VLXKDMModel::GetReplica(VLXKDMReplica&)", slot<Model_getReplica>).returning(replica);

@@ -60,6 +60,21 @@ long VLXKDMReplica::GetAttributeDef(const VLXUnicodeString& attributeName, VLXKD
       .returning(attributeDef);
 }
 
+long VLXKDMReplica::FindInstance(const VLXUnicodeString& id, VLXKDMInstance& instance)
+{
+  return Call(*this, "VLXKDMReplica::FindInstance(const VLXUnicodeString&, VLXKDMInstance&)",
+              slot<Replica_findInstance>)
+      .with(id)
+      .returning(instance);
+}
+
+long VLXKDMReplica::FindInstance(const VLXBinary& id, VLXKDMInstance& instance)
+{
+  return Call(*this, "VLXKDMReplica::FindInstance(const VLXBinary&, VLXKDMInstance&)", slot<Replica_findInstance>)
+      .with(id)
+      .returning(instance);
+}
+
 // ---- Documents -------------------------------------------------------------------------------
 
 long VLXKDMReplica::SetSchemaLocation(const VLXUnicodeString& location)

@@ -82,6 +82,31 @@ public class Model {
         return classDef;
     }
 
+    /**
+     * The live instance of this model whose identifier is {@code id} (a String, or a byte[] by
+     * content), or null; found through the model's identifier index, whatever the model's size.
+     *
+     * @throws IllegalArgumentException for null or another kind of identifier
+     */
+    public Instance findInstance(Object id) {
+        Object key = lookupKey(id, "model of class '" + classDef.name + "'");
+        Lock l = Locks.read(this);
+        try {
+            return ids == null ? null : ids.get(key);
+        } finally {
+            l.unlock();
+        }
+    }
+
+    /** The index key of an identifier a caller looks up. */
+    static Object lookupKey(Object id, String where) {
+        if (!(id instanceof String) && !(id instanceof byte[])) {
+            throw new IllegalArgumentException(where + ": an identifier to find is a String or a byte[], not "
+                    + (id == null ? "null" : "a " + Values.className(id)));
+        }
+        return Instance.keyOf(id);
+    }
+
     /** Moves a live instance of this model from its identifier to a new one (caller holds the write lock). */
     void changeId(Instance x, Object newId) {
         Object newKey = Instance.keyOf(newId);

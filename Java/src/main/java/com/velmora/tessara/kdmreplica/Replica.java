@@ -177,6 +177,30 @@ public class Replica {
         return models;
     }
 
+    /**
+     * The live instance whose identifier is {@code id} (a String, or a byte[] by content), looked
+     * up in each model's identifier index in model order (identifiers are unique within a model,
+     * so the first model holding it wins); null when none has it.
+     *
+     * @throws IllegalArgumentException for null or another kind of identifier
+     */
+    public Instance findInstance(Object id) {
+        Object key = Model.lookupKey(id, "replica '" + name + "'");
+        Lock l = rw.readLock();
+        l.lock();
+        try {
+            for (Model m : models.items) {
+                Instance x = m.ids == null ? null : m.ids.get(key);
+                if (x != null) {
+                    return x;
+                }
+            }
+            return null;
+        } finally {
+            l.unlock();
+        }
+    }
+
     /** The class of that name, or null. */
     public ClassDef getClassDef(String className) {
         if (className == null) {

@@ -187,4 +187,31 @@ class ValuesTest {
         part.getInstances().remove(aPart);
         throwsWith(IllegalArgumentException.class, () -> x.setValue("ref", aPart), "is deleted");
     }
+
+    @Test
+    void lookupsByIdentifierFollowEveryChange() {
+        Replica r = replica("find", "P: n Integer; Q: n Integer");
+        Model p = r.getModels().getItem("P");
+        Instance a = inst(p, "n", 1);
+        a.setID("a");
+        Instance q = r.getModels().getItem("Q").createInstance();
+        q.setID(new byte[] {1, 2});
+        assertSame(a, p.findInstance("a"));
+        assertSame(a, r.findInstance("a"));
+        assertSame(q, r.findInstance(new byte[] {1, 2}), "bytes by content");
+        a.setID("b");
+        assertNull(p.findInstance("a"));
+        assertSame(a, r.findInstance("b"));
+        p.getInstances().remove(a);
+        assertNull(r.findInstance("b"), "a deleted instance is not found");
+        throwsWith(IllegalArgumentException.class, () -> r.populatesFromXmlString(
+                "<replica xmlns='urn:corvexa:replica:1'><P id='c'/><P id='c'/></replica>"));
+        assertNull(r.findInstance("c"), "a refused populate leaves nothing behind");
+        r.populatesFromXmlString("<replica xmlns='urn:corvexa:replica:1'><P id='c'/></replica>");
+        r.commit();
+        Replica back = Replica.getReplicaFromBinary(Replica.getBinaryFromReplica(r, false), false);
+        assertEquals("c", Replica.readFromXmlString(r.getXml(true)).findInstance("c").getID());
+        assertEquals("c", back.getModels().getItem("P").findInstance("c").getID());
+        throwsWith(IllegalArgumentException.class, () -> p.findInstance(42), "String or a byte[], not a");
+    }
 }
