@@ -15,6 +15,7 @@
 //
 // Options of our own (besides Google Benchmark's):
 //   --fill_instances=N    instances per fill (default 100000)
+//   --lookup_instances=N  instances of the model looked up by identifier (default 1000000)
 //   --fill_iterations=N   measured fills per side, one per repetition (default 5)
 //   --warmup_calls=N      calls of each operation before anything is measured (default 20000)
 // The JVM gets the options of VLXJBX_JVM_OPTIONS, or when it is unset kDefaultJvmOptions below.
@@ -60,6 +61,7 @@ namespace {
 struct Options {
   int fillInstances = 100000;
   int fillIterations = 5;
+  int lookupInstances = 1000000;
   int warmupCalls = 20000;
 };
 Options gOptions;
@@ -130,6 +132,9 @@ struct World {
   jmethodID fill = nullptr;
   jclass systemClass = nullptr;
   jmethodID systemGc = nullptr;
+  // The lookup's Java side: identifiers given, and the same lookups made in one loop.
+  jclass lookupClass = nullptr;
+  jmethodID lookupFill = nullptr, lookupFind = nullptr;
 
   // The hand-written fill's identifiers.
   jmethodID modelCreateInstance = nullptr;
@@ -224,6 +229,10 @@ bool SetUp(World& w, std::string& why)
   w.fill = Method(env, w.fillClass, "fill", "(Lcom/velmora/tessara/kdmreplica/Model;IJ)I", true);
   if (!w.fill)
     return Fail(why, "class com.velmora.tessara.bench.FillBaseline not found (is the bench jar on VLXJBX_CLASSPATH?)");
+  w.lookupClass = GlobalClass(env, "com/velmora/tessara/bench/LookupBaseline");
+  w.lookupFill = Method(env, w.lookupClass, "fill", "(Lcom/velmora/tessara/kdmreplica/Model;I)I", true);
+  w.lookupFind = Method(env, w.lookupClass, "find", "(Lcom/velmora/tessara/kdmreplica/Model;II)I", true);
+  if (!w.lookupFill || !w.lookupFind) return Fail(why, "class com.velmora.tessara.bench.LookupBaseline not found");
   w.systemClass = GlobalClass(env, "java/lang/System");
   w.systemGc = Method(env, w.systemClass, "gc", "()V", true);
   if (!w.systemGc) return Fail(why, "System.gc not found");
@@ -249,7 +258,7 @@ void TearDown(World& w)
   for (jobject ref :
        {w.replicaRef, w.instanceRef, w.modelsRef, w.keptValue, static_cast<jobject>(w.integerClass),
         static_cast<jobject>(w.fillClass), static_cast<jobject>(w.systemClass), static_cast<jobject>(w.doubleClass),
-        static_cast<jobject>(w.booleanClass), static_cast<jobject>(w.dateClass)})
+        static_cast<jobject>(w.booleanClass), static_cast<jobject>(w.dateClass), static_cast<jobject>(w.lookupClass)})
     if (ref) env->DeleteGlobalRef(ref);
 }
 
@@ -652,6 +661,58 @@ void RunFill(benchmark::State& state, FillBy by)
   state.counters["instances"] = count;
 }
 
+// ---- Lookups by identifier ---------------------------------------------------------------------
+// One model of gOptions.lookupInstances instances with identifiers "id-0", ... (given in Java);
+// the library finds one per call, Java finds kLookupsPerJavaCall per call; both take the same
+// identifiers, a stride through the whole model.
+
+constexpr int kLookupsPerJavaCall = 1000;
+
+struct LookupModel {
+  VLXKDMReplica replica;
+  VLXKDMModel model;
+  bool ok = false;
+};
+
+LookupModel& TheLookupModel()
+{
+  static LookupModel l;
+  static const bool made = [] {
+    World& w = *gWorld;
+    l.ok = l.replica.Build(VLXUnicodeString("lookup")) >= 0 && AddClass(l.replica, "Item", {}, l.model) &&
+           w.env->CallStaticIntMethod(w.lookupClass, w.lookupFill, l.model.GetHandle(), gOptions.lookupInstances) ==
+               gOptions.lookupInstances &&
+           !w.env->ExceptionCheck();
+    if (w.env->ExceptionCheck()) w.env->ExceptionClear();
+    return true;
+  }();
+  (void)made;
+  return l;
+}
+
+void RunLookup(benchmark::State& state, bool library)
+{
+  World& w = *gWorld;
+  LookupModel& l = TheLookupModel();
+  if (!l.ok) return state.SkipWithError("the lookup model could not be made");
+  const int n = gOptions.lookupInstances;
+  long long k = 0;
+  VLXKDMInstance x;
+  char text[32];
+  for (auto _ : state) {
+    bool ok;
+    if (library) {
+      std::snprintf(text, sizeof text, "id-%d", static_cast<int>((k++ * 7919LL) % n));
+      ok = l.model.FindInstance(VLXUnicodeString(text), x) >= 0 && x.GetHandle() != nullptr;
+    } else {
+      ok = w.env->CallStaticIntMethod(w.lookupClass, w.lookupFind, l.model.GetHandle(), n, kLookupsPerJavaCall) ==
+               kLookupsPerJavaCall &&
+           !w.env->ExceptionCheck();
+    }
+    if (!ok) return state.SkipWithError("a lookup failed");
+  }
+}
+
 // ---- Allocations -----------------------------------------------------------------------------
 
 struct PerCall {
@@ -741,6 +802,14 @@ void PrintSummary(const SummaryReporter& reporter, const std::map<std::string, A
     std::printf("  real time per instance: library %s, hand-written JNI %s, pure Java %s\n",
                 Figure(fl.real / n).c_str(), Figure(fh.real / n).c_str(), Figure(fj.real / n).c_str());
 
+  const double found = reporter.Nanoseconds("Lookup/library").real,
+               javaFound = reporter.Nanoseconds("Lookup/pureJava").real / kLookupsPerJavaCall;
+  if (found > 0 && javaFound > 0)
+    std::printf(
+        "  find by identifier among %d instances: library %s per lookup (target at most 2 us), pure Java %s"
+        " (%s)\n",
+        gOptions.lookupInstances, Figure(found).c_str(), Figure(javaFound).c_str(), Ratio(found, javaFound).c_str());
+
   std::printf("\nSingle JNI costs, for reading the excess (cpu time per call):\n");
   for (const Single& single : Singles())
     std::printf("  %-44s %10s\n", single.what, Figure(reporter.Nanoseconds(single.key).cpu).c_str());
@@ -792,6 +861,7 @@ int main(int argc, char** argv)
   for (int i = 1; i < argc; ++i) {
     if (ParseOption(argv[i], "--fill_instances", gOptions.fillInstances) ||
         ParseOption(argv[i], "--fill_iterations", gOptions.fillIterations) ||
+        ParseOption(argv[i], "--lookup_instances", gOptions.lookupInstances) ||
         ParseOption(argv[i], "--warmup_calls", gOptions.warmupCalls))
       continue;
     argv[kept++] = argv[i];
@@ -871,6 +941,9 @@ int main(int argc, char** argv)
                      benchmark::RegisterBenchmark("Fill/handJNI", RunFill, FillBy::HandJni),
                      benchmark::RegisterBenchmark("Fill/pureJava", RunFill, FillBy::PureJava)})
     fill->Iterations(1)->Repetitions(gOptions.fillIterations)->Unit(benchmark::kMillisecond)->UseRealTime();
+
+  benchmark::RegisterBenchmark("Lookup/library", RunLookup, true);
+  benchmark::RegisterBenchmark("Lookup/pureJava", RunLookup, false);
 
   SummaryReporter reporter;
   benchmark::RunSpecifiedBenchmarks(&reporter);
