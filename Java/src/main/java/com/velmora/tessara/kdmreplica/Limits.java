@@ -113,7 +113,10 @@ final class Limits {
             }
         }
 
-        /** Sees {@code n} characters; runs of text and of attribute values are passed over in one loop. */
+        /**
+         * Sees {@code n} characters. Runs that change nothing but counts (text, attribute values,
+         * markup between quotes and the next "x", '>' or quote) are passed over in one loop.
+         */
         void see(char[] b, int off, int n) throws Exceeded {
             for (int i = off, end = off + n; i < end; i++) {
                 int j = i;
@@ -125,45 +128,30 @@ final class Limits {
                     while (j < end && b[j] != quote) {
                         j++;
                     }
+                } else if (state == TAG && matched == 0) {
+                    for (char c; j < end && (c = b[j]) != 'x' && c != '>' && c != '"' && c != '\'';) {
+                        j++;
+                    }
                 }
-                i = skipped(i, j, end);
+                i = skipped(i, j);
                 if (i < end) {
                     see(b[i]);
                 }
             }
         }
 
-        /** {@link #see(char[], int, int)} for bytes (of an encoding whose markup is ASCII). */
-        void see(byte[] b, int off, int n) throws Exceeded {
-            for (int i = off, end = off + n; i < end; i++) {
-                int j = i;
-                if (state == TEXT) {
-                    while (j < end && b[j] != '<') {
-                        j++;
-                    }
-                } else if (state == QUOTED) {
-                    while (j < end && b[j] != quote) {
-                        j++;
-                    }
-                }
-                i = skipped(i, j, end);
-                if (i < end) {
-                    see(b[i] & 0xFF);
-                }
-            }
-        }
-
-        /** Counts the units from i to j passed over as text or attribute value; returns j. */
-        private int skipped(int i, int j, int end) throws Exceeded {
+        /** Counts the units from i to j passed over; returns j. */
+        private int skipped(int i, int j) throws Exceeded {
             if (j > i) {
                 size += j - i;
-                run += j - i;
                 if (size > maxSize) {
                     throw new Exceeded(exceeded("the document", "maxDocumentSize", maxSize));
                 }
-                if (run > (state == TEXT ? maxText : maxAttribute)) {
-                    throw new Exceeded(state == TEXT ? exceeded("a text", "maxTextLength", maxText)
-                            : exceeded("an attribute value", "maxAttributeLength", maxAttribute));
+                if (state == TEXT && (run += j - i) > maxText) {
+                    throw new Exceeded(exceeded("a text", "maxTextLength", maxText));
+                }
+                if (state == QUOTED && (run += j - i) > maxAttribute) {
+                    throw new Exceeded(exceeded("an attribute value", "maxAttributeLength", maxAttribute));
                 }
             }
             return j;
@@ -260,6 +248,7 @@ final class Limits {
             private final byte[] head = new byte[4];
             private int headLength;
             private int width; // 0 until known
+            private char[] units = new char[0]; // the bytes of a one-byte encoding, as units
             private boolean bigEndian;
             private int unit;
             private int unitBytes;
@@ -321,7 +310,13 @@ final class Limits {
             public int read(byte[] b, int off, int len) throws IOException {
                 int n = super.read(b, off, len);
                 if (n > 0 && width == 1) {
-                    scan.see(b, off, n);
+                    if (units.length < n) {
+                        units = new char[Math.max(n, 8192)];
+                    }
+                    for (int i = 0; i < n; i++) {
+                        units[i] = (char) (b[off + i] & 0xFF);
+                    }
+                    scan.see(units, 0, n);
                 } else {
                     for (int i = 0; i < n; i++) {
                         byteSeen(b[off + i] & 0xFF);
