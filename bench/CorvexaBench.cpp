@@ -134,7 +134,7 @@ struct World {
   jmethodID systemGc = nullptr;
   // The lookup's Java side: identifiers given, and the same lookups made in one loop.
   jclass lookupClass = nullptr;
-  jmethodID lookupFill = nullptr, lookupFind = nullptr;
+  jmethodID lookupFill = nullptr, lookupFind = nullptr, lookupSelect = nullptr;
 
   // The hand-written fill's identifiers.
   jmethodID modelCreateInstance = nullptr;
@@ -232,7 +232,9 @@ bool SetUp(World& w, std::string& why)
   w.lookupClass = GlobalClass(env, "com/velmora/tessara/bench/LookupBaseline");
   w.lookupFill = Method(env, w.lookupClass, "fill", "(Lcom/velmora/tessara/kdmreplica/Model;I)I", true);
   w.lookupFind = Method(env, w.lookupClass, "find", "(Lcom/velmora/tessara/kdmreplica/Model;II)I", true);
-  if (!w.lookupFill || !w.lookupFind) return Fail(why, "class com.velmora.tessara.bench.LookupBaseline not found");
+  w.lookupSelect = Method(env, w.lookupClass, "select", "(Lcom/velmora/tessara/kdmreplica/Model;I)I", true);
+  if (!w.lookupFill || !w.lookupFind || !w.lookupSelect)
+    return Fail(why, "class com.velmora.tessara.bench.LookupBaseline not found");
   w.systemClass = GlobalClass(env, "java/lang/System");
   w.systemGc = Method(env, w.systemClass, "gc", "()V", true);
   if (!w.systemGc) return Fail(why, "System.gc not found");
@@ -679,7 +681,8 @@ LookupModel& TheLookupModel()
   static LookupModel l;
   static const bool made = [] {
     World& w = *gWorld;
-    l.ok = l.replica.Build(VLXUnicodeString("lookup")) >= 0 && AddClass(l.replica, "Item", {}, l.model) &&
+    l.ok = l.replica.Build(VLXUnicodeString("lookup")) >= 0 &&
+           AddClass(l.replica, "Item", {{"group", {VLXKDMAttributeType::Integer, false}}}, l.model) &&
            w.env->CallStaticIntMethod(w.lookupClass, w.lookupFill, l.model.GetHandle(), gOptions.lookupInstances) ==
                gOptions.lookupInstances &&
            !w.env->ExceptionCheck();
@@ -710,6 +713,25 @@ void RunLookup(benchmark::State& state, bool library)
            !w.env->ExceptionCheck();
     }
     if (!ok) return state.SkipWithError("a lookup failed");
+  }
+}
+
+// The instances of group 7 (one in a thousand): the library in one call, Java by a loop.
+void RunSelect(benchmark::State& state, bool library)
+{
+  World& w = *gWorld;
+  LookupModel& l = TheLookupModel();
+  if (!l.ok) return state.SkipWithError("the lookup model could not be made");
+  const int expected = gOptions.lookupInstances / 1000;
+  VLXKDMInstanceValue seven;
+  seven.SetInteger(7);
+  VLXListValVLXKDMInstance found;
+  for (auto _ : state) {
+    const bool ok =
+        library ? l.model.SelectInstances(VLXUnicodeString("group"), seven, 0, found) >= 0 && found.Size() == expected
+                : w.env->CallStaticIntMethod(w.lookupClass, w.lookupSelect, l.model.GetHandle(), 7) == expected &&
+                      !w.env->ExceptionCheck();
+    if (!ok) return state.SkipWithError("a selection failed");
   }
 }
 
@@ -809,6 +831,13 @@ void PrintSummary(const SummaryReporter& reporter, const std::map<std::string, A
         "  find by identifier among %d instances: library %s per lookup (target at most 2 us), pure Java %s"
         " (%s)\n",
         gOptions.lookupInstances, Figure(found).c_str(), Figure(javaFound).c_str(), Ratio(found, javaFound).c_str());
+
+  const double selected = reporter.Nanoseconds("Select/library").real,
+               javaSelected = reporter.Nanoseconds("Select/pureJava").real;
+  if (selected > 0 && javaSelected > 0)
+    std::printf("  select by an int among %d instances: library %s, a pure Java loop %s (%s; target at most 2x)\n",
+                gOptions.lookupInstances, Figure(selected).c_str(), Figure(javaSelected).c_str(),
+                Ratio(selected, javaSelected).c_str());
 
   std::printf("\nSingle JNI costs, for reading the excess (cpu time per call):\n");
   for (const Single& single : Singles())
@@ -944,6 +973,8 @@ int main(int argc, char** argv)
 
   benchmark::RegisterBenchmark("Lookup/library", RunLookup, true);
   benchmark::RegisterBenchmark("Lookup/pureJava", RunLookup, false);
+  benchmark::RegisterBenchmark("Select/library", RunSelect, true)->Unit(benchmark::kMillisecond);
+  benchmark::RegisterBenchmark("Select/pureJava", RunSelect, false)->Unit(benchmark::kMillisecond);
 
   SummaryReporter reporter;
   benchmark::RunSpecifiedBenchmarks(&reporter);

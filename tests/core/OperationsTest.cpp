@@ -188,6 +188,16 @@ long FromBinary(World& w, Outs& o)
   EXPECT_EQ(VLX_S_OK, VLXKDMReplica::GetBinaryFromReplica(w.r, 1, bytes));
   return VLXKDMReplica::GetReplicaFromBinary(bytes, 1, o.r);
 }
+// The instances whose integer is 42 (o.n: how many).
+long Select(World& w, Outs& o)
+{
+  VLXKDMInstanceValue fortyTwo;
+  fortyTwo.SetInteger(42);
+  VLXListValVLXKDMInstance found;
+  const long rc = w.m.SelectInstances(U("integer"), fortyTwo, 1, found);
+  if (rc >= 0) o.n = found.Size();
+  return rc;
+}
 // A limit past 32 bits set and read back (o.n becomes 1 when it came back whole); the default again.
 long LimitBack(Outs& o)
 {
@@ -398,6 +408,8 @@ const Operation kOperations[] = {
     OP(MOD "FindInstance(const VLXUnicodeString&, VLXKDMInstance&)", "text=id-1 flag=0 isText=1 instance",
        THEN(w.m.FindInstance(U("id-1"), o.i), o.i.GetID(o.f, o.ft, o.s, o.b))),
     OP(MOD "FindInstance(const VLXBinary&, VLXKDMInstance&)", "instance=null", w.m.FindInstance(kAb, o.i)),
+    OP(MOD "SelectInstances(const VLXUnicodeString&, VLXKDMInstanceValue&, VLXBoolean, VLXListValVLXKDMInstance&)",
+       "number=1", Select(w, o)),
     OP(MOD "GetReplica(VLXKDMReplica&)", "text=world replica", THEN(w.m.GetReplica(o.r), o.r.GetName(o.s))),
     OP(MOD "ToString(VLXUnicodeString&)", "text", w.m.ToString(o.s)),
 

@@ -8,6 +8,8 @@
 #include "VLXKDMInstance.h"
 #include "VLXKDMInstanceSet.h"
 #include "VLXKDMJavaObject.h"
+#include "VLXListValVLXKDMInstance.h"
+#include "VLXKDMInstanceValue.h"
 #include "VLXUnicodeString.h"
 
 class VLXKDMReplica;
@@ -33,6 +35,11 @@ class CORVEXA_API VLXKDMModel : public VLXKDMJavaObject {
   // instance has it.
   long FindInstance(const VLXUnicodeString& id, VLXKDMInstance& instance);
   long FindInstance(const VLXBinary& id, VLXKDMInstance& instance);
+  // The live instances of the model (with withSubclasses, also of its subclasses' models) whose
+  // attribute holds a value equal to value, in one call: multi-valued ones element by element,
+  // instances by identity; a value holder without type selects the instances without a value.
+  long SelectInstances(const VLXUnicodeString& attribute, VLXKDMInstanceValue& value, VLXBoolean withSubclasses,
+                       VLXListValVLXKDMInstance& instances);
   // Attaches replica to the replica that holds the model; to nothing (not built) when it is in none.
   long GetReplica(VLXKDMReplica& replica);
   // A readable text form of the model.

@@ -16,6 +16,7 @@
 #include "VLXJBXJNIConverter.h"
 #include "VLXJBXJNIHelper.h"
 #include "VLXJBXJNIUtilities.h"
+#include "VLXListValVLXKDMInstance.h"
 #include "VLXJBXLocalRef.h"
 #include "VLXKDMInstanceValue.h"
 #include "VLXKDMJavaObject.h"
@@ -56,6 +57,11 @@ class FrameAccess {
   static long Attach(VLXKDMJavaObject& proxy, JNIEnv* env, jobject object)
   {
     return proxy.ReplaceGlobalRef(env, object);
+  }
+  // Proxies of the instances of an Instance[] (null: an empty list).
+  static long Build(VLXListValVLXKDMInstance& list, JNIEnv* env, jobject array)
+  {
+    return VLXKDMJavaObject::BuildFromJavaType(env, array, list);
   }
   // Attaches value to object (not null) and reads its local form; a failure leaves value as it was.
   static long Read(VLXKDMInstanceValue& value, JNIEnv* env, jobject object) { return value.Read(env, object, true); }
@@ -200,6 +206,16 @@ struct ResultOf<VLXListValVLXUnicodeString> : ConvertedResult<VLXListValVLXUnico
 };
 template <>
 struct ResultOf<VLXBinary> : ConvertedResult<VLXBinary> {
+};
+// An Instance[] becomes proxies of the same Java objects.
+template <>
+struct ResultOf<VLXListValVLXKDMInstance> {
+  using Raw = jobject;
+  static long Land(JNIEnv* env, jobject result, VLXListValVLXKDMInstance& out, long)
+  {
+    LocalRef owned(env, result);
+    return FrameAccess::Build(out, env, result);
+  }
 };
 template <>
 struct ResultOf<int> : PrimitiveResult<int, jint> {

@@ -44,6 +44,17 @@ long VLXKDMModel::FindInstance(const VLXBinary& id, VLXKDMInstance& instance)
       .returning(instance);
 }
 
+long VLXKDMModel::SelectInstances(const VLXUnicodeString& attribute, VLXKDMInstanceValue& value,
+                                  VLXBoolean withSubclasses, VLXListValVLXKDMInstance& instances)
+{
+  return Call(*this,
+              "VLXKDMModel::SelectInstances(const VLXUnicodeString&, VLXKDMInstanceValue&, VLXBoolean, "
+              "VLXListValVLXKDMInstance&)",
+              slot<Model_selectInstances>)
+      .with(attribute, Remote(value), withSubclasses)
+      .returning(instances);
+}
+
 long VLXKDMModel::GetReplica(VLXKDMReplica& replica)
 {
   return Call(*this, "VLXKDMModel::GetReplica(VLXKDMReplica&)", slot<Model_getReplica>).returning(replica);

@@ -1,7 +1,9 @@
 package com.velmora.tessara.kdmreplica;
 
 import java.util.ArrayList;
+import java.util.Arrays;
 import java.util.HashMap;
+import java.util.List;
 import java.util.concurrent.locks.Lock;
 
 /**
@@ -96,6 +98,58 @@ public class Model {
         } finally {
             l.unlock();
         }
+    }
+
+    /**
+     * The live instances of this model, and with {@code withSubclasses} of the models of its
+     * subclasses (in model order), whose attribute {@code attribute} holds a value equal to
+     * {@code value}: given as {@code setValue} takes it, multi-valued ones element by element,
+     * instances by identity; null selects the instances without a value.
+     *
+     * @throws IllegalArgumentException for an attribute the class does not have, or a value of
+     *         another form than the attribute's
+     */
+    public Instance[] selectInstances(String attribute, Object value, boolean withSubclasses) {
+        Lock l = Locks.read(this);
+        try {
+            int p = attribute == null ? -1 : classDef.positionOf(attribute);
+            if (p < 0) {
+                throw new IllegalArgumentException("model of class '" + classDef.name + "': no attribute "
+                        + (attribute == null ? "null" : "'" + attribute + "'"));
+            }
+            AttributeDef def = classDef.layout[p];
+            Object query = Values.queryValue(def, value);
+            ArrayList<Instance> found = new ArrayList<>();
+            Replica r = replica;
+            for (Model m : r == null || !withSubclasses ? List.of(this) : r.models.items) {
+                if (m != this && !isSubclass(m.classDef, r.models)) {
+                    continue;
+                }
+                int at = Arrays.asList(m.alignedTo).indexOf(def);
+                InstanceSet s = m.instances;
+                for (int k = 0; at >= 0 && k < s.count; k++) {
+                    Instance x = s.items[k];
+                    if (Values.matches(x.values[at], query)) {
+                        found.add(x);
+                    }
+                }
+            }
+            return found.toArray(new Instance[0]);
+        } finally {
+            l.unlock();
+        }
+    }
+
+    /** Whether {@code c} is a subclass of this model's class (caller holds a lock of the replica). */
+    private boolean isSubclass(ClassDef c, ModelSet models) {
+        int depth = 0;
+        for (ClassDef s = models.superOf(c); s != null && depth++ <= BinaryCodec.MAX_SUPER_DEPTH;
+                s = models.superOf(s)) {
+            if (s == classDef) {
+                return true;
+            }
+        }
+        return false;
     }
 
     /** The index key of an identifier a caller looks up. */

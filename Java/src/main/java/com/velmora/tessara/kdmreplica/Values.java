@@ -3,6 +3,8 @@ package com.velmora.tessara.kdmreplica;
 import java.time.Instant;
 import java.util.Arrays;
 import java.util.Date;
+import java.util.EnumMap;
+import java.util.Map;
 
 /**
  * Attribute values: checks and copies on the way in, copies on the way out, equality keys and
@@ -30,6 +32,57 @@ final class Values {
             default: return multi ? "Instance[]" : "Instance";
         }
     }
+
+    /**
+     * A value looked for in an attribute, in its stored form (dates as milliseconds); null stands
+     * for no value. Only the form is checked: a value the attribute could not hold finds nothing.
+     *
+     * @throws IllegalArgumentException for a value of another form than the attribute's
+     */
+    static Object queryValue(AttributeDef def, Object v) {
+        boolean multi = def.multi;
+        if (v == null) {
+            return null;
+        }
+        if (def.type == AttributeType.Date && (multi ? v instanceof Date[] : v instanceof Date)) {
+            if (!multi) {
+                return ((Date) v).getTime();
+            }
+            Date[] in = (Date[]) v;
+            long[] out = new long[in.length];
+            for (int i = 0; i < in.length; i++) {
+                out[i] = in[i] == null ? Long.MIN_VALUE : in[i].getTime(); // a null element matches nothing
+            }
+            return out;
+        }
+        if (def.type == AttributeType.String && multi && v.getClass() == Object[].class) {
+            return Arrays.copyOf((Object[]) v, ((Object[]) v).length, String[].class);
+        }
+        Class<?> stored = STORED.get(def.type)[multi ? 1 : 0];
+        if (def.type != AttributeType.Date && stored.isInstance(v)) {
+            return v;
+        }
+        throw new IllegalArgumentException("attribute '" + def.qualifiedName() + "' (" + def.type
+                + (multi ? ", multi-valued" : "") + ") is looked for with " + form(def.type, multi) + ", not "
+                + className(v));
+    }
+
+    /** Whether a stored value equals a value looked for ({@link #queryValue}): arrays by content. */
+    static boolean matches(Object stored, Object query) {
+        if (query == null || stored == null) {
+            return query == stored;
+        }
+        return query.getClass().isArray() ? key(stored).equals(key(query)) : query.equals(stored);
+    }
+
+    private static final EnumMap<AttributeType, Class<?>[]> STORED = new EnumMap<>(
+            java.util.Map.of(AttributeType.Integer, new Class<?>[] {Integer.class, int[].class},
+                    AttributeType.Double, new Class<?>[] {Double.class, double[].class},
+                    AttributeType.Boolean, new Class<?>[] {Boolean.class, boolean[].class},
+                    AttributeType.String, new Class<?>[] {String.class, String[].class},
+                    AttributeType.Date, new Class<?>[] {Date.class, Date[].class},
+                    AttributeType.Binary, new Class<?>[] {byte[].class, byte[][].class},
+                    AttributeType.Relationship, new Class<?>[] {Instance.class, Instance[].class}));
 
     static String className(Object v) {
         String n = v.getClass().getCanonicalName();

@@ -214,4 +214,22 @@ class ValuesTest {
         assertEquals("c", back.getModels().getItem("P").findInstance("c").getID());
         throwsWith(IllegalArgumentException.class, () -> p.findInstance(42), "String or a byte[], not a");
     }
+
+    @Test
+    void selectionsFindEqualValuesInAModelAndItsSubclasses() {
+        Replica r = replica("sel", "P: n Integer, tags String*, when Date; S(P): x Integer");
+        Model p = r.getModels().getItem("P");
+        Model s = r.getModels().getItem("S");
+        Instance a = inst(p, "n", 7, "tags", new String[] {"a", "b"});
+        Instance b = inst(s, "n", 7, "when", new Date(5000));
+        Instance c = inst(p);
+        assertArrayEquals(new Instance[] {a}, p.selectInstances("n", 7, false));
+        assertArrayEquals(new Instance[] {a, b}, p.selectInstances("n", 7, true));
+        assertArrayEquals(new Instance[] {b}, s.selectInstances("n", 7, false));
+        assertArrayEquals(new Instance[] {a}, p.selectInstances("tags", new Object[] {"a", "b"}, true));
+        assertArrayEquals(new Instance[] {b}, p.selectInstances("when", new Date(5000), true));
+        assertArrayEquals(new Instance[] {c}, p.selectInstances("n", null, true), "null: without a value");
+        throwsWith(IllegalArgumentException.class, () -> p.selectInstances("n", "7", false), "looked for with Integer, not java.lang.String");
+        throwsWith(IllegalArgumentException.class, () -> p.selectInstances("x", 1, false), "no attribute 'x'");
+    }
 }
