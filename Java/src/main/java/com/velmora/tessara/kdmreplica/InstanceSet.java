@@ -31,6 +31,13 @@ public class InstanceSet {
         return "instance set of class '" + model.classDef.name + "'";
     }
 
+    /** Makes room for {@code extra} more instances at once. */
+    void reserve(int extra) {
+        if (count + extra > items.length) {
+            items = Arrays.copyOf(items, Math.max(8, count + extra));
+        }
+    }
+
     void append(Instance x) {
         if (count == items.length) {
             items = Arrays.copyOf(items, Math.max(8, count + (count >> 1)));
