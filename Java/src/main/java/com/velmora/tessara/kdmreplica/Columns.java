@@ -89,7 +89,7 @@ public final class Columns {
             return;
         }
         if (instances[0] == null || instances[0].model == null) {
-            throw Batch.fail("Columns.set", 0, "?", "the instance is " + (instances[0] == null ? "null" : "detached"));
+            throw Batch.fail("Columns.set", 0, Batch.first(attributes), "the instance is " + (instances[0] == null ? "null" : "detached"));
         }
         Lock l = Locks.write(instances[0]);
         try {
@@ -100,7 +100,7 @@ public final class Columns {
                         ? x.describe() + ", not an instance of replica '" + (r == null ? "?" : r.name) + "'"
                         : (x.state & Instance.DELETED) != 0 ? x.describe() + ", deleted" : null;
                 if (bad != null) {
-                    throw Batch.fail("Columns.set", i, "?", "the instance is " + bad);
+                    throw Batch.fail("Columns.set", i, Batch.first(attributes), "the instance is " + bad);
                 }
             }
             Instance[] xs = instances.clone();
@@ -126,7 +126,7 @@ public final class Columns {
                     + " attributes' types; read a model's instances with get(Model, ...))");
         }
         if (instances[0] == null || instances[0].model == null) {
-            throw Batch.fail("Columns.get", 0, "?", "the instance is " + (instances[0] == null ? "null" : "detached"));
+            throw Batch.fail("Columns.get", 0, Batch.first(attributes), "the instance is " + (instances[0] == null ? "null" : "detached"));
         }
         Lock l = Locks.read(instances[0]);
         try {
@@ -134,7 +134,7 @@ public final class Columns {
             for (int i = 0; i < instances.length; i++) {
                 Instance x = instances[i];
                 if (x == null || x.model == null || Locks.domainOf(x) != d) {
-                    throw Batch.fail("Columns.get", i, "?", "the instance is " + (x == null ? "null"
+                    throw Batch.fail("Columns.get", i, Batch.first(attributes), "the instance is " + (x == null ? "null"
                             : x.model == null ? "detached" : x.describe() + ", of another replica than row 0's"));
                 }
             }
@@ -202,6 +202,11 @@ public final class Columns {
                         : columns == null ? "columns is null" : names.length + " attributes, " + columns.length
                         + " columns" + (masks == null ? "" : ", " + masks.length + " presence masks")));
             }
+        }
+
+        /** The attribute named in a refusal about an instance rather than a value. */
+        static String first(String[] names) {
+            return names == null || names.length == 0 ? "?" : String.valueOf(names[0]);
         }
 
         static IllegalArgumentException fail(String op, int row, String attribute, String cause) {
@@ -301,7 +306,7 @@ public final class Columns {
                 }
                 values = a[0];
                 rowOffsets = (int[]) a[parts - 1];
-                length(rowOffsets.length - 1, "offsets for");
+                length(rowOffsets.length - 1, "offsets");
                 if (parts == 3) {
                     elementOffsets = (int[]) a[1];
                     limit = Math.max(0, elementOffsets.length - 1);
@@ -333,7 +338,7 @@ public final class Columns {
 
             private void length(int n, String what) {
                 if (n != rows) {
-                    throw fail(Math.max(0, Math.min(n, rows)), k, def, "the column has " + what + " " + Math.max(0, n)
+                    throw fail(Math.max(0, Math.min(n, rows)), k, def, "the column has " + what + " for " + Math.max(0, n)
                             + " rows, expected " + rows);
                 }
             }
