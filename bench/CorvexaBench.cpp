@@ -16,6 +16,7 @@
 // Options of our own (besides Google Benchmark's):
 //   --fill_instances=N    instances per fill (default 100000)
 //   --lookup_instances=N  instances of the model looked up by identifier (default 1000000)
+//   --bulk_instances=N    instances per bulk fill and read (default 100000)
 //   --fill_iterations=N   measured fills per side, one per repetition (default 5)
 //   --warmup_calls=N      calls of each operation before anything is measured (default 20000)
 // The JVM gets the options of VLXJBX_JVM_OPTIONS, or when it is unset kDefaultJvmOptions below.
@@ -35,7 +36,9 @@
 #include <benchmark/benchmark.h>
 
 #include "AllocationCounter.h"
+#include "BenchJava.h"
 #include "BenchReport.h"
+#include "DataBench.h"
 #include "HandStrings.h"
 #include "JniCallCounter.h"
 #include "VLXBinary.h"
@@ -62,6 +65,7 @@ struct Options {
   int fillInstances = 100000;
   int fillIterations = 5;
   int lookupInstances = 1000000;
+  int bulkInstances = 100000;
   int warmupCalls = 20000;
 };
 Options gOptions;
@@ -69,31 +73,6 @@ Options gOptions;
 constexpr int kListLength = 1000;
 const char* const kDefaultJvmOptions = "-Xms1g -Xmx1g -XX:+AlwaysPreTouch";
 constexpr time_t kBaseSeconds = 1700000000;
-
-// Owns one local reference of the hand-written code and deletes it on every path.
-class Local {
- public:
-  Local(JNIEnv* env, jobject ref) : _env(env), _ref(ref) {}
-  ~Local()
-  {
-    if (_ref) _env->DeleteLocalRef(_ref);
-  }
-  Local(const Local&) = delete;
-  Local& operator=(const Local&) = delete;
-  jobject get() const { return _ref; }
-
- private:
-  JNIEnv* _env;
-  jobject _ref;
-};
-
-// After a Java call of the hand-written code: true when it threw (the exception is cleared).
-bool Threw(JNIEnv* env)
-{
-  if (!env->ExceptionCheck()) return false;
-  env->ExceptionClear();
-  return true;
-}
 
 // The objects the per-operation benchmarks work on, and the hand-written code's identifiers.
 struct World {
@@ -132,9 +111,6 @@ struct World {
   jmethodID fill = nullptr;
   jclass systemClass = nullptr;
   jmethodID systemGc = nullptr;
-  // The lookup's Java side: identifiers given, and the same lookups made in one loop.
-  jclass lookupClass = nullptr;
-  jmethodID lookupFill = nullptr, lookupFind = nullptr, lookupSelect = nullptr;
 
   // The hand-written fill's identifiers.
   jmethodID modelCreateInstance = nullptr;
@@ -148,44 +124,6 @@ struct World {
 World* gWorld = nullptr;
 
 // ---- Set-up ----------------------------------------------------------------------------------
-
-bool Fail(std::string& why, const std::string& what)
-{
-  why = what;
-  return false;
-}
-
-// Adds the class className with its attributes (name, type, multi-valued) and its model.
-bool AddClass(VLXKDMReplica& replica, const char* className,
-              const std::vector<std::pair<const char*, std::pair<VLXKDMAttributeType::Type, bool>>>& attributes,
-              VLXKDMModel& model)
-{
-  VLXKDMClassDef classDef;
-  VLXKDMAttributeDefList list;
-  if (classDef.Build(VLXUnicodeString(className)) < 0 || classDef.GetAttributes(list) < 0) return false;
-  for (const auto& a : attributes) {
-    VLXKDMAttributeDef attribute;
-    if (attribute.Build(VLXUnicodeString(a.first), a.second.first) < 0) return false;
-    if (attribute.SetMultiValuation(a.second.second ? 1 : 0) < 0) return false;
-    if (list.Add(attribute) < 0) return false;
-  }
-  VLXKDMModelSet models;
-  return model.Build(classDef) >= 0 && replica.GetModels(models) >= 0 && models.Add(model) >= 0;
-}
-
-jclass GlobalClass(JNIEnv* env, const char* path)
-{
-  Local local(env, env->FindClass(path));
-  if (Threw(env) || !local.get()) return nullptr;
-  return static_cast<jclass>(env->NewGlobalRef(local.get()));
-}
-
-jmethodID Method(JNIEnv* env, jclass cls, const char* name, const char* signature, bool isStatic = false)
-{
-  if (!cls) return nullptr;
-  const jmethodID id = isStatic ? env->GetStaticMethodID(cls, name, signature) : env->GetMethodID(cls, name, signature);
-  return Threw(env) ? nullptr : id;
-}
 
 bool SetUp(World& w, std::string& why)
 {
@@ -229,12 +167,6 @@ bool SetUp(World& w, std::string& why)
   w.fill = Method(env, w.fillClass, "fill", "(Lcom/velmora/tessara/kdmreplica/Model;IJ)I", true);
   if (!w.fill)
     return Fail(why, "class com.velmora.tessara.bench.FillBaseline not found (is the bench jar on VLXJBX_CLASSPATH?)");
-  w.lookupClass = GlobalClass(env, "com/velmora/tessara/bench/LookupBaseline");
-  w.lookupFill = Method(env, w.lookupClass, "fill", "(Lcom/velmora/tessara/kdmreplica/Model;I)I", true);
-  w.lookupFind = Method(env, w.lookupClass, "find", "(Lcom/velmora/tessara/kdmreplica/Model;II)I", true);
-  w.lookupSelect = Method(env, w.lookupClass, "select", "(Lcom/velmora/tessara/kdmreplica/Model;I)I", true);
-  if (!w.lookupFill || !w.lookupFind || !w.lookupSelect)
-    return Fail(why, "class com.velmora.tessara.bench.LookupBaseline not found");
   w.systemClass = GlobalClass(env, "java/lang/System");
   w.systemGc = Method(env, w.systemClass, "gc", "()V", true);
   if (!w.systemGc) return Fail(why, "System.gc not found");
@@ -260,7 +192,7 @@ void TearDown(World& w)
   for (jobject ref :
        {w.replicaRef, w.instanceRef, w.modelsRef, w.keptValue, static_cast<jobject>(w.integerClass),
         static_cast<jobject>(w.fillClass), static_cast<jobject>(w.systemClass), static_cast<jobject>(w.doubleClass),
-        static_cast<jobject>(w.booleanClass), static_cast<jobject>(w.dateClass), static_cast<jobject>(w.lookupClass)})
+        static_cast<jobject>(w.booleanClass), static_cast<jobject>(w.dateClass)})
     if (ref) env->DeleteGlobalRef(ref);
 }
 
@@ -586,21 +518,6 @@ void CollectGarbage(World& w)
   Threw(w.env);
 }
 
-// The text form (with values) of every instance of model, in order.
-bool InstanceTexts(VLXKDMModel& model, std::vector<std::string>& texts)
-{
-  VLXKDMInstanceSet set;
-  int count = 0;
-  if (model.GetInstances(set) < 0 || set.GetCount(count) < 0) return false;
-  for (int p = 0; p < count; ++p) {
-    VLXKDMInstance x;
-    VLXUnicodeString text;
-    if (set.GetItem(p, x) < 0 || x.ToString(1, text) < 0) return false;
-    texts.emplace_back(text.c_str(), text.GetLengthInByte());
-  }
-  return true;
-}
-
 // Both fills make the same instances: their text forms, values included, are equal.
 enum class FillBy { Library, HandJni, PureJava };
 
@@ -661,78 +578,6 @@ void RunFill(benchmark::State& state, FillBy by)
     }
   }
   state.counters["instances"] = count;
-}
-
-// ---- Lookups by identifier ---------------------------------------------------------------------
-// One model of gOptions.lookupInstances instances with identifiers "id-0", ... (given in Java);
-// the library finds one per call, Java finds kLookupsPerJavaCall per call; both take the same
-// identifiers, a stride through the whole model.
-
-constexpr int kLookupsPerJavaCall = 1000;
-
-struct LookupModel {
-  VLXKDMReplica replica;
-  VLXKDMModel model;
-  bool ok = false;
-};
-
-LookupModel& TheLookupModel()
-{
-  static LookupModel l;
-  static const bool made = [] {
-    World& w = *gWorld;
-    l.ok = l.replica.Build(VLXUnicodeString("lookup")) >= 0 &&
-           AddClass(l.replica, "Item", {{"group", {VLXKDMAttributeType::Integer, false}}}, l.model) &&
-           w.env->CallStaticIntMethod(w.lookupClass, w.lookupFill, l.model.GetHandle(), gOptions.lookupInstances) ==
-               gOptions.lookupInstances &&
-           !w.env->ExceptionCheck();
-    if (w.env->ExceptionCheck()) w.env->ExceptionClear();
-    return true;
-  }();
-  (void)made;
-  return l;
-}
-
-void RunLookup(benchmark::State& state, bool library)
-{
-  World& w = *gWorld;
-  LookupModel& l = TheLookupModel();
-  if (!l.ok) return state.SkipWithError("the lookup model could not be made");
-  const int n = gOptions.lookupInstances;
-  long long k = 0;
-  VLXKDMInstance x;
-  char text[32];
-  for (auto _ : state) {
-    bool ok;
-    if (library) {
-      std::snprintf(text, sizeof text, "id-%d", static_cast<int>((k++ * 7919LL) % n));
-      ok = l.model.FindInstance(VLXUnicodeString(text), x) >= 0 && x.GetHandle() != nullptr;
-    } else {
-      ok = w.env->CallStaticIntMethod(w.lookupClass, w.lookupFind, l.model.GetHandle(), n, kLookupsPerJavaCall) ==
-               kLookupsPerJavaCall &&
-           !w.env->ExceptionCheck();
-    }
-    if (!ok) return state.SkipWithError("a lookup failed");
-  }
-}
-
-// The instances of group 7 (one in a thousand): the library in one call, Java by a loop.
-void RunSelect(benchmark::State& state, bool library)
-{
-  World& w = *gWorld;
-  LookupModel& l = TheLookupModel();
-  if (!l.ok) return state.SkipWithError("the lookup model could not be made");
-  const int expected = gOptions.lookupInstances / 1000;
-  VLXKDMInstanceValue seven;
-  seven.SetInteger(7);
-  VLXListValVLXKDMInstance found;
-  for (auto _ : state) {
-    const bool ok =
-        library ? l.model.SelectInstances(VLXUnicodeString("group"), seven, 0, found) >= 0 && found.Size() == expected
-                : w.env->CallStaticIntMethod(w.lookupClass, w.lookupSelect, l.model.GetHandle(), 7) == expected &&
-                      !w.env->ExceptionCheck();
-    if (!ok) return state.SkipWithError("a selection failed");
-  }
 }
 
 // ---- Allocations -----------------------------------------------------------------------------
@@ -824,21 +669,6 @@ void PrintSummary(const SummaryReporter& reporter, const std::map<std::string, A
     std::printf("  real time per instance: library %s, hand-written JNI %s, pure Java %s\n",
                 Figure(fl.real / n).c_str(), Figure(fh.real / n).c_str(), Figure(fj.real / n).c_str());
 
-  const double found = reporter.Nanoseconds("Lookup/library").real,
-               javaFound = reporter.Nanoseconds("Lookup/pureJava").real / kLookupsPerJavaCall;
-  if (found > 0 && javaFound > 0)
-    std::printf(
-        "  find by identifier among %d instances: library %s per lookup (target at most 2 us), pure Java %s"
-        " (%s)\n",
-        gOptions.lookupInstances, Figure(found).c_str(), Figure(javaFound).c_str(), Ratio(found, javaFound).c_str());
-
-  const double selected = reporter.Nanoseconds("Select/library").real,
-               javaSelected = reporter.Nanoseconds("Select/pureJava").real;
-  if (selected > 0 && javaSelected > 0)
-    std::printf("  select by an int among %d instances: library %s, a pure Java loop %s (%s; target at most 2x)\n",
-                gOptions.lookupInstances, Figure(selected).c_str(), Figure(javaSelected).c_str(),
-                Ratio(selected, javaSelected).c_str());
-
   std::printf("\nSingle JNI costs, for reading the excess (cpu time per call):\n");
   for (const Single& single : Singles())
     std::printf("  %-44s %10s\n", single.what, Figure(reporter.Nanoseconds(single.key).cpu).c_str());
@@ -891,6 +721,7 @@ int main(int argc, char** argv)
     if (ParseOption(argv[i], "--fill_instances", gOptions.fillInstances) ||
         ParseOption(argv[i], "--fill_iterations", gOptions.fillIterations) ||
         ParseOption(argv[i], "--lookup_instances", gOptions.lookupInstances) ||
+        ParseOption(argv[i], "--bulk_instances", gOptions.bulkInstances) ||
         ParseOption(argv[i], "--warmup_calls", gOptions.warmupCalls))
       continue;
     argv[kept++] = argv[i];
@@ -914,7 +745,9 @@ int main(int argc, char** argv)
   auto world = std::make_unique<World>();
   gWorld = world.get();
   std::string why;
-  if (!SetUp(*world, why) || !FillsAgree(*world, why)) {
+  if (!SetUp(*world, why) || !FillsAgree(*world, why) ||
+      !RegisterDataBenchmarks(world->env, {gOptions.lookupInstances, gOptions.bulkInstances, gOptions.fillIterations},
+                              why)) {
     std::fprintf(stderr, "corvexa-bench: set-up failed: %s\n", why.c_str());
     TearDown(*world);
     return 1;
@@ -971,15 +804,12 @@ int main(int argc, char** argv)
                      benchmark::RegisterBenchmark("Fill/pureJava", RunFill, FillBy::PureJava)})
     fill->Iterations(1)->Repetitions(gOptions.fillIterations)->Unit(benchmark::kMillisecond)->UseRealTime();
 
-  benchmark::RegisterBenchmark("Lookup/library", RunLookup, true);
-  benchmark::RegisterBenchmark("Lookup/pureJava", RunLookup, false);
-  benchmark::RegisterBenchmark("Select/library", RunSelect, true)->Unit(benchmark::kMillisecond);
-  benchmark::RegisterBenchmark("Select/pureJava", RunSelect, false)->Unit(benchmark::kMillisecond);
-
   SummaryReporter reporter;
   benchmark::RunSpecifiedBenchmarks(&reporter);
   PrintSummary(reporter, allocations, fillAllocations);
+  PrintDataSummary(reporter);
   benchmark::Shutdown();
+  ReleaseDataBenchmarks(world->env);
   TearDown(*world);
   return 0;
 }

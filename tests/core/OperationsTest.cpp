@@ -10,6 +10,7 @@
 #include <sstream>
 
 #include "TestSupport.h"
+#include "VLXKDMColumns.h"
 
 using namespace corvexa_test;
 
@@ -196,6 +197,31 @@ long Select(World& w, Outs& o)
   VLXListValVLXKDMInstance found;
   const long rc = w.m.SelectInstances(U("integer"), fortyTwo, 1, found);
   if (rc >= 0) o.n = found.Size();
+  return rc;
+}
+// A batch of one integer column: 0 creates an instance (o.n: how many; 4 without the list), 1 writes 7
+// to i, 2 reads the model's rows (o.n: how many), 1 and 3 read i's integer (o.n: it).
+long ByColumns(World& w, Outs& o, int which)
+{
+  VLXKDMColumns b;
+  long column = 0, rows = 0;
+  int value = 0;
+  const VLXListValVLXKDMInstance justI = ListOf<VLXListValVLXKDMInstance>({w.i});
+  VLXListValVLXKDMInstance made;
+  long rc = b.Reset(1);
+  if (which == 4) return b.CreateInstances(w.m);
+  if (which < 2) {
+    b.AddColumn(U("integer"), VLXKDMAttributeType::Integer, 0, column);
+    b.SetInteger(0, 0, 7);
+    rc = which == 0 ? b.CreateInstances(w.m, made) : b.SetValues(justI);
+    if (rc >= 0 && which == 0) o.n = made.Size();
+    if (rc < 0 || which == 0) return rc;
+    b.Reset(0);
+  }
+  b.AddColumn(U("integer"), column);
+  rc = which == 2 ? b.GetValues(w.m) : b.GetValues(justI);
+  if (rc >= 0 && which == 2 && b.GetRowCount(rows) >= 0) o.n = rows;
+  if (rc >= 0 && which != 2 && b.GetInteger(0, 0, value) >= 0) o.n = value;
   return rc;
 }
 // A limit past 32 bits set and read back (o.n becomes 1 when it came back whole); the default again.
@@ -410,6 +436,11 @@ const Operation kOperations[] = {
     OP(MOD "FindInstance(const VLXBinary&, VLXKDMInstance&)", "instance=null", w.m.FindInstance(kAb, o.i)),
     OP(MOD "SelectInstances(const VLXUnicodeString&, VLXKDMInstanceValue&, VLXBoolean, VLXListValVLXKDMInstance&)",
        "number=1", Select(w, o)),
+    FREE("VLXKDMColumns::CreateInstances(VLXKDMModel&, VLXListValVLXKDMInstance&)", "number=1", ByColumns(w, o, 0)),
+    FREE("VLXKDMColumns::CreateInstances(VLXKDMModel&)", "", ByColumns(w, o, 4)),
+    FREE("VLXKDMColumns::SetValues(const VLXListValVLXKDMInstance&)", "number=7", ByColumns(w, o, 1)),
+    FREE("VLXKDMColumns::GetValues(VLXKDMModel&)", "number=2", ByColumns(w, o, 2)),
+    FREE("VLXKDMColumns::GetValues(const VLXListValVLXKDMInstance&)", "number=42", ByColumns(w, o, 3)),
     OP(MOD "GetReplica(VLXKDMReplica&)", "text=world replica", THEN(w.m.GetReplica(o.r), o.r.GetName(o.s))),
     OP(MOD "ToString(VLXUnicodeString&)", "text", w.m.ToString(o.s)),
 

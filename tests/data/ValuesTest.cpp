@@ -18,17 +18,6 @@ VLXKDMInstanceValue Read(VLXKDMInstance& in, int position)
   return value;
 }
 
-// Whether two Java objects are equal arrays, element by element (java.util.Objects.deepEquals).
-bool DeepEquals(jobject a, jobject b)
-{
-  JNIEnv* env = Env();
-  Local cls(env->FindClass("java/util/Objects"));
-  const jclass objects = static_cast<jclass>(cls.get());
-  const jboolean equal = env->CallStaticBooleanMethod(
-      objects, env->GetStaticMethodID(objects, "deepEquals", "(Ljava/lang/Object;Ljava/lang/Object;)Z"), a, b);
-  return NoPending("deepEquals") && equal == JNI_TRUE;
-}
-
 // The variadic setter, by name and by position, with the three values of list and with none,
 // sends what the list setter sends.
 template <class Variadic, class List>

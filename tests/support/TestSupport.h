@@ -102,6 +102,17 @@ inline jlong TimeOf(jobject date)
   const jlong value = Env()->CallLongMethod(date, MethodOf(date, "getTime", "()J"));
   return NoPending("getTime") ? value : 0;
 }
+// Whether two Java objects are equal, arrays element by element (java.util.Objects.deepEquals).
+inline bool DeepEquals(jobject a, jobject b)
+{
+  JNIEnv* env = Env();
+  Local cls(env->FindClass("java/util/Objects"));
+  const jclass objects = static_cast<jclass>(cls.get());
+  const jboolean equal = env->CallStaticBooleanMethod(
+      objects, env->GetStaticMethodID(objects, "deepEquals", "(Ljava/lang/Object;Ljava/lang/Object;)Z"), a, b);
+  return NoPending("deepEquals") && equal == JNI_TRUE;
+}
+
 // An int field of a test double (they count calls).
 inline int IntField(jobject object, const char* field)
 {

@@ -43,6 +43,15 @@ class VLXUnicodeString {
   // The same check on any byte range.
   static int FirstMalformedOffset(const char* bytes, int length, const char** reason);
 
+  // The UTF-16 form of `length` well-formed UTF-8 bytes (check them with FirstMalformedOffset
+  // first) written to `units`, which has room for `length` units (never more are needed); returns
+  // the number of units. Supplementary characters become surrogate pairs, NUL stays NUL.
+  static int DecodeUtf8(const char* bytes, int length, unsigned short* units);
+  // The UTF-8 form of `count` UTF-16 units written to `bytes`, which has room for 3 bytes per unit;
+  // returns the number of bytes. An unpaired surrogate (a high one ending the units included)
+  // stops the encoding with -1 - its index, or with `lossy` becomes U+FFFD.
+  static long EncodeUtf16(const unsigned short* units, int count, char* bytes, bool lossy);
+
   int operator==(const VLXUnicodeString& other) const { return _bytes == other._bytes; }
   int operator!=(const VLXUnicodeString& other) const { return _bytes != other._bytes; }
 

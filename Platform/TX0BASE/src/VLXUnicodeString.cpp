@@ -96,3 +96,66 @@ int VLXUnicodeString::FirstMalformedOffset(const char* bytes, int length, const 
   if (reason != nullptr) *reason = why;
   return why != nullptr ? i : -1;
 }
+
+int VLXUnicodeString::DecodeUtf8(const char* bytes, int length, unsigned short* units)
+{
+  const unsigned char* s = reinterpret_cast<const unsigned char*>(bytes);
+  int n = 0;
+  int i = 0;
+  while (i < length) {
+    unsigned long c;
+    const unsigned char b = s[i];
+    if (b < 0x80) {
+      c = b;
+      i += 1;
+    } else if (b < 0xE0) {
+      c = ((b & 0x1Fu) << 6) | (s[i + 1] & 0x3Fu);
+      i += 2;
+    } else if (b < 0xF0) {
+      c = ((b & 0x0Fu) << 12) | ((s[i + 1] & 0x3Fu) << 6) | (s[i + 2] & 0x3Fu);
+      i += 3;
+    } else {
+      c = ((b & 0x07u) << 18) | ((s[i + 1] & 0x3Fu) << 12) | ((s[i + 2] & 0x3Fu) << 6) | (s[i + 3] & 0x3Fu);
+      i += 4;
+    }
+    if (c >= 0x10000) {
+      c -= 0x10000;
+      units[n++] = static_cast<unsigned short>(0xD800 + (c >> 10));
+      units[n++] = static_cast<unsigned short>(0xDC00 + (c & 0x3FF));
+    } else {
+      units[n++] = static_cast<unsigned short>(c);
+    }
+  }
+  return n;
+}
+
+long VLXUnicodeString::EncodeUtf16(const unsigned short* units, int count, char* bytes, bool lossy)
+{
+  long n = 0;
+  for (int i = 0; i < count; ++i) {
+    unsigned long c = units[i];
+    if (c >= 0xD800 && c <= 0xDBFF && i + 1 < count && units[i + 1] >= 0xDC00 && units[i + 1] <= 0xDFFF) {
+      c = 0x10000 + ((c - 0xD800) << 10) + (units[i + 1] - 0xDC00);
+      ++i;
+    } else if (c >= 0xD800 && c <= 0xDFFF) {
+      if (!lossy) return -1 - static_cast<long>(i);
+      c = 0xFFFD;
+    }
+    if (c < 0x80) {
+      bytes[n++] = static_cast<char>(c);
+    } else if (c < 0x800) {
+      bytes[n++] = static_cast<char>(0xC0 | (c >> 6));
+      bytes[n++] = static_cast<char>(0x80 | (c & 0x3F));
+    } else if (c < 0x10000) {
+      bytes[n++] = static_cast<char>(0xE0 | (c >> 12));
+      bytes[n++] = static_cast<char>(0x80 | ((c >> 6) & 0x3F));
+      bytes[n++] = static_cast<char>(0x80 | (c & 0x3F));
+    } else {
+      bytes[n++] = static_cast<char>(0xF0 | (c >> 18));
+      bytes[n++] = static_cast<char>(0x80 | ((c >> 12) & 0x3F));
+      bytes[n++] = static_cast<char>(0x80 | ((c >> 6) & 0x3F));
+      bytes[n++] = static_cast<char>(0x80 | (c & 0x3F));
+    }
+  }
+  return n;
+}

@@ -66,30 +66,7 @@ long NewJavaString(JNIEnv* env, const char* bytes, int length, const char* opera
                                    " is not valid UTF-8 (" + reason + ")"},
                    __FILE__, __LINE__);
   }
-  while (i < length) {
-    unsigned long c;
-    const unsigned char b = s[i];
-    if (b < 0x80) {
-      c = b;
-      i += 1;
-    } else if (b < 0xE0) {
-      c = ((b & 0x1Fu) << 6) | (s[i + 1] & 0x3Fu);
-      i += 2;
-    } else if (b < 0xF0) {
-      c = ((b & 0x0Fu) << 12) | ((s[i + 1] & 0x3Fu) << 6) | (s[i + 2] & 0x3Fu);
-      i += 3;
-    } else {
-      c = ((b & 0x07u) << 18) | ((s[i + 1] & 0x3Fu) << 12) | ((s[i + 2] & 0x3Fu) << 6) | (s[i + 3] & 0x3Fu);
-      i += 4;
-    }
-    if (c >= 0x10000) {
-      c -= 0x10000;
-      units[n++] = static_cast<jchar>(0xD800 + (c >> 10));
-      units[n++] = static_cast<jchar>(0xDC00 + (c & 0x3FF));
-    } else {
-      units[n++] = static_cast<jchar>(c);
-    }
-  }
+  n += VLXUnicodeString::DecodeUtf8(bytes + i, length - i, units + n);
   // NewString fails only with a null result (and an OutOfMemoryError pending).
   jstring result = env->NewString(units, n);
   if (result == nullptr) return JavaFailed(env, operation, "NewString");

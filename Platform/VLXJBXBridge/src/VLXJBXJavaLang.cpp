@@ -117,33 +117,7 @@ bool VLXJBXDetail::ClassName(JNIEnv* env, jobject object, std::string& name)
 
 long VLXJBXDetail::Utf16ToUtf8(const jchar* units, jsize count, char* out, bool lossy)
 {
-  long n = 0;
-  for (jsize i = 0; i < count; ++i) {
-    unsigned long c = units[i];
-    if (c >= 0xD800 && c <= 0xDBFF && i + 1 < count && units[i + 1] >= 0xDC00 && units[i + 1] <= 0xDFFF) {
-      c = 0x10000 + ((c - 0xD800) << 10) + (units[i + 1] - 0xDC00);
-      ++i;
-    } else if (c >= 0xD800 && c <= 0xDFFF) {
-      if (!lossy) return -1 - static_cast<long>(i);
-      c = 0xFFFD;
-    }
-    if (c < 0x80) {
-      out[n++] = static_cast<char>(c);
-    } else if (c < 0x800) {
-      out[n++] = static_cast<char>(0xC0 | (c >> 6));
-      out[n++] = static_cast<char>(0x80 | (c & 0x3F));
-    } else if (c < 0x10000) {
-      out[n++] = static_cast<char>(0xE0 | (c >> 12));
-      out[n++] = static_cast<char>(0x80 | ((c >> 6) & 0x3F));
-      out[n++] = static_cast<char>(0x80 | (c & 0x3F));
-    } else {
-      out[n++] = static_cast<char>(0xF0 | (c >> 18));
-      out[n++] = static_cast<char>(0x80 | ((c >> 12) & 0x3F));
-      out[n++] = static_cast<char>(0x80 | ((c >> 6) & 0x3F));
-      out[n++] = static_cast<char>(0x80 | (c & 0x3F));
-    }
-  }
-  return n;
+  return VLXUnicodeString::EncodeUtf16(units, count, out, lossy);
 }
 
 long VLXJBXDetail::RejectUnpairedSurrogate(const char* operation, jsize index, jchar unit)

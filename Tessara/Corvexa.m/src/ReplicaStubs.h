@@ -25,7 +25,7 @@ enum Slot : int {
 #undef RESERVED
   SlotCount
 };
-static_assert(SlotCount == 195, "the binding table has 195 slots");
+static_assert(SlotCount == 204, "the binding table has 204 slots");
 
 enum class BindingKind { Class, Method, Static, SetterFirst, Constant, Reserved };
 

@@ -68,28 +68,6 @@ const ReplicaStubs* TableFor(const char* name, long& status)
   return st;
 }
 
-// A Java date's milliseconds as the nearest whole second, halves rounded up: floor((ms + 500) / 1000),
-// computed without overflow at the ends of the 64-bit range. Every whole second comes back as it was.
-time_t Seconds(jlong ms)
-{
-  long long seconds = ms / 1000;  // rounded toward zero
-  long long rest = ms % 1000;     // same sign as ms
-  if (rest < 0) {                 // floor division
-    seconds -= 1;
-    rest += 1000;
-  }
-  return static_cast<time_t>(rest >= 500 ? seconds + 1 : seconds);
-}
-
-// A time's seconds as a Java date's milliseconds; false when they do not fit in 64 bits.
-bool Milliseconds(const VLXTime& time, jlong& ms)
-{
-  const long long seconds = static_cast<long long>(time.Gettime_t());
-  if (seconds > LLONG_MAX / 1000 || seconds < LLONG_MIN / 1000) return false;
-  ms = static_cast<jlong>(seconds * 1000);
-  return true;
-}
-
 long RejectTime(JNIEnv* env, const VLXTime& time, const char* name)
 {
   const std::string why =

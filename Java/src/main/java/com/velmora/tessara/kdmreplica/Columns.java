@@ -160,6 +160,27 @@ public final class Columns {
         }
     }
 
+    /**
+     * {@link #get(Model, String[], boolean[][])}'s columns followed by their presence masks, in one
+     * array of twice as many elements (the form the native bridge reads).
+     */
+    public static Object[] getWithMasks(Model model, String[] attributes) {
+        boolean[][] present = new boolean[attributes == null ? 0 : attributes.length][];
+        return withMasks(get(model, attributes, present), present);
+    }
+
+    /** As {@link #getWithMasks(Model, String[])} for the instances. */
+    public static Object[] getWithMasks(Instance[] instances, String[] attributes) {
+        boolean[][] present = new boolean[attributes == null ? 0 : attributes.length][];
+        return withMasks(get(instances, attributes, present), present);
+    }
+
+    private static Object[] withMasks(Object[] columns, boolean[][] present) {
+        Object[] out = Arrays.copyOf(columns, 2 * columns.length);
+        System.arraycopy(present, 0, out, columns.length, present.length);
+        return out;
+    }
+
     /** One call's rows and columns (the caller holds the replica's lock). */
     private static final class Batch {
         private final String op;

@@ -104,7 +104,9 @@ class BindingTableTest {
             case "CLASS":
                 if (ours) {
                     assertTrue(Modifier.isPublic(c.getModifiers()), slot);
-                    assertTrue(c.isEnum() || !Modifier.isFinal(c.getModifiers()), slot + " must stay subclassable");
+                    // Test doubles subclass the classes whose objects proxies hold (not static holders).
+                    assertTrue(c.isEnum() || !Modifier.isFinal(c.getModifiers()) || c.getConstructors().length == 0,
+                            slot + " must stay subclassable");
                 }
                 break;
             case "CONSTANT":
