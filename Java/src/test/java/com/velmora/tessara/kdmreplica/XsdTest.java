@@ -26,19 +26,22 @@ class XsdTest {
         Replica.setFeature("indent", true);
     }
 
-    /** Each class as "Name(Super) abstract: attr Type*! length [targets], ..." ('*' multi-valued, '!' mandatory). */
+    /** Each class as "Name(Super) @namespace "comment" abstract: attr Type*! length [targets] "comment", ..." ('*' multi-valued, '!' mandatory). */
     private static String shape(Replica r) {
         StringBuilder b = new StringBuilder();
         for (int i = 0; i < r.getModels().getCount(); i++) {
             ClassDef c = r.getModels().getItem(i).getClassDef();
             b.append(c.getClassName()).append(c.getSuperName().isEmpty() ? "" : "(" + c.getSuperName() + ")")
+                    .append(c.getSchemaNamespace().isEmpty() ? "" : " @" + c.getSchemaNamespace())
+                    .append(c.getQKAComment().isEmpty() ? "" : " \"" + c.getQKAComment() + "\"")
                     .append(c.isAbstract() ? " abstract" : "").append(':');
             for (int k = 0; k < c.getAttributes().getCount(); k++) {
                 AttributeDef a = c.getAttributes().getItem(k);
                 b.append(' ').append(a.getAttributeName()).append(' ').append(a.getAttributeType())
                         .append(a.isMultiValuated() ? "*" : "").append(a.isMandatory() ? "!" : "")
                         .append(a.getLength() != 0 ? " " + a.getLength() : "")
-                        .append(a.getTargetNames().length > 0 ? " " + Arrays.toString(a.getTargetNames()) : "").append(',');
+                        .append(a.getTargetNames().length > 0 ? " " + Arrays.toString(a.getTargetNames()) : "")
+                        .append(a.getQKAComment().isEmpty() ? "" : " \"" + a.getQKAComment() + "\"").append(',');
             }
             b.append('\n');
         }
@@ -110,12 +113,12 @@ class XsdTest {
         Replica r = new Replica("inv");
         r.insertSchemaString(HAND_WRITTEN);
         assertEquals("""
-                Stock: parts Relationship* [Part],
-                Part abstract: number String! 8, qty Integer, weight Double, tags String*, photo Binary 1024, \
-                supplier Relationship [Supplier],
-                Bolt(Part): thread Integer!, checked Boolean*,
-                Supplier: name String!, since Date,
-                Empty:
+                Stock @urn:example:inv: parts Relationship* [Part],
+                Part @urn:example:inv "Anything we stock." abstract: number String! 8, qty Integer, weight Double, \
+                tags String*, photo Binary 1024, supplier Relationship [Supplier],
+                Bolt(Part) @urn:example:inv: thread Integer!, checked Boolean*,
+                Supplier @urn:example:inv: name String!, since Date,
+                Empty @urn:example:inv:
                 """, shape(r));
         // The replica then works as any other: data, documents, and its own schema.
         Instance b = inst(r.getModels().getItem("Bolt"), "number", "B-1", "thread", 8, "supplier",
@@ -154,7 +157,7 @@ class XsdTest {
         write(dir.resolve("other.xsd"), XS + " targetNamespace='urn:other'><xs:complexType name='Maker'/></xs:schema>");
         Replica r = new Replica("files");
         r.insertSchemaFile(main.toString());
-        assertEquals("Part: n Integer!,\nMaker:\nBolt(Part): maker Relationship! [Maker],\n", shape(r));
+        assertEquals("Part: n Integer!,\nMaker @urn:other:\nBolt(Part): maker Relationship! [Maker],\n", shape(r));
 
         Path outside = write(dir.resolve("outside.xsd"), schema("<xs:complexType name='Secret'/>"));
         Path inner = dir.resolve("inner/schema.xsd");
@@ -185,15 +188,12 @@ class XsdTest {
                 + " name='D'><xs:complexContent><xs:extension base='p:C'/></xs:complexContent></xs:complexType></xs:schema>");
         Replica ns = new Replica("ns");
         ns.insertSchemaFile(inner.toString());
-        assertEquals("C: c Relationship [C],\nD(C):\n", shape(ns));
-        assertEquals("urn:p urn:p", ns.getClassDef("C").getSchemaNamespace() + " " + ns.getClassDef("D").getSchemaNamespace());
+        assertEquals("C @urn:p: c Relationship [C],\nD(C) @urn:p:\n", shape(ns));
         write(inner.resolveSibling("p.xsd"), XS + " targetNamespace='urn:p'><xs:complexType name='Before'/></xs:schema>");
-        String[][] spaces = {
-            {"<xs:import namespace='urn:q' schemaLocation='p.xsd'/>", "imported schema has targetNamespace 'urn:p', not 'urn:q'"},
-            {"<xs:include schemaLocation='p.xsd'/>", "included schema has targetNamespace 'urn:p', not none"},
-            {"<xs:complexType name='Before'/><xs:import namespace='urn:p' schemaLocation='p.xsd'/>",
-                "class 'Before' is defined twice", "cannot be kept apart"},
-        };
+        String[][] spaces = {{"<xs:import namespace='urn:q' schemaLocation='p.xsd'/>", "imported schema has targetNamespace"
+            + " 'urn:p', not 'urn:q'"}, {"<xs:include schemaLocation='p.xsd'/>", "included schema has targetNamespace 'urn:p',"
+            + " not none"}, {"<xs:complexType name='Before'/><xs:import namespace='urn:p' schemaLocation='p.xsd'/>",
+                "class 'Before' is defined twice", "schema.xsd' at line 2, in no namespace", "kept apart"}};
         for (String[] c : spaces) {
             write(inner, schema(c[0]));
             failsAt(1, () -> new Replica("t").insertSchemaFile(inner.toString()), Arrays.copyOfRange(c, 1, c.length));
@@ -254,28 +254,6 @@ class XsdTest {
         assertEquals(before, dump(r));
     }
 
-    /** Each class but Existing as "Name @namespace "comment": attr Type*! [targets] "comment", ...". */
-    private static String kept(Replica r) {
-        StringBuilder b = new StringBuilder();
-        for (int i = 0; i < r.getModels().getCount(); i++) {
-            ClassDef c = r.getModels().getItem(i).getClassDef();
-            if (c.getClassName().equals("Existing")) {
-                continue;
-            }
-            b.append(b.length() == 0 ? "" : "; ").append(c.getClassName())
-                    .append(c.getSchemaNamespace().isEmpty() ? "" : " @" + c.getSchemaNamespace())
-                    .append(c.getQKAComment().isEmpty() ? "" : " \"" + c.getQKAComment() + "\"").append(':');
-            for (int k = 0; k < c.getAttributes().getCount(); k++) {
-                AttributeDef a = c.getAttributes().getItem(k);
-                b.append(' ').append(a.getAttributeName()).append(' ').append(a.getAttributeType())
-                        .append(a.isMultiValuated() ? "*" : "").append(a.isMandatory() ? "!" : "")
-                        .append(a.getTargetNames().length > 0 ? " " + Arrays.toString(a.getTargetNames()) : "")
-                        .append(a.getQKAComment().isEmpty() ? "" : " \"" + a.getQKAComment() + "\"");
-            }
-        }
-        return b.toString();
-    }
-
     /**
      * Hand-written constructs: each is kept, and comes back from the replica's own XSD and binary
      * form ("kept: " what the replica holds), or is refused naming it, at its line (line 3).
@@ -284,12 +262,12 @@ class XsdTest {
     @ParameterizedTest(name = "{1} -> {2}")
     @CsvSource(delimiter = '|', quoteCharacter = '`', textBlock = """
         targetNamespace='urn:p'           | <xs:complexType name='A'/>  | kept: A @urn:p:
-        targetNamespace='urn:p' xmlns:p='urn:p' | <xs:complexType name='A'><xs:sequence><xs:element name='b' type='p:A' minOccurs='0'/></xs:sequence></xs:complexType> | kept: A @urn:p: b Relationship [A]
-        xmlns:c='urn:corvexa:replica:1'   | <xs:complexType name='A'><xs:sequence><xs:element name='b' type='c:Existing'/></xs:sequence></xs:complexType> | kept: A: b Relationship! [Existing]
+        targetNamespace='urn:p' xmlns:p='urn:p' | <xs:complexType name='A'><xs:sequence><xs:element name='b' type='p:A' minOccurs='0'/></xs:sequence></xs:complexType> | kept: A @urn:p: b Relationship [A],
+        xmlns:c='urn:corvexa:replica:1'   | <xs:complexType name='A'><xs:sequence><xs:element name='b' type='c:Existing'/></xs:sequence></xs:complexType> | kept: A: b Relationship! [Existing],
         ``                                | <xs:complexType name='A'><xs:annotation><xs:documentation>Parts &amp; <![CDATA[more]]></xs:documentation></xs:annotation></xs:complexType> | `kept: A "Parts & more":`
-        ``                                | seq: <xs:element name='n' type='xs:int'><xs:annotation><xs:documentation> a count </xs:documentation></xs:annotation></xs:element> | `kept: P: n Integer! " a count "`
-        ``                                | seq: <xs:element name='m' type='xs:int' minOccurs='0' maxOccurs='unbounded' nillable='true'/><xs:element name='k' type='xs:int' maxOccurs='unbounded' nillable='false'/> | kept: P: m Integer* k Integer*!
-        ``                                | seq: <xs:element name='n' type='xs:int' minOccurs='1' maxOccurs='1' nillable='false'/> | kept: P: n Integer!
+        ``                                | seq: <xs:element name='n' type='xs:int'><xs:annotation><xs:documentation> a count </xs:documentation></xs:annotation></xs:element> | `kept: P: n Integer! " a count ",`
+        ``                                | seq: <xs:element name='m' type='xs:int' minOccurs='0' maxOccurs='unbounded' nillable='true'/><xs:element name='k' type='xs:int' maxOccurs='unbounded' nillable='false'/> | kept: P: m Integer*, k Integer*!,
+        ``                                | seq: <xs:element name='n' type='xs:int' minOccurs='1' maxOccurs='1' nillable='false'/> | kept: P: n Integer!,
         ``                                | seq: <xs:element name='n' type='xs:int' minOccurs='2' maxOccurs='5'/> | minOccurs 2 and maxOccurs 5
         ``                                | seq: <xs:element name='n' type='xs:int' minOccurs='0' maxOccurs='3'/> | minOccurs 0 and maxOccurs 3
         ``                                | seq: <xs:element name='n' type='xs:int' nillable='true'/> | is nillable but single-valued
@@ -318,12 +296,12 @@ class XsdTest {
             return;
         }
         r.insertSchemaString(xsd);
-        assertEquals(outcome.substring(6), kept(r));
+        String expected = "Existing: n Integer,\n" + outcome.substring(6) + "\n";
+        assertEquals(expected, shape(r));
         Replica back = new Replica("back");
         back.insertSchemaString(r.getXsd());
-        assertEquals(outcome.substring(6), kept(back), "from the replica's XSD");
-        assertEquals(outcome.substring(6), kept(Replica.getReplicaFromBinary(Replica.getBinaryFromReplica(r, true), true)),
-                "from the binary form");
+        assertEquals(expected, shape(back), "from the replica's XSD");
+        assertEquals(expected, shape(Replica.getReplicaFromBinary(Replica.getBinaryFromReplica(r, true), true)));
     }
 
     @Test
@@ -334,7 +312,7 @@ class XsdTest {
                 + "</xs:appinfo></xs:annotation><xs:sequence><xs:element name='a' type='xs:string'><xs:annotation>"
                 + "<xs:appinfo><c:attribute access='Read' length='-2' commentEsc='x\\\\y'/></xs:appinfo></xs:annotation>"
                 + "</xs:element></xs:sequence></xs:complexType></xs:schema>");
-        assertEquals("P: a String -2,\n", shape(r), "the appinfo gives every property: not abstract, a optional");
+        assertEquals("P: a String -2 \"x\\y\",\n", shape(r), "the appinfo gives every property: not abstract, a optional");
         assertFalse(r.getClassDef("P").isPersistent());
         assertArrayEquals(new String[] {"a\tb"}, r.getClassDef("P").getScopeNames());
         assertEquals("Read x\\y", r.getAttributeDef("P.a").getAccessMode() + " " + r.getAttributeDef("P.a").getQKAComment());
