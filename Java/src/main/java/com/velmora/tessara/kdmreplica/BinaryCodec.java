@@ -23,8 +23,9 @@ import java.util.zip.Inflater;
  *            values of every instance in table order       (live and deleted of each class in
  *                                                           class order, then the outside ones)
  * class   := str name, str superName, str uuid, str comment, str derivability, strs scopeNames,
- *            u8 flags (extensible 1, abstract 2, persistent 4, visibility &lt;&lt; 3, Extension 32),
- *            count attributes, attribute*
+ *            u8 flags (extensible 1, abstract 2, persistent 4, visibility &lt;&lt; 3, Extension 32,
+ *            namespace 64), str namespace (only with flag 64: a class without a schema namespace
+ *            is written as before namespaces were kept), count attributes, attribute*
  * attribute := str name, u8 type, u8 flags (multi 1, mandatory 2, unique 4, Composition 8,
  *            access &lt;&lt; 4, visibility &lt;&lt; 6), zigzag length, str uuid, str comment,
  *            strs targetNames, strs targetRefs

@@ -72,6 +72,27 @@ final class BinaryFormat {
         return new Property<>((out, t) -> out.str(get.apply(t)), (in, t) -> set.set(t, in.str(what)));
     }
 
+    /**
+     * A text present only when its flag bit is set (a class without one is written as before the
+     * text existed): written when not empty; read when the flags left it null, and then not empty.
+     */
+    private static <T> Property<T> flagged(String what, Function<T, String> get, Setter<T, String> set) {
+        return new Property<>((out, t) -> {
+            if (!get.apply(t).isEmpty()) {
+                out.str(get.apply(t));
+            }
+        }, (in, t) -> {
+            if (get.apply(t) == null) {
+                int at = in.pos;
+                String v = in.str(what);
+                if (v.isEmpty()) {
+                    throw in.failAt(in.expand(what) + " is empty, though its flag says it is given", at, null);
+                }
+                set.set(t, v);
+            }
+        });
+    }
+
     /** A list of texts ({@code strs}: a count, then each text). */
     private static <T> Property<T> texts(String what, Function<T, String[]> get, Setter<T, String[]> set) {
         String countWhat = what + " count";
@@ -177,7 +198,9 @@ final class BinaryFormat {
                     bit(2, c -> c.persistent, (c, v) -> c.persistent = v),
                     choice(3, VISIBILITIES, c -> c.visibility, (c, v) -> c.visibility = v),
                     bit(5, c -> c.classType == ClassType.Extension,
-                            (c, v) -> c.classType = v ? ClassType.Extension : ClassType.Class)));
+                            (c, v) -> c.classType = v ? ClassType.Extension : ClassType.Class),
+                    bit(6, c -> !c.namespace.isEmpty(), (c, v) -> c.namespace = v ? null : "")),
+            flagged("the namespace of {class}", c -> c.namespace, (c, v) -> c.namespace = v));
 
     /** An attribute after its name and type code, in the order written. */
     private static final List<Property<AttributeDef>> ATTRIBUTE = List.of(

@@ -15,7 +15,8 @@ import java.util.concurrent.locks.Lock;
  * breaks this throws and is undone. Outside a replica the super name is only stored.
  *
  * <p>Defaults: super name "" (none), class type {@code Class}, visibility {@code Public}, not
- * abstract, not extensible, persistent, empty uuid, comment and derivability, no scope names.
+ * abstract, not extensible, persistent, empty uuid, comment, derivability and namespace, no scope
+ * names.
  * A null text stores the empty text; arrays are copied in and out.
  */
 public class ClassDef {
@@ -24,6 +25,8 @@ public class ClassDef {
     String uuid = "";
     String comment = "";
     String derivability = "";
+    /** The target namespace of the schema that declared the class; "" for none or the replica's own. */
+    String namespace = "";
     String[] scopeNames = new String[0];
     boolean extensible;
     boolean abstractClass;
@@ -223,6 +226,30 @@ public class ClassDef {
         Lock l = Locks.write(this);
         try {
             this.comment = Names.orEmpty(comment);
+        } finally {
+            l.unlock();
+        }
+    }
+
+    /**
+     * The target namespace of the XSD the class was read from ("" for a schema without one, for the
+     * replica's own namespace, and for a class made otherwise). It is carried by the replica's XSD
+     * and binary form; documents name classes by name alone, so a replica's class names are unique
+     * whatever their namespaces.
+     */
+    public String getSchemaNamespace() {
+        Lock l = Locks.read(this);
+        try {
+            return namespace;
+        } finally {
+            l.unlock();
+        }
+    }
+
+    public void setSchemaNamespace(String namespace) {
+        Lock l = Locks.write(this);
+        try {
+            this.namespace = Names.orEmpty(namespace);
         } finally {
             l.unlock();
         }

@@ -29,16 +29,26 @@ import javax.xml.stream.XMLStreamConstants;
  * <li>element types {@code xs:int} or {@code xs:integer} (Integer), {@code xs:double},
  * {@code xs:string}, {@code xs:dateTime} (Date), {@code xs:boolean}, {@code xs:base64Binary}
  * (Binary), or a complex type of the schema (a Relationship to that class);</li>
- * <li>{@code minOccurs} of 1 or more for mandatory (1 is XSD's default), {@code maxOccurs} above
- * 1 or {@code unbounded} for multi-valued, an anonymous {@code xs:simpleType} restriction of
- * {@code xs:string} or {@code xs:base64Binary} with {@code xs:maxLength} for the length;</li>
+ * <li>{@code minOccurs} 1 (XSD's default) for mandatory or 0, {@code maxOccurs} 1 or
+ * {@code unbounded} for multi-valued ({@code nillable} only then: an empty array), an anonymous
+ * {@code xs:simpleType} restriction of {@code xs:string} or {@code xs:base64Binary} with
+ * {@code xs:maxLength} for the length;</li>
+ * <li>the {@code xs:documentation} (text only, one) of a class's {@code xs:complexType} or an
+ * attribute's {@code xs:element}: its comment;</li>
+ * <li>the {@code targetNamespace}: the classes' schema namespace; type references resolve
+ * through their namespace (the replica's own namespace and no namespace are one), to classes of
+ * the schemas read or of the replica;</li>
  * <li>global {@code xs:element}s with a named type (document elements: ignored), annotations,
  * and {@code xs:include}/{@code xs:import} of local files in the directory of a schema read from a
  * file (or below it). URLs, files elsewhere, and includes from a schema given as a string are
  * refused without being read.</li>
  * </ul>
  *
- * Anything else is refused with an {@link XmlDocumentException} naming the construct and its line.
+ * Anything else is refused with an {@link XmlDocumentException} naming the construct and its line:
+ * nothing of a schema is dropped silently but foreign {@code xs:appinfo}, which is for other
+ * applications, and the document elements. Classes are named without namespace in a replica (its
+ * documents name an instance's class by name alone), so two classes of one name in different
+ * namespaces are refused.
  * Classes join the replica through {@link Staging}: on any error the replica is unchanged.
  */
 final class XsdReader {
@@ -46,8 +56,8 @@ final class XsdReader {
             XsdWriter.STATE_LIST, XsdWriter.STRING_TYPE, XsdWriter.DOUBLE_TYPE, XsdWriter.REF_TYPE);
     private static final Pattern SCHEME = Pattern.compile("[A-Za-z][A-Za-z0-9+.-]*:.*", Pattern.DOTALL);
     private static final String SUPPORTED = "supported: named xs:complexType with xs:sequence of typed xs:element,"
-            + " xs:complexContent/xs:extension, minOccurs/maxOccurs, xs:maxLength, xs:annotation, xs:include and"
-            + " xs:import of local files";
+            + " xs:complexContent/xs:extension, minOccurs 0 or 1, maxOccurs 1 or unbounded, xs:maxLength,"
+            + " xs:annotation, xs:include and xs:import of local files";
 
     /** A class as read. */
     private static final class DeclaredType {
@@ -56,10 +66,16 @@ final class XsdReader {
         int line;
         int column;
         String base;
+        String baseNs;
         int baseLine;
         int baseColumn;
         boolean abstractAttr;
         ClassDef props;
+        /** The namespace references find it in ({@link #key}), the one it keeps, and whether ours wrote it. */
+        String ns;
+        String keptNs;
+        boolean ours;
+        Doc doc;
         boolean hasContent;
         final List<DeclaredElement> elems = new ArrayList<>();
     }
@@ -71,10 +87,25 @@ final class XsdReader {
         int column;
         AttributeType type;
         String classRef;
+        String classRefNs;
         boolean multi;
         boolean mandatory;
         int maxLength;
         AttributeDef props;
+        Doc doc;
+    }
+
+    /** An xs:documentation: its text and where it stands. */
+    private static final class Doc {
+        final String text;
+        final int line;
+        final int column;
+
+        Doc(String text, int line, int column) {
+            this.text = text;
+            this.line = line;
+            this.column = column;
+        }
     }
 
     /** Directory that includes must stay in (real path), or null when includes are refused. */
@@ -83,6 +114,17 @@ final class XsdReader {
     private Path currentDir;
     private final Set<Path> visited = new HashSet<>();
     private final List<DeclaredType> types = new ArrayList<>();
+    /** The namespaces ({@link #key}) the schemas read declare classes in. */
+    private final Set<String> defined = new HashSet<>();
+    /** For a document being included or imported: the target namespace it must have (null: any). */
+    private String expect;
+    /** Whether the document being read is included (then it may have no target namespace). */
+    private boolean including;
+    /** The target namespace of the document being read ("" for none), and whether ours wrote it. */
+    private String docNs = "";
+    private boolean docOurs;
+    /** An included document without target namespace: its references without namespace are to docNs. */
+    private boolean chameleon;
 
     private XsdReader(Path schemaFile, String refusal) {
         this.refusal = refusal;
@@ -151,6 +193,15 @@ final class XsdReader {
                 + ")");
     }
 
+    /** The namespace by which references find a class: the replica's own namespace and none are one. */
+    private static String key(String ns) {
+        return ns == null || NS.equals(ns) ? "" : ns;
+    }
+
+    private static String show(String key) {
+        return key.isEmpty() ? "no namespace (or the replica's own, " + NS + ")" : "namespace '" + key + "'";
+    }
+
     private static boolean plain(XmlInput.In in, int i) {
         String ns = in.r.getAttributeNamespace(i);
         return ns == null || ns.isEmpty();
@@ -172,7 +223,18 @@ final class XsdReader {
                 throw unsupportedAttr(in, i);
             }
         }
+        String declared = tns == null ? "" : tns;
+        if (expect != null && !declared.equals(expect) && !(including && declared.isEmpty())) {
+            throw in.fail("the " + (including ? "included" : "imported") + " schema has "
+                    + (declared.isEmpty() ? "no targetNamespace" : "targetNamespace '" + declared + "'") + ", not "
+                    + (expect.isEmpty() ? "none" : "'" + expect + "'") + (including ? " as the schema including it"
+                    : " as its xs:import says"));
+        }
         boolean ours = NS.equals(tns);
+        chameleon = including && declared.isEmpty() && !expect.isEmpty();
+        docNs = chameleon ? expect : declared;
+        docOurs = ours;
+        defined.add(key(docNs));
         for (;;) {
             int e = in.nextTag("xs:schema");
             if (e == XMLStreamConstants.END_ELEMENT) {
@@ -185,7 +247,7 @@ final class XsdReader {
             String name = in.attr("name");
             switch (local) {
                 case "annotation":
-                    in.skip();
+                    annotation(in, null, null, "at the top level of a schema");
                     break;
                 case "include":
                 case "import":
@@ -253,14 +315,28 @@ final class XsdReader {
             throw in.fail(what + " of '" + XmlNames.clip(decoded) + "' is refused: it is not a file inside the"
                     + " directory of the inserted schema, " + rootDir + " (nothing was read)");
         }
+        boolean isInclude = in.is(XS, "include");
+        String ns = isInclude ? docNs : in.attr("namespace");
         in.skip();
         if (visited.add(real)) {
             Path saved = currentDir;
+            String savedNs = docNs;
+            String savedExpect = expect;
+            boolean savedOurs = docOurs;
+            boolean savedIncluding = including;
+            boolean savedChameleon = chameleon;
             currentDir = real.getParent();
+            expect = ns == null ? "" : ns;
+            including = isInclude;
             try {
                 parseDocument(XmlInput.Src.ofFile("XSD", real.toString(), "insertSchemaFile"));
             } finally {
                 currentDir = saved;
+                docNs = savedNs;
+                expect = savedExpect;
+                docOurs = savedOurs;
+                including = savedIncluding;
+                chameleon = savedChameleon;
             }
         }
     }
@@ -281,7 +357,7 @@ final class XsdReader {
                 throw unsupported(in, "in the top-level element '" + name + "' (declare a named xs:complexType and"
                         + " give the element that type)");
             }
-            in.skip();
+            annotation(in, null, null, "in the top-level element '" + name + "'");
         }
         if (!typed) {
             throw in.fail("the top-level element '" + name + "' has no type; give it the type of a named"
@@ -291,6 +367,9 @@ final class XsdReader {
 
     private DeclaredType complexType(XmlInput.In in) {
         DeclaredType t = new DeclaredType();
+        t.ns = key(docNs);
+        t.keptNs = key(docNs);
+        t.ours = docOurs;
         t.source = in.source;
         t.line = in.line();
         t.column = in.column();
@@ -318,7 +397,7 @@ final class XsdReader {
             }
             switch (in.r.getLocalName()) {
                 case "annotation":
-                    annotation(in, t, null);
+                    annotation(in, t, null, null);
                     break;
                 case "sequence":
                     content(in, t);
@@ -371,6 +450,12 @@ final class XsdReader {
         return new String[] {ns == null ? "" : ns, local};
     }
 
+    /** A reference to a class: its namespace ({@link #key}, a chameleon's none taken as its includer's) and name. */
+    private String[] classRef(XmlInput.In in, String what, String text) {
+        String[] q = qname(in, what, text);
+        return new String[] {key(chameleon && q[0].isEmpty() ? docNs : q[0]), q[1]};
+    }
+
     private void complexContent(XmlInput.In in, DeclaredType t) {
         for (int i = 0; i < in.r.getAttributeCount(); i++) {
             String n = in.r.getAttributeLocalName(i);
@@ -381,7 +466,7 @@ final class XsdReader {
         boolean extension = false;
         while (in.nextTag("xs:complexContent") == XMLStreamConstants.START_ELEMENT) {
             if (in.is(XS, "annotation")) {
-                in.skip();
+                annotation(in, null, null, "in xs:complexContent of '" + t.name + "'");
                 continue;
             }
             if (!in.is(XS, "extension") || extension) {
@@ -404,13 +489,15 @@ final class XsdReader {
                 throw in.fail("xs:extension of '" + base + "' in '" + t.name + "' is not supported: the base must be"
                         + " the complex type of the super class");
             }
+            q = classRef(in, "base", base);
+            t.baseNs = q[0];
             t.base = q[1];
             t.baseLine = in.line();
             t.baseColumn = in.column();
             boolean seq = false;
             while (in.nextTag("xs:extension") == XMLStreamConstants.START_ELEMENT) {
                 if (in.is(XS, "annotation")) {
-                    in.skip();
+                    annotation(in, null, null, "in xs:extension of '" + t.name + "'");
                 } else if (in.is(XS, "sequence") && !seq) {
                     seq = true;
                     sequence(in, t);
@@ -447,7 +534,7 @@ final class XsdReader {
         }
         while (in.nextTag("xs:sequence of '" + t.name + "'") == XMLStreamConstants.START_ELEMENT) {
             if (in.is(XS, "annotation")) {
-                in.skip();
+                annotation(in, null, null, "in the xs:sequence of '" + t.name + "'");
             } else if (in.is(XS, "element")) {
                 t.elems.add(localElement(in, t));
             } else {
@@ -478,6 +565,7 @@ final class XsdReader {
         e.column = in.column();
         int min = 1;
         int max = 1;
+        boolean nillable = false;
         String type = null;
         for (int i = 0; i < in.r.getAttributeCount(); i++) {
             String n = in.r.getAttributeLocalName(i);
@@ -490,7 +578,7 @@ final class XsdReader {
                 case "type": type = v; break;
                 case "minOccurs": min = occurs(in, n, v); break;
                 case "maxOccurs": max = occurs(in, n, v); break;
-                case "nillable": bool(in, n, v); break;
+                case "nillable": nillable = bool(in, n, v); break;
                 case "id": break;
                 case "form":
                     if (v.strip().equals("qualified")) {
@@ -508,6 +596,17 @@ final class XsdReader {
             throw in.fail("element '" + e.name + "' of '" + t.name + "' has minOccurs " + min + " and maxOccurs "
                     + (max == Integer.MAX_VALUE ? "unbounded" : Integer.toString(max)));
         }
+        if (min > 1 || max != 1 && max != Integer.MAX_VALUE) {
+            throw in.fail("element '" + e.name + "' of '" + t.name + "' has minOccurs " + min + " and maxOccurs "
+                    + (max == Integer.MAX_VALUE ? "unbounded" : Integer.toString(max)) + ": bounds are not supported (an"
+                    + " attribute is optional or mandatory, minOccurs 0 or 1, and single or multi-valued, maxOccurs 1"
+                    + " or unbounded)");
+        }
+        if (nillable && max == 1) {
+            throw in.fail("element '" + e.name + "' of '" + t.name + "' is nillable but single-valued: nillable is"
+                    + " supported only with maxOccurs unbounded (xsi:nil is an empty multi-valued attribute; a"
+                    + " single-valued one has a value or none)");
+        }
         e.mandatory = min >= 1;
         e.multi = max > 1;
         if (type != null) {
@@ -515,7 +614,7 @@ final class XsdReader {
         }
         while (in.nextTag("xs:element '" + e.name + "'") == XMLStreamConstants.START_ELEMENT) {
             if (in.is(XS, "annotation")) {
-                annotation(in, null, e);
+                annotation(in, null, e, null);
             } else if ((in.is(XS, "simpleType") || in.is(XS, "complexType")) && e.type == null) {
                 anonymousType(in, e);
             } else if (in.is(XS, "simpleType") || in.is(XS, "complexType")) {
@@ -530,7 +629,7 @@ final class XsdReader {
         return e;
     }
 
-    private static void resolveType(XmlInput.In in, DeclaredElement e, String type) {
+    private void resolveType(XmlInput.In in, DeclaredElement e, String type) {
         String[] q = qname(in, "type", type);
         if (XS.equals(q[0])) {
             switch (q[1]) {
@@ -558,6 +657,8 @@ final class XsdReader {
             }
         }
         e.type = AttributeType.Relationship;
+        q = classRef(in, "type", type);
+        e.classRefNs = q[0];
         e.classRef = q[1];
     }
 
@@ -570,7 +671,7 @@ final class XsdReader {
         boolean done = false;
         while (in.nextTag(in.qname()) == XMLStreamConstants.START_ELEMENT) {
             if (in.is(XS, "annotation")) {
-                in.skip();
+                annotation(in, null, null, "in the anonymous type of element '" + e.name + "'");
                 continue;
             }
             if (done) {
@@ -583,7 +684,7 @@ final class XsdReader {
                 }
                 while (in.nextTag("xs:simpleContent") == XMLStreamConstants.START_ELEMENT) {
                     if (in.is(XS, "annotation")) {
-                        in.skip();
+                        annotation(in, null, null, "in the anonymous type of element '" + e.name + "'");
                     } else if (in.is(XS, "restriction") && e.type == null) {
                         restriction(in, e, true);
                     } else {
@@ -620,7 +721,7 @@ final class XsdReader {
         }
         while (in.nextTag("xs:restriction") == XMLStreamConstants.START_ELEMENT) {
             if (in.is(XS, "annotation")) {
-                in.skip();
+                annotation(in, null, null, "in the xs:restriction of element '" + e.name + "'");
             } else if (in.is(XS, "maxLength")) {
                 String v = in.attr("value");
                 try {
@@ -638,10 +739,35 @@ final class XsdReader {
         }
     }
 
-    private static void annotation(XmlInput.In in, DeclaredType t, DeclaredElement e) {
+    /**
+     * An xs:annotation: our appinfo gives the properties of class {@code t} or attribute {@code e},
+     * the xs:documentation their comment; with neither ({@code where} says where the annotation
+     * stands) a documentation has no place and is refused.
+     */
+    private static void annotation(XmlInput.In in, DeclaredType t, DeclaredElement e, String where) {
         while (in.nextTag("xs:annotation") == XMLStreamConstants.START_ELEMENT) {
             if (in.is(XS, "documentation")) {
-                in.skip();
+                if (t == null && e == null) {
+                    throw in.fail("xs:documentation " + where + " is not supported: only a class's xs:complexType"
+                            + " and an attribute's xs:element keep one, as their comment");
+                }
+                if (in.r.getAttributeCount() > 0) {
+                    throw in.fail("attribute '" + in.attrName(0) + "' of xs:documentation is not supported (the"
+                            + " comment it becomes keeps the text only)");
+                }
+                String owner = t != null ? "class '" + t.name + "'" : "attribute '" + e.name + "'";
+                if ((t != null ? t.doc : e.doc) != null) {
+                    throw in.fail("a second xs:documentation of " + owner + " is not supported: its comment is one"
+                            + " text");
+                }
+                int line = in.line();
+                int column = in.column();
+                Doc d = new Doc(in.text("the xs:documentation of " + owner), line, column);
+                if (t != null) {
+                    t.doc = d;
+                } else {
+                    e.doc = d;
+                }
             } else if (in.is(XS, "appinfo")) {
                 while (in.nextTag("xs:appinfo") == XMLStreamConstants.START_ELEMENT) {
                     if (t != null && in.is(NS, "class")) {
@@ -713,6 +839,7 @@ final class XsdReader {
 
     private static ClassDef classProps(XmlInput.In in, String cls) {
         ClassDef c = new ClassDef("props");
+        c.namespace = null; // given only by the attribute
         for (int i = 0; i < in.r.getAttributeCount(); i++) {
             String n = in.r.getAttributeLocalName(i);
             String v = in.r.getAttributeValue(i);
@@ -722,6 +849,7 @@ final class XsdReader {
             switch (base(n)) {
                 case "uuid": c.uuid = text(in, i, n); break;
                 case "comment": c.comment = text(in, i, n); break;
+                case "namespace": c.namespace = text(in, i, n); break;
                 case "derivability": c.derivability = text(in, i, n); break;
                 case "extensible": c.extensible = bool(in, n, v); break;
                 case "abstract": c.abstractClass = bool(in, n, v); break;
@@ -786,25 +914,40 @@ final class XsdReader {
     void apply(Staging st) {
         Replica r = st.replica();
         Map<String, DeclaredType> byName = new LinkedHashMap<>();
+        String apart = ": a replica names its classes without namespace (its documents name an instance's class by"
+                + " name alone), so two classes of one name cannot be kept apart";
         for (DeclaredType t : types) {
             DeclaredType first = byName.putIfAbsent(t.name, t);
             if (first != null) {
                 throw at(t, t.line, t.column, "class '" + t.name + "' is defined twice (first in " + first.source
-                        + " at line " + first.line + ")", null);
+                        + " at line " + first.line + (first.ns.equals(t.ns) ? ")" : ", in " + show(first.ns)
+                        + "; here in " + show(t.ns) + ")" + apart), null);
             }
-            if (r.models.byName.containsKey(t.name)) {
-                throw at(t, t.line, t.column, "replica '" + r.name + "' already has a class '" + t.name + "'", null);
+            Model m = r.models.byName.get(t.name);
+            if (m != null) {
+                String ns = key(m.classDef.namespace);
+                throw at(t, t.line, t.column, "replica '" + r.name + "' already has a class '" + t.name + "'"
+                        + (ns.equals(t.ns) || t.ours ? "" : " (in " + show(ns) + "; this one is in " + show(t.ns) + ")"
+                        + apart), null);
             }
         }
+        Set<String> spaces = new HashSet<>(defined);
+        for (Model m : r.models.items) {
+            spaces.add(key(m.classDef.namespace));
+        }
         for (DeclaredType t : types) {
-            if (t.base != null && !byName.containsKey(t.base) && !r.models.byName.containsKey(t.base)) {
-                throw at(t, t.baseLine, t.baseColumn, "the base type '" + t.base + "' of class '" + t.name
-                        + "' is not defined (neither in the schema nor in replica '" + r.name + "')", null);
+            if (t.base != null) {
+                String bad = unresolved(r, byName, spaces, t, t.baseNs, t.base);
+                if (bad != null) {
+                    throw at(t, t.baseLine, t.baseColumn, "the base type '" + t.base + "' of class '" + t.name + "' "
+                            + bad, null);
+                }
             }
             for (DeclaredElement e : t.elems) {
-                if (e.classRef != null && !byName.containsKey(e.classRef) && !r.models.byName.containsKey(e.classRef)) {
+                String bad = e.classRef == null ? null : unresolved(r, byName, spaces, t, e.classRefNs, e.classRef);
+                if (bad != null) {
                     throw at(t, e.line, e.column, "the type '" + e.classRef + "' of element '" + e.name + "' in class '"
-                            + t.name + "' is not defined (neither in the schema nor in replica '" + r.name + "')", null);
+                            + t.name + "' " + bad, null);
                 }
             }
         }
@@ -861,6 +1004,51 @@ final class XsdReader {
         }
     }
 
+    /**
+     * Why a reference from class {@code from} to class {@code name} in namespace {@code ns} finds no
+     * class, or null when it does: the namespace must be one that classes are declared in, and the
+     * class one of the schemas read in that namespace, or a class of the
+     * replica in it (by name alone from the replica's own schemas, whose references are all to its
+     * own namespace).
+     */
+    private static String unresolved(Replica r, Map<String, DeclaredType> byName, Set<String> known,
+            DeclaredType from, String ns, String name) {
+        if (!known.contains(ns)) {
+            List<String> names = new ArrayList<>();
+            for (String k : known) {
+                names.add(k.isEmpty() ? "none" : "'" + k + "'");
+            }
+            names.sort(null);
+            return "is in " + show(ns) + ", which neither the schemas read nor replica '" + r.name + "' declare"
+                    + " classes in (namespaces with classes: " + (names.isEmpty() ? "none" : String.join(", ", names))
+                    + "); import the schema of that namespace, or refer to the class through its own namespace";
+        }
+        DeclaredType d = byName.get(name);
+        if (d != null) {
+            return d.ns.equals(ns) ? null : "is in " + show(ns) + ", but the schema declares '" + name + "' in "
+                    + show(d.ns);
+        }
+        Model m = r.models.byName.get(name);
+        if (m != null) {
+            String has = key(m.classDef.namespace);
+            return from.ours || has.equals(ns) ? null : "is in " + show(ns) + ", but the class '" + name
+                    + "' of replica '" + r.name + "' is in " + show(has);
+        }
+        return "is not defined (neither in the schema nor in replica '" + r.name + "')";
+    }
+
+    /** A comment from an xs:documentation, refused when the appinfo gives another one. */
+    private static String comment(DeclaredType t, Doc doc, String fromAppinfo, String owner) {
+        if (doc == null) {
+            return fromAppinfo == null ? "" : fromAppinfo;
+        }
+        if (fromAppinfo != null && !fromAppinfo.equals(doc.text)) {
+            throw at(t, doc.line, doc.column, "the xs:documentation of " + owner + " differs from the comment its"
+                    + " xs:appinfo gives: the comment is one text", null);
+        }
+        return doc.text;
+    }
+
     private static ClassDef build(DeclaredType t) {
         ClassDef c;
         try {
@@ -870,9 +1058,10 @@ final class XsdReader {
         }
         c.superName = t.base == null ? "" : t.base;
         ClassDef p = t.props;
+        c.comment = comment(t, t.doc, p == null ? null : p.comment, "class '" + t.name + "'");
+        c.namespace = p != null && p.namespace != null ? p.namespace : t.keptNs;
         if (p != null) {
             c.uuid = p.uuid;
-            c.comment = p.comment;
             c.derivability = p.derivability;
             c.extensible = p.extensible;
             c.abstractClass = p.abstractClass;
@@ -892,6 +1081,7 @@ final class XsdReader {
             }
             a.multi = e.multi;
             AttributeDef q = e.props;
+            a.comment = comment(t, e.doc, q == null ? null : q.comment, "attribute '" + t.name + "." + e.name + "'");
             if (q != null) {
                 a.mandatory = q.mandatory;
                 a.unique = q.unique;
@@ -900,7 +1090,6 @@ final class XsdReader {
                 a.visibility = q.visibility;
                 a.aggregation = q.aggregation;
                 a.uuid = q.uuid;
-                a.comment = q.comment;
                 a.targetNames = q.targetNames;
                 a.targetRefs = q.targetRefs;
             } else {

@@ -198,6 +198,9 @@ final class XsdWriter {
         if (c.classType != ClassType.Class) {
             out.attr("classType", c.classType.name());
         }
+        if (!c.namespace.isEmpty()) {
+            out.textAttr("namespace", c.namespace);
+        }
         for (String s : c.scopeNames) {
             out.empty("c", "scope", NS);
             out.textAttr("name", s);

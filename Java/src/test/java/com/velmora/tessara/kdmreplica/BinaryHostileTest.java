@@ -233,7 +233,8 @@ class BinaryHostileTest {
             row(sealed(1, o -> cls(o, "A", "", INT, INT).b[o.n - 8] = '0'), false, "class 'A' has two attributes named 'a0'"),
             Arguments.of("type code", sealed(1, o -> cls(o, "A", "", INT).b[at] = 9), false, at,
                     new String[] {"unknown type code 9 of attribute 'a0'"}),
-            row(sealed(1, o -> cls(o, "A", "").b[at - 5] = 0x40), false, "invalid flags 0x40 of class 'A'"),
+            row(sealed(1, o -> cls(o, "A", "").b[at - 5] = (byte) 0x80), false, "invalid flags 0x80 of class 'A'"),
+            row(sealed(1, o -> cls(o, "A", "").b[at - 5] = 0x40), false, "the namespace of class 'A' is empty"),
             // instances and values
             row(sealed(1, o -> {
                 w(cls(o, "A", ""), 2, 1 << 4).str("same");

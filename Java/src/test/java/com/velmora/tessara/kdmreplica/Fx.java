@@ -126,7 +126,7 @@ final class Fx {
             ClassDef c = m.getClassDef();
             fields(b, "class", c.getClassName(), c.getSuperName(), c.getUuid(), c.getQKAComment(),
                     c.getQKADerivability(), c.getScopeNames(), c.isExtensible(), c.isAbstract(), c.isPersistent(),
-                    c.getSoftwareVisibility(), c.getClassType());
+                    c.getSoftwareVisibility(), c.getClassType(), c.getSchemaNamespace());
             for (int k = 0; k < c.getAttributes().getCount(); k++) {
                 AttributeDef a = c.getAttributes().getItem(k);
                 fields(b, " attr", a.getAttributeName(), a.getAttributeType(), a.isMultiValuated(), a.getLength(),
@@ -220,6 +220,7 @@ final class Fx {
         c.setPersistency(false);
         c.setSoftwareVisibility(Visibility.Protected);
         c.setClassType(ClassType.Extension);
+        c.setSchemaNamespace("urn:part\u0002 \ud800");
         bolt.getClassDef().setSoftwareVisibility(Visibility.Private);
         AttributeDef n = addAttr(part, "name", AttributeType.String, false);
         n.setMandatory(true);
