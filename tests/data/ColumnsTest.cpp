@@ -212,6 +212,14 @@ TEST(Columns, EveryTypeCrossesBothWays)
   EXPECT_EQ(13, rows);
   EXPECT_EQ(VLX_S_OK, all.GetInteger(0, 3, second));
   EXPECT_EQ(kRows[1].integer, second);
+  // An empty batch creates nothing and reads nothing.
+  VLXKDMColumns empty;
+  VLXListValVLXKDMInstance nothing;
+  ASSERT_EQ(VLX_S_OK, WriteBatch(empty, 0).CreateInstances(s.model, nothing)) << PeekLastError().text;
+  EXPECT_EQ(0, nothing.Size());
+  EXPECT_EQ(VLX_S_OK, empty.GetValues(nothing));
+  EXPECT_EQ(VLX_S_OK, empty.GetRowCount(rows));
+  EXPECT_EQ(0, rows);
   // Milliseconds cross as they are, before 1970 too; as a time they round to the nearest second.
   VLXKDMColumns dates;
   WriteBatch(dates, 1);
