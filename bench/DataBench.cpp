@@ -6,6 +6,7 @@
 
 #include <benchmark/benchmark.h>
 
+#include "AllocationCounter.h"
 #include "BenchJava.h"
 #include "VLXKDMColumns.h"
 #include "VLXKDMInstance.h"
@@ -28,6 +29,7 @@ struct Data {
   jmethodID bulkFill = nullptr, bulkRead = nullptr;
   jclass systemClass = nullptr;
   jmethodID systemGc = nullptr;
+  AllocationCounts staging;  // heap allocations of staging a batch again in the same buffers
 };
 Data gData;
 
@@ -138,19 +140,18 @@ bool MakeBulkReplica(BulkReplica& b)
                   b.model);
 }
 
-// The values of BulkBaseline.fill, staged in the batch (its buffers reused) and created at once.
-bool ColumnsFill(VLXKDMColumns& batch, BulkReplica& r, int count)
+// The values of BulkBaseline.fill, staged in the batch (its buffers reused); false when a setter failed.
+bool StageBulk(VLXKDMColumns& batch, BulkReplica& r, int count)
 {
   using T = VLXKDMAttributeType;
   static const VLXUnicodeString names[] = {"code", "price", "label", "created", "active", "payload", "owner", "counts"};
-  static const T::Type types[] = {T::Integer, T::Boolean, T::String,       T::Date,
-                                  T::Boolean, T::Binary,  T::Relationship, T::Integer};
+  static const T::Type types[] = {T::Integer, T::Double, T::String,       T::Date,
+                                  T::Boolean, T::Binary, T::Relationship, T::Integer};
   long column = 0, failed = batch.Reset(count);
-  for (int k = 0; k < 8; ++k) failed |= batch.AddColumn(names[k], k == 1 ? T::Double : types[k], k == 7, column);
+  for (int k = 0; k < 8; ++k) failed |= batch.AddColumn(names[k], types[k], k == 7, column);
   char label[32];
   unsigned char payload[8];
   VLXRawCollint counts(3);
-  VLXKDMInstanceSet set;
   for (int i = 0; i < count; ++i) {
     const int length = std::snprintf(label, sizeof label, "item-%d", i);
     for (int b = 0; b < 8; ++b) payload[b] = static_cast<unsigned char>(static_cast<unsigned>(i) >> (b * 4));
@@ -160,8 +161,15 @@ bool ColumnsFill(VLXKDMColumns& batch, BulkReplica& r, int count)
               batch.SetMilliseconds(3, i, kBaseMillis + i * 1000LL) | batch.SetBoolean(4, i, i & 1) |
               batch.SetBinary(5, i, payload, 8) | batch.SetInstance(6, i, r.owner) | batch.SetIntegers(7, i, counts);
   }
+  return failed >= 0;
+}
+
+// The same values staged and created at once.
+bool ColumnsFill(VLXKDMColumns& batch, BulkReplica& r, int count)
+{
+  VLXKDMInstanceSet set;
   int made = 0;
-  return failed >= 0 && batch.CreateInstances(r.model) >= 0 && r.model.GetInstances(set) >= 0 &&
+  return StageBulk(batch, r, count) && batch.CreateInstances(r.model) >= 0 && r.model.GetInstances(set) >= 0 &&
          set.GetCount(made) >= 0 && made == count;
 }
 
@@ -262,6 +270,15 @@ bool RegisterDataBenchmarks(JNIEnv* env, const DataOptions& options, std::string
       if (MakeBulkReplica(r)) library ? ColumnsFill(batch, r, count) : JavaBulkFill(r, count);
     }
   }
+  {
+    BulkReplica r;
+    VLXKDMColumns batch;
+    const bool staged = MakeBulkReplica(r) && StageBulk(batch, r, options.bulkInstances);
+    StartCountingAllocations();
+    const bool again = StageBulk(batch, r, options.bulkInstances);
+    d.staging = StopCountingAllocations();
+    if (!staged || !again) return Fail(why, "staging a bulk batch failed");
+  }
   for (bool library : {true, false}) {
     const std::string side = library ? "/library" : "/pureJava";
     benchmark::RegisterBenchmark(("BulkFill" + side).c_str(), RunBulkFill, library)
@@ -293,6 +310,9 @@ void PrintDataSummary(const SummaryReporter& reporter)
       std::printf("bulk %s %d instances x 8 attributes: batch of columns %s, pure Java %s; target at most 2x: %sx\n",
                   what, o.bulkInstances, Figure(lib).c_str(), Figure(java).c_str(), Ratio(lib, java).c_str());
   }
+  std::printf("  staging %d rows x 8 values again in the same batch: %llu operator new, %llu malloc\n", o.bulkInstances,
+              static_cast<unsigned long long>(gData.staging.news),
+              static_cast<unsigned long long>(gData.staging.mallocs));
   const double found = reporter.Nanoseconds("Lookup/library").real,
                javaFound = reporter.Nanoseconds("Lookup/pureJava").real / kLookupsPerJavaCall;
   if (found > 0 && javaFound > 0)
