@@ -183,12 +183,25 @@ long ReadOwnXml(World& w, Outs& o)
   EXPECT_EQ(VLX_S_OK, w.r.GetXml(1, xml));
   return VLXKDMReplica::ReadFromXmlString(xml, o.r);
 }
-long FromBinary(World& w, Outs& o)
+long FromBinary(World& w, Outs& o, bool detected = false)
 {
   VLXBinary bytes;
   EXPECT_EQ(VLX_S_OK, VLXKDMReplica::GetBinaryFromReplica(w.r, 1, bytes));
-  return VLXKDMReplica::GetReplicaFromBinary(bytes, 1, o.r);
+  return detected ? VLXKDMReplica::GetReplicaFromBinary(bytes, o.r)
+                  : VLXKDMReplica::GetReplicaFromBinary(bytes, 1, o.r);
 }
+// A file of the operations' own, in the test's temporary directory.
+std::string OwnFile(const char* name)
+{
+  return ::testing::TempDir() + "corvexa-operations-" + std::to_string(getpid()) + name;
+}
+// A binary file of the world's replica, read back.
+long FromBinaryFile(World& w, Outs& o)
+{
+  EXPECT_EQ(VLX_S_OK, w.r.WriteBinaryFile(U(OwnFile(".bin")), 0));
+  return VLXKDMReplica::ReadBinaryFile(U(OwnFile(".bin")), o.r);
+}
+VLXBoolean Continue(long long, long long, void*) { return 1; }
 // The instances whose integer is 42 (o.n: how many).
 long Select(World& w, Outs& o)
 {
@@ -327,6 +340,17 @@ const Operation kOperations[] = {
          VLXKDMReplica::GetBinaryFromReplica(w.r, 0, o.b)),
     FREE(REP "GetReplicaFromBinary(const VLXBinary&, VLXBoolean, VLXKDMReplica&)", "text=world replica",
          THEN(FromBinary(w, o), o.r.GetName(o.s))),
+    FREE(REP "GetReplicaFromBinary(const VLXBinary&, VLXKDMReplica&)", "text=world replica",
+         THEN(FromBinary(w, o, true), o.r.GetName(o.s))),
+    OP(REP "WriteXmlFile(const VLXUnicodeString&, VLXBoolean, VLXBoolean)", "",
+       w.r.WriteXmlFile(U(OwnFile(".xml")), 1, 1)),
+    OP(REP "WriteXsdFile(const VLXUnicodeString&)", "", w.r.WriteXsdFile(U(OwnFile(".xsd")))),
+    OP(REP "WriteBinaryFile(const VLXUnicodeString&, VLXBoolean)", "", w.r.WriteBinaryFile(U(OwnFile(".bin")), 1)),
+    FREE(REP "ReadBinaryFile(const VLXUnicodeString&, VLXKDMReplica&)", "text=world replica",
+         THEN(FromBinaryFile(w, o), o.r.GetName(o.s))),
+    FREE(REP "SetProgressHandler(VLXKDMProgressHandler, void*)", "",
+         THEN(VLXKDMReplica::SetProgressHandler(&Continue, nullptr),
+              VLXKDMReplica::SetProgressHandler(nullptr, nullptr))),
     FREE(REP "BuildFromJavaType(JNIEnv*, jobject)", "text=world replica", THEN(FromJava(w, o), o.r.GetName(o.s))),
     FREE(REP "ConvertToJavaType(JNIEnv*, jobject&)", "number=1", ToJava(w, o, false)),
     FREE(REP "BuildFromJavaHolder(JNIEnv*, jobject)", "text=world replica", THEN(FromHolder(w, o), o.r.GetName(o.s))),
@@ -581,7 +605,8 @@ TEST(Operations, EachLandsOnBuiltProxiesAndFailsOnUnbuiltOnesNamingItselfAndWrit
       EXPECT_EQ("", changes);
     }
   }
-  std::remove(DocumentFile().c_str());
+  for (const std::string& file : {DocumentFile(), OwnFile(".xml"), OwnFile(".xsd"), OwnFile(".bin")})
+    std::remove(file.c_str());
 }
 
 // Each row, on built and on unbuilt proxies, succeeding or failing (a call repeated on the same

@@ -84,6 +84,10 @@ class VLXJBXJNIHelper {
   static void DeleteLocalRef(JNIEnv* env, jobject obj) { env->DeleteLocalRef(obj); }
   static bool ExceptionCheck(JNIEnv* env) { return env->ExceptionCheck() == JNI_TRUE; }
   static void ExceptionClear(JNIEnv* env) { env->ExceptionClear(); }
+  static jint RegisterNatives(JNIEnv* env, jclass cls, const JNINativeMethod* methods, jint count)
+  {
+    return env->RegisterNatives(cls, methods, count);
+  }
 
   // A new global reference to `obj` (null for a null `obj`), counted by
   // VLXJBXJNIUtilities::GetGlobalRefCount.

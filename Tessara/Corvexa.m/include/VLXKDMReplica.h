@@ -12,6 +12,12 @@
 #include "VLXKDMModelSet.h"
 #include "VLXUnicodeString.h"
 
+// A progress handler: hears the work done and the total (bytes or characters read, instances or
+// classes written) of the calling thread's long operations, at most about ten times a second and
+// once at the end with the total; answers 0 to stop the operation. It runs on the operation's
+// thread, inside the operation: it must not throw, and must not change the replica.
+typedef VLXBoolean (*VLXKDMProgressHandler)(long long done, long long total, void* context);
+
 class CORVEXA_API VLXKDMReplica : public VLXKDMJavaObject {
   VLXKDM_PROXY_SPECIAL_MEMBERS(VLXKDMReplica)
 
@@ -97,6 +103,27 @@ class CORVEXA_API VLXKDMReplica : public VLXKDMJavaObject {
   // one the bytes were written with.
   static long GetBinaryFromReplica(const VLXKDMReplica& replica, VLXBoolean compressed, VLXBinary& bytes);
   static long GetReplicaFromBinary(const VLXBinary& bytes, VLXBoolean compressed, VLXKDMReplica& replica);
+  // As above, compressed or not as the bytes' header says.
+  static long GetReplicaFromBinary(const VLXBinary& bytes, VLXKDMReplica& replica);
+
+  // ---- Files, streamed: a write goes to a temporary file in the same directory, which replaces
+  // path only once it is complete, so a failed or stopped write leaves path as it was; the
+  // document is never whole in memory. A relative path is taken from the process's current
+  // directory (also after a chdir).
+
+  // The replica as an XML file (as GetXml), an XSD file (as GetXsd), a binary file (as
+  // GetBinaryFromReplica).
+  long WriteXmlFile(const VLXUnicodeString& path, VLXBoolean withSchema, VLXBoolean withState);
+  long WriteXsdFile(const VLXUnicodeString& path);
+  long WriteBinaryFile(const VLXUnicodeString& path, VLXBoolean compressed);
+  // Attaches replica to a new replica read from a binary file, compressed or not as its header says.
+  static long ReadBinaryFile(const VLXUnicodeString& path, VLXKDMReplica& replica);
+
+  // ---- Progress. Sets the calling thread's progress handler for the operations that read or
+  // write documents and files, and populate (null removes it); context is given back to it. A
+  // stopped operation fails with a last error saying so: a read or populate leaves the replica as
+  // it was, a write leaves no file. Needs no proxy.
+  static long SetProgressHandler(VLXKDMProgressHandler handler, void* context);
 
   // ---- Exchange with Java code that calls into native code with its own environment.
 

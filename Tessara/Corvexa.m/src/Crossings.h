@@ -81,6 +81,10 @@ class FrameAccess {
   }
 };
 
+// The native method the Java side calls with progress reports (Progress.callNative), registered
+// once the binding table is bound; a failure leaves an exception pending.
+long RegisterProgressNative(JNIEnv* env, const ReplicaStubs& table);
+
 // ---- How a native argument reaches Java ------------------------------------------------------
 // J: the JNI type passed; To: the conversion; kOwnsRef: To makes a local reference that the frame
 // releases; kEarly: converted before the other arguments (enumeration constants).

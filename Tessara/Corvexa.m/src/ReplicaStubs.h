@@ -25,7 +25,7 @@ enum Slot : int {
 #undef RESERVED
   SlotCount
 };
-static_assert(SlotCount == 204, "the binding table has 204 slots");
+static_assert(SlotCount == 211, "the binding table has 211 slots");
 
 enum class BindingKind { Class, Method, Static, SetterFirst, Constant, Reserved };
 

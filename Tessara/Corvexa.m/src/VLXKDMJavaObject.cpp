@@ -108,6 +108,8 @@ long VLXKDMJavaObject::StartJavaSide(JNIEnv* env)
   ReplicaStubs* table = new ReplicaStubs;
   _st.store(table, std::memory_order_release);
   if (table->init(env) < 0) fprintf(stderr, "Error ReplicaStubs::Init\n");
+  // Without it a progress report fails its operation with Java's UnsatisfiedLinkError, which says why.
+  if (table->IsBound() && corvexa::RegisterProgressNative(env, *table) < 0) VLXJBXJNIHelper::ExceptionClear(env);
 
   // Check the environment with one string conversion.
   const VLXUnicodeString text("String or initialization");

@@ -1,5 +1,7 @@
 #include "VLXKDMReplica.h"
 
+#include <cstdint>
+
 #include "CallFrame.h"
 #include "ProxyMembers.h"
 #include "VLXJBXJNIUtilities.h"
@@ -203,6 +205,83 @@ long VLXKDMReplica::GetReplicaFromBinary(const VLXBinary& bytes, VLXBoolean comp
                     slot<Replica_getReplicaFromBinary>)
       .with(bytes, compressed)
       .returning(replica);
+}
+
+long VLXKDMReplica::GetReplicaFromBinary(const VLXBinary& bytes, VLXKDMReplica& replica)
+{
+  return CallStatic("VLXKDMReplica::GetReplicaFromBinary(const VLXBinary&, VLXKDMReplica&)", Replica,
+                    slot<Replica_getReplicaFromBinaryDetected>)
+      .with(bytes)
+      .returning(replica);
+}
+
+// ---- Files ---------------------------------------------------------------------------------------
+
+long VLXKDMReplica::WriteXmlFile(const VLXUnicodeString& path, VLXBoolean withSchema, VLXBoolean withState)
+{
+  return Call(*this, "VLXKDMReplica::WriteXmlFile(const VLXUnicodeString&, VLXBoolean, VLXBoolean)",
+              slot<Replica_writeXmlFile>)
+      .with(path, withSchema, withState)
+      .run();
+}
+
+long VLXKDMReplica::WriteXsdFile(const VLXUnicodeString& path)
+{
+  return Call(*this, "VLXKDMReplica::WriteXsdFile(const VLXUnicodeString&)", slot<Replica_writeXsdFile>)
+      .with(path)
+      .run();
+}
+
+long VLXKDMReplica::WriteBinaryFile(const VLXUnicodeString& path, VLXBoolean compressed)
+{
+  return Call(*this, "VLXKDMReplica::WriteBinaryFile(const VLXUnicodeString&, VLXBoolean)",
+              slot<Replica_writeBinaryFile>)
+      .with(path, compressed)
+      .run();
+}
+
+long VLXKDMReplica::ReadBinaryFile(const VLXUnicodeString& path, VLXKDMReplica& replica)
+{
+  return CallStatic("VLXKDMReplica::ReadBinaryFile(const VLXUnicodeString&, VLXKDMReplica&)", Replica,
+                    slot<Replica_readBinaryFile>)
+      .with(path)
+      .returning(replica);
+}
+
+// ---- Progress ------------------------------------------------------------------------------------
+// The handler and its context cross to Java as two numbers, kept per thread on the Java side, which
+// gives them back to the native method below with each report.
+
+long VLXKDMReplica::SetProgressHandler(VLXKDMProgressHandler handler, void* context)
+{
+  const long long function = static_cast<long long>(reinterpret_cast<std::intptr_t>(handler));
+  const long long data = handler ? static_cast<long long>(reinterpret_cast<std::intptr_t>(context)) : 0;
+  return CallStatic("VLXKDMReplica::SetProgressHandler(VLXKDMProgressHandler, void*)", Progress,
+                    slot<Progress_setNative>)
+      .with(function, data)
+      .run();
+}
+
+namespace {
+
+// Progress.callNative: one report to a handler (one that throws stops the operation).
+jboolean JNICALL CallProgressHandler(JNIEnv*, jclass, jlong function, jlong context, jlong done, jlong total)
+{
+  const auto handler = reinterpret_cast<VLXKDMProgressHandler>(static_cast<std::intptr_t>(function));
+  try {
+    return handler(done, total, reinterpret_cast<void*>(static_cast<std::intptr_t>(context))) ? JNI_TRUE : JNI_FALSE;
+  } catch (...) {
+    return JNI_FALSE;
+  }
+}
+
+}  // namespace
+
+long corvexa::RegisterProgressNative(JNIEnv* env, const ReplicaStubs& table)
+{
+  static const JNINativeMethod method = {const_cast<char*>("callNative"), const_cast<char*>("(JJJJ)Z"),
+                                         reinterpret_cast<void*>(&CallProgressHandler)};
+  return VLXJBXJNIHelper::RegisterNatives(env, table.Class(Progress), &method, 1) == JNI_OK ? VLX_S_OK : VLX_E_FAIL;
 }
 
 // ---- Exchange with Java ------------------------------------------------------------------------

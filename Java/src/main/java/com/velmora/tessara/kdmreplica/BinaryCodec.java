@@ -1,5 +1,11 @@
 package com.velmora.tessara.kdmreplica;
 
+import java.io.IOException;
+import java.io.OutputStream;
+import java.io.UncheckedIOException;
+import java.nio.ByteBuffer;
+import java.nio.file.Files;
+import java.nio.file.Path;
 import java.util.Arrays;
 import java.util.concurrent.locks.Lock;
 import java.util.zip.CRC32;
@@ -142,13 +148,110 @@ final class BinaryCodec {
                         + ", beyond the ratio a reader accepts");
             }
         }
+        header(out, compressed, length, stored, (int) crc.getValue());
+        return out;
+    }
+
+    /** Writes the header into the first {@link #HEADER_SIZE} bytes of out. */
+    private static void header(byte[] out, boolean compressed, int length, int stored, int crc) {
         System.arraycopy(MAGIC, 0, out, 0, 4);
         out[4] = (byte) VERSION;
         out[5] = (byte) (compressed ? FLAG_COMPRESSED : 0);
         putInt(out, 8, length);
         putInt(out, 12, stored);
-        putInt(out, 16, (int) crc.getValue());
-        return out;
+        putInt(out, 16, crc);
+    }
+
+    /** {@code Replica.writeBinaryFile}: the payload streamed into the file as it is encoded, the header last. */
+    static void writeFile(Replica r, Path target, boolean compressed) {
+        Lock l = r.rw.readLock();
+        l.lock();
+        try {
+            OutputFiles.write(target, "binary file", (channel, stream) -> {
+                stream.write(new byte[HEADER_SIZE]);
+                FileFrame frame = new FileFrame(stream, compressed);
+                try {
+                    new BinaryWriter(r, frame).encode();
+                    byte[] header = frame.finish();
+                    stream.flush();
+                    channel.write(ByteBuffer.wrap(header), 0);
+                } finally {
+                    frame.end();
+                }
+            });
+        } finally {
+            l.unlock();
+        }
+    }
+
+    /** The frame of a payload streamed into a file: checksum, length and (deflated) bytes as they come. */
+    private static final class FileFrame implements ByteOut.Sink {
+        private final OutputStream os;
+        private final Deflater deflater;
+        private final byte[] buffer;
+        private final CRC32 crc = new CRC32();
+        private long length;
+        private long stored;
+
+        FileFrame(OutputStream os, boolean compressed) {
+            this.os = os;
+            this.deflater = compressed ? new Deflater(Deflater.DEFAULT_COMPRESSION) : null;
+            this.buffer = compressed ? new byte[1 << 16] : null;
+        }
+
+        @Override
+        public void accept(byte[] b, int off, int len) {
+            length += len;
+            if (deflater == null ? length > ByteOut.MAX_ARRAY - HEADER_SIZE : length > MAX_INFLATED) {
+                throw new IllegalArgumentException("binary replica: a payload of more than " + (length - len)
+                        + " bytes is more than a " + (deflater == null ? "binary replica read back in one array"
+                                : "compressed binary replica") + " may hold" + (deflater == null ? ""
+                                        : "; write it uncompressed"));
+            }
+            crc.update(b, off, len);
+            try {
+                if (deflater == null) {
+                    os.write(b, off, len);
+                    stored += len;
+                } else {
+                    deflater.setInput(b, off, len);
+                    while (!deflater.needsInput()) {
+                        drain();
+                    }
+                }
+            } catch (IOException e) {
+                throw new UncheckedIOException(e);
+            }
+        }
+
+        private void drain() throws IOException {
+            int k = deflater.deflate(buffer);
+            os.write(buffer, 0, k);
+            stored += k;
+        }
+
+        /** The header, once every payload byte went through. */
+        byte[] finish() throws IOException {
+            if (deflater != null) {
+                deflater.finish();
+                while (!deflater.finished()) {
+                    drain();
+                }
+                if (length > stored * MAX_INFLATE_RATIO + 64) {
+                    throw new IllegalStateException("binary replica: deflate compressed " + length + " bytes to "
+                            + stored + ", beyond the ratio a reader accepts");
+                }
+            }
+            byte[] h = new byte[HEADER_SIZE];
+            header(h, deflater != null, (int) length, (int) stored, (int) crc.getValue());
+            return h;
+        }
+
+        void end() {
+            if (deflater != null) {
+                deflater.end();
+            }
+        }
     }
 
     private static void putInt(byte[] b, int at, int v) {
@@ -164,9 +267,32 @@ final class BinaryCodec {
 
     // ================================================================ reading
 
-    /** A replica from its binary form, built through {@code Staging} into a new replica. */
-    static Replica read(byte[] bytes, boolean compressed) {
+    /**
+     * A replica from its binary form, built through {@code Staging} into a new replica;
+     * {@code compressed} null takes the header's flag.
+     */
+    static Replica read(byte[] bytes, Boolean compressed) {
         return new BinaryReader(unframe(bytes, compressed)).decode();
+    }
+
+    /** {@code Replica.readBinaryFile}: the file's bytes (read once, whole), compressed as the header says. */
+    static Replica readFile(Path file) {
+        String name = "binary file '" + file + "'";
+        byte[] bytes;
+        try {
+            if (!Files.isRegularFile(file) && Files.exists(file)) {
+                throw new IllegalArgumentException("cannot read " + name + ": it is not a regular file");
+            }
+            long size = Files.size(file);
+            if (size > ByteOut.MAX_ARRAY) {
+                throw new IllegalArgumentException("cannot read " + name + ": " + size
+                        + " bytes are more than a binary replica holds");
+            }
+            bytes = Files.readAllBytes(file);
+        } catch (IOException e) {
+            throw new IllegalArgumentException("cannot read " + name + ": " + XmlInput.describe(e), e);
+        }
+        return read(bytes, null);
     }
 
     private static ReplicaBinaryException header(String what, int offset) {
@@ -174,7 +300,7 @@ final class BinaryCodec {
     }
 
     /** Checks the header and returns a reader over the payload (inflated when compressed). */
-    static ByteIn unframe(byte[] bytes, boolean compressed) {
+    static ByteIn unframe(byte[] bytes, Boolean wanted) {
         if (bytes.length < HEADER_SIZE) {
             throw header("truncated: " + bytes.length + " bytes, fewer than the " + HEADER_SIZE
                     + " bytes of a header", bytes.length);
@@ -193,6 +319,7 @@ final class BinaryCodec {
             throw header("unknown flags 0x" + Integer.toHexString(flags), 5);
         }
         boolean written = (flags & FLAG_COMPRESSED) != 0;
+        boolean compressed = wanted == null ? written : wanted;
         if (written != compressed) {
             throw header("the bytes were written " + (written ? "compressed" : "uncompressed") + " but were read as "
                     + (compressed ? "compressed" : "uncompressed"), 5);

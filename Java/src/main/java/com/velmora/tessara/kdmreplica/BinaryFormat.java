@@ -499,12 +499,15 @@ final class BinaryFormat {
         out.ensure(bitmap);
         int at = out.n;
         Arrays.fill(out.b, at, at + bitmap, (byte) 0);
-        out.n += bitmap;
         for (int p = 0; p < len; p++) {
-            Object value = v[p];
-            if (value != null) {
+            if (v[p] != null) {
                 out.b[at + (p >>> 3)] |= (byte) (1 << (p & 7));
-                VALUES[kinds[p]].put.put(out, value, index);
+            }
+        }
+        out.n += bitmap; // complete before the values: writing them may hand the buffer to a sink
+        for (int p = 0; p < len; p++) {
+            if (v[p] != null) {
+                VALUES[kinds[p]].put.put(out, v[p], index);
             }
         }
     }

@@ -104,15 +104,18 @@ final class BinaryReader {
                 all.add(x);
             }
             table = all.toArray(new Instance[0]);
+            Progress.Tracker progress = Progress.start(table.length);
             int nm = 0;
             for (int i = 0; i < nc; i++) {
                 int count = models[i].instances.count + (models[i].deleted == null ? 0 : models[i].deleted.size());
                 for (int j = 0; j < count; j++) {
                     BinaryFormat.readValues(in, table[nm++], kinds[i], table);
+                    progress.at(nm);
                 }
             }
             for (int j = 0; j < no; j++) {
                 BinaryFormat.readValues(in, outside.get(j), kinds[outsideClass[j]], table);
+                progress.at(nm + j + 1L);
             }
             if (in.remaining() != 0) {
                 throw in.fail(in.remaining() + " bytes follow the last instance's values");
@@ -120,6 +123,7 @@ final class BinaryReader {
             for (Instance x : outside) {
                 x.forget();
             }
+            progress.end();
             st.finish();
         }
         return r;

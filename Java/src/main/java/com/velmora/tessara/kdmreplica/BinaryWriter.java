@@ -15,7 +15,7 @@ import java.util.function.ToIntFunction;
 final class BinaryWriter {
     private final Replica r;
     private final List<Model> models;
-    private final ByteOut out = new ByteOut(1 << 16);
+    private final ByteOut out;
     private final ToIntFunction<Instance> index = this::indexOf;
     private final IdentityHashMap<Model, Integer> modelIndex = new IdentityHashMap<>();
     private final int[] base;
@@ -25,6 +25,12 @@ final class BinaryWriter {
     private int tableSize;
 
     BinaryWriter(Replica r) {
+        this(r, null);
+    }
+
+    /** A writer whose payload goes to the sink as it fills its buffer. */
+    BinaryWriter(Replica r, ByteOut.Sink sink) {
+        this.out = new ByteOut(1 << 16, sink);
         this.r = r;
         this.models = r.models.items;
         this.base = new int[models.size()];
@@ -73,22 +79,29 @@ final class BinaryWriter {
             out.uvar(modelIndex.get(x.model));
             BinaryFormat.writeHead(out, x);
         }
+        Progress.Tracker progress = Progress.start((long) tableSize + outside.size());
+        long done = 0;
         for (Model m : models) {
             int[] kinds = BinaryFormat.kinds(m.alignedTo);
             InstanceSet s = m.instances;
             for (int j = 0; j < s.count; j++) {
                 BinaryFormat.writeValues(out, s.items[j], kinds, index);
+                progress.at(++done);
             }
             if (m.deleted != null) {
                 for (Instance x : m.deleted) {
                     BinaryFormat.writeValues(out, x, kinds, index);
+                    progress.at(++done);
                 }
             }
         }
         for (Instance x : outside) {
             BinaryFormat.writeValues(out, x, BinaryFormat.kinds(x.model.alignedTo), index);
+            progress.at(++done);
         }
         checkReadable();
+        out.flush();
+        progress.end();
         return out;
     }
 
@@ -107,10 +120,10 @@ final class BinaryWriter {
                         + BinaryCodec.MAX_SUPER_DEPTH + " classes");
             }
         }
-        if (slots > BinaryCodec.layoutLimit(out.n)) {
+        if (slots > BinaryCodec.layoutLimit(out.size())) {
             throw new IllegalArgumentException("replica '" + r.name + "' cannot be written in binary form: its"
                     + " class layouts hold " + slots + " attribute slots in all, more than the "
-                    + BinaryCodec.layoutLimit(out.n) + " a payload of " + out.n + " bytes may describe");
+                    + BinaryCodec.layoutLimit(out.size()) + " a payload of " + out.size() + " bytes may describe");
         }
     }
 

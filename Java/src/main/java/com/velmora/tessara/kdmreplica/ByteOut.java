@@ -13,14 +13,45 @@ final class ByteOut {
     /** Largest array the writer makes. */
     static final int MAX_ARRAY = Integer.MAX_VALUE - 16;
 
+    /** Takes the bytes written so far when the buffer is full (a file's writer, say). */
+    interface Sink {
+        void accept(byte[] b, int off, int len);
+    }
+
     byte[] b;
     int n;
+    private final Sink sink;
+    /** Bytes handed to the sink. */
+    private long flushed;
 
     ByteOut(int capacity) {
+        this(capacity, null);
+    }
+
+    /** With a sink, the buffer holds only the bytes written since it last filled. */
+    ByteOut(int capacity, Sink sink) {
         b = new byte[Math.max(16, capacity)];
+        this.sink = sink;
+    }
+
+    /** Bytes written in all. */
+    long size() {
+        return flushed + n;
+    }
+
+    /** Hands the buffered bytes to the sink. Only between two records: a record writes its bytes after one ensure. */
+    void flush() {
+        if (sink != null && n > 0) {
+            sink.accept(b, 0, n);
+            flushed += n;
+            n = 0;
+        }
     }
 
     void ensure(int k) {
+        if (b.length - n < k && sink != null) {
+            flush();
+        }
         if (b.length - n < k) {
             long need = (long) n + k;
             if (need > MAX_ARRAY) {

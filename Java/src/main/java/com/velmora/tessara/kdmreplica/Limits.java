@@ -106,8 +106,17 @@ final class Limits {
         private static final int OTHER = 4;
         private static final String XMLNS = "xmlns";
 
+        /** The input's size announced by {@link #sized} (0 when unknown). */
+        long total;
+
+        /** Units seen so far. */
+        long seen() {
+            return size;
+        }
+
         /** Checks that a whole input of {@code n} units fits before it is read. */
         void sized(long n, String unit) throws Exceeded {
+            total = n;
             if (n > maxSize) {
                 throw new Exceeded(exceeded("a document of " + n + " " + unit, "maxDocumentSize", maxSize));
             }

@@ -638,6 +638,52 @@ public class Replica {
         return BinaryCodec.read(bytes, compressed);
     }
 
+    /**
+     * Writes {@link #getXml(boolean, boolean)}'s document into a file, streamed: the document is
+     * never whole in memory. It goes to a temporary file in the same directory, which replaces
+     * {@code path} only once complete; a failed or stopped write leaves {@code path} as it was.
+     * A relative path is taken from the process's current directory.
+     *
+     * @throws IllegalArgumentException as {@code getXml} does, or naming the file and the cause
+     *         when it cannot be written
+     * @throws Progress.Stopped when the thread's progress listener stopped it
+     */
+    public void writeXmlFile(String path, boolean withSchema, boolean withState) {
+        XmlWriter.writeFile(this, OutputFiles.target(path, "writeXmlFile"), withSchema, withState);
+    }
+
+    /** Writes {@link #getXsd()}'s schema into a file, as {@link #writeXmlFile} writes. */
+    public void writeXsdFile(String path) {
+        XsdWriter.writeFile(this, OutputFiles.target(path, "writeXsdFile"));
+    }
+
+    /**
+     * Writes {@link #getBinaryFromReplica}'s form into a file, as {@link #writeXmlFile} writes:
+     * the payload is encoded (and deflated) into the file as it goes, the header last.
+     */
+    public void writeBinaryFile(String path, boolean compressed) {
+        BinaryCodec.writeFile(this, OutputFiles.target(path, "writeBinaryFile"), compressed);
+    }
+
+    /**
+     * A new replica from a file written by {@link #writeBinaryFile} (or bytes of
+     * {@link #getBinaryFromReplica}), compressed or not as its header says.
+     *
+     * @throws ReplicaBinaryException for bytes that are truncated, corrupted or hostile
+     * @throws IllegalArgumentException naming the file and the cause when it cannot be read
+     */
+    public static Replica readBinaryFile(String path) {
+        return BinaryCodec.readFile(OutputFiles.target(path, "readBinaryFile"));
+    }
+
+    /** As {@link #getReplicaFromBinary} with the compression its header says. */
+    public static Replica getReplicaFromBinary(byte[] bytes) {
+        if (bytes == null) {
+            throw new IllegalArgumentException("Replica.getReplicaFromBinary: bytes is null");
+        }
+        return BinaryCodec.read(bytes, null);
+    }
+
     /** For example {@code Replica 'plant' (3 classes, 120 instances, 2 deleted)}. */
     @Override
     public String toString() {

@@ -79,7 +79,7 @@ final class XmlInput {
                     if (text.startsWith("\uFEFF")) {
                         rd.skip(1); // a byte order mark, as a file may start with
                     }
-                    in = new In(f.createXMLStreamReader(Limits.scanned(rd, scan)), this, null);
+                    in = new In(f.createXMLStreamReader(Limits.scanned(rd, scan)), this, null, scan);
                 } else {
                     // checked before opening: opening a pipe blocks, a device may never end
                     if (!Files.isRegularFile(file) && Files.exists(file)) {
@@ -94,7 +94,8 @@ final class XmlInput {
                     } catch (IOException e) {
                         throw new IllegalArgumentException("cannot read " + name + ": " + describe(e), e);
                     }
-                    in = new In(f.createXMLStreamReader(file.toUri().toString(), Limits.scanned(s, scan)), this, s);
+                    in = new In(f.createXMLStreamReader(file.toUri().toString(), Limits.scanned(s, scan)), this, s,
+                            scan);
                 }
             } catch (Limits.Exceeded e) {
                 closeQuietly(s);
@@ -257,12 +258,15 @@ final class XmlInput {
         private final InputStream stream;
         private final long maxDepth = Limits.get("maxElementDepth");
         private long depth;
+        /** What the input's units pass through: how many were read, of how many. */
+        final Limits.Scan scan;
 
-        In(XMLStreamReader r, Src src, InputStream stream) {
+        In(XMLStreamReader r, Src src, InputStream stream, Limits.Scan scan) {
             this.r = r;
             this.src = src;
             this.source = src.name;
             this.stream = stream;
+            this.scan = scan;
         }
 
         /**

@@ -1,5 +1,6 @@
 package com.velmora.tessara.kdmreplica;
 
+import java.io.OutputStream;
 import java.io.StringWriter;
 import javax.xml.stream.XMLOutputFactory;
 import javax.xml.stream.XMLStreamException;
@@ -15,11 +16,18 @@ final class XmlOutput {
     private long hasChildren;
     private boolean openEmpty;
 
+    /** A writer into a text that {@link #finish} returns. */
     XmlOutput(boolean indent) {
-        this.buffer = new StringWriter(1 << 12);
+        this(indent, null);
+    }
+
+    /** A writer into a stream, in UTF-8 (or into a text when {@code stream} is null). */
+    XmlOutput(boolean indent, OutputStream stream) {
+        this.buffer = stream == null ? new StringWriter(1 << 12) : null;
         this.indent = indent;
         try {
-            this.w = XMLOutputFactory.newDefaultFactory().createXMLStreamWriter(buffer);
+            XMLOutputFactory f = XMLOutputFactory.newDefaultFactory();
+            this.w = stream == null ? f.createXMLStreamWriter(buffer) : f.createXMLStreamWriter(stream, "UTF-8");
         } catch (XMLStreamException e) {
             throw new IllegalStateException("cannot create an XML writer: " + e.getMessage(), e);
         }
@@ -146,6 +154,7 @@ final class XmlOutput {
         return openEmpty;
     }
 
+    /** Ends the document: its text, or null when it went to a stream (flushed, not closed). */
     String finish() {
         try {
             if (indent) {
@@ -156,6 +165,6 @@ final class XmlOutput {
         } catch (XMLStreamException e) {
             throw failed(e);
         }
-        return buffer.toString();
+        return buffer == null ? null : buffer.toString();
     }
 }

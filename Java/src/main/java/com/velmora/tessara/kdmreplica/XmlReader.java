@@ -226,14 +226,17 @@ final class XmlReader {
             target.name = name != null ? name : target.name;
             target.schemaLocation = location != null ? location : "";
         }
+        Progress.Tracker progress = Progress.start(in.scan.total);
         while (e == XMLStreamConstants.START_ELEMENT) {
             instance();
+            progress.at(in.scan.seen());
             e = in.nextTag("the document element");
         }
         if (in.nextTag("the end of the document") != XMLStreamConstants.END_DOCUMENT) {
             throw in.fail("element " + in.qname() + " after the document element");
         }
         resolve();
+        progress.end();
     }
 
     /** The location named for the replica namespace in an {@code xsi:schemaLocation}, decoded; or null. */

@@ -3,6 +3,8 @@ package com.velmora.tessara.kdmreplica;
 import static com.velmora.tessara.kdmreplica.XmlNames.NS;
 import static com.velmora.tessara.kdmreplica.XmlNames.XSI;
 
+import java.io.OutputStream;
+import java.nio.file.Path;
 import java.util.IdentityHashMap;
 import java.util.concurrent.locks.Lock;
 
@@ -33,10 +35,10 @@ final class XmlWriter {
     private final IdentityHashMap<Model, Integer> firstKey = new IdentityHashMap<>();
     private final IdentityHashMap<Instance, Integer> deletedKeys = new IdentityHashMap<>();
 
-    private XmlWriter(Replica replica, boolean withState) {
+    private XmlWriter(Replica replica, boolean withState, OutputStream stream) {
         this.replica = replica;
         this.withState = withState;
-        this.out = new XmlOutput(Replica.getFeature("indent"));
+        this.out = new XmlOutput(Replica.getFeature("indent"), stream);
     }
 
     /** {@code Replica.getXml}: takes the replica's read lock for the whole pass. */
@@ -44,7 +46,19 @@ final class XmlWriter {
         Lock l = r.rw.readLock();
         l.lock();
         try {
-            return new XmlWriter(r, withState).run(withSchema);
+            return new XmlWriter(r, withState, null).run(withSchema);
+        } finally {
+            l.unlock();
+        }
+    }
+
+    /** {@code Replica.writeXmlFile}: the document streamed into the file, under the read lock. */
+    static void writeFile(Replica r, Path target, boolean withSchema, boolean withState) {
+        Lock l = r.rw.readLock();
+        l.lock();
+        try {
+            OutputFiles.write(target, "XML file", (channel, stream) -> new XmlWriter(r, withState, stream)
+                    .run(withSchema));
         } finally {
             l.unlock();
         }
@@ -78,20 +92,26 @@ final class XmlWriter {
         if (withSchema) {
             XsdWriter.writeSchema(out, replica);
         }
+        Progress.Tracker progress = Progress.start(next - 1);
+        long done = 0;
         for (Model m : replica.models.items) {
             InstanceSet s = m.instances;
             for (int k = 0; k < s.count; k++) {
                 Instance x = s.items[k];
                 instance(x, firstKey.get(m) + k);
+                progress.at(++done);
             }
             if (withState && m.deleted != null) {
                 for (Instance x : m.deleted) {
                     instance(x, deletedKeys.get(x));
+                    progress.at(++done);
                 }
             }
         }
         out.end();
-        return out.finish();
+        String text = out.finish();
+        progress.end();
+        return text;
     }
 
     private static String key(int n) {

@@ -5,6 +5,8 @@ import static com.velmora.tessara.kdmreplica.XmlNames.XS;
 
 import com.velmora.tessara.kdmreplica.vrattributes.AccessMode;
 import com.velmora.tessara.kdmreplica.vrattributes.Visibility;
+import java.io.OutputStream;
+import java.nio.file.Path;
 import java.util.concurrent.locks.Lock;
 
 /**
@@ -44,7 +46,18 @@ final class XsdWriter {
         Lock l = r.rw.readLock();
         l.lock();
         try {
-            return text(r);
+            return document(r, null, true);
+        } finally {
+            l.unlock();
+        }
+    }
+
+    /** {@code Replica.writeXsdFile}: the schema streamed into the file, under the read lock. */
+    static void writeFile(Replica r, Path target) {
+        Lock l = r.rw.readLock();
+        l.lock();
+        try {
+            OutputFiles.write(target, "XSD file", (channel, stream) -> document(r, stream, true));
         } finally {
             l.unlock();
         }
@@ -52,10 +65,20 @@ final class XsdWriter {
 
     /** The schema as a standalone document (caller holds a lock of the replica). */
     static String text(Replica r) {
-        XmlOutput out = new XmlOutput(Replica.getFeature("indent"));
+        return document(r, null, false);
+    }
+
+    /** The schema document; tracked, it reports its classes written (all at once, at the end). */
+    private static String document(Replica r, OutputStream stream, boolean tracked) {
+        Progress.Tracker progress = tracked ? Progress.start(r.models.items.size()) : null;
+        XmlOutput out = new XmlOutput(Replica.getFeature("indent"), stream);
         out.startDocument();
         writeSchema(out, r);
-        return out.finish();
+        String text = out.finish();
+        if (progress != null) {
+            progress.end();
+        }
+        return text;
     }
 
     private static void xs(XmlOutput out, String local) {

@@ -3,6 +3,8 @@ package com.velmora.tessara.kdmreplica;
 import static com.velmora.tessara.kdmreplica.Fx.*;
 import static org.junit.jupiter.api.Assertions.*;
 
+import java.nio.file.Files;
+import java.nio.file.Path;
 import java.util.*;
 import java.util.concurrent.atomic.AtomicBoolean;
 import java.util.concurrent.atomic.AtomicInteger;
@@ -28,33 +30,82 @@ class RoundTripTest {
     }
 
     enum Form {
-        XML, XML_STATES, XSD_POPULATE, XSD_POPULATE_STATES, BINARY, BINARY_COMPRESSED;
+        XML, XML_STATES, XSD_POPULATE, XSD_POPULATE_STATES, BINARY, BINARY_COMPRESSED,
+        XML_FILE, XSD_FILE_POPULATE, BINARY_FILE, BINARY_FILE_COMPRESSED;
+
+        private static final Path DIR = tempDir();
 
         boolean binary() {
-            return this == BINARY || this == BINARY_COMPRESSED;
+            return name().startsWith("BINARY");
         }
 
-        /** The output: {bytes}, {document with its schema}, or {XSD, document}; documents are validated by the XSD. */
-        Object[] write(Replica r) throws Exception {
-            if (binary()) {
-                return new Object[] {Replica.getBinaryFromReplica(r, this == BINARY_COMPRESSED)};
+        boolean compressed() {
+            return name().endsWith("COMPRESSED");
+        }
+
+        private static Path tempDir() {
+            try {
+                Path d = Files.createTempDirectory("corvexa-round-trip");
+                d.toFile().deleteOnExit();
+                return d;
+            } catch (Exception e) {
+                throw new IllegalStateException(e);
             }
-            Replica.setFeature("indent", this == XML || this == XSD_POPULATE_STATES);
-            boolean embedded = this == XML || this == XML_STATES;
-            String xml = r.getXml(embedded, this == XML_STATES || this == XSD_POPULATE_STATES);
+        }
+
+        private String file(String kind) {
+            Path p = DIR.resolve(name() + "." + kind);
+            p.toFile().deleteOnExit();
+            return p.toString();
+        }
+
+        /**
+         * The output: {bytes}, {document with its schema}, or {XSD, document}; documents are
+         * validated by the XSD. A file holds what the same output in memory holds.
+         */
+        Object[] write(Replica r) throws Exception {
+            if (this == BINARY_FILE || this == BINARY_FILE_COMPRESSED) {
+                r.writeBinaryFile(file("bin"), compressed());
+                byte[] bytes = Files.readAllBytes(Path.of(file("bin")));
+                assertArrayEquals(Replica.getBinaryFromReplica(r, compressed()), bytes);
+                return new Object[] {bytes};
+            }
+            if (binary()) {
+                return new Object[] {Replica.getBinaryFromReplica(r, compressed())};
+            }
+            Replica.setFeature("indent", this == XML || this == XSD_POPULATE_STATES || this == XML_FILE);
+            boolean embedded = this == XML || this == XML_STATES || this == XML_FILE;
+            boolean states = this != XML && this != XSD_POPULATE;
+            String xml = r.getXml(embedded, states);
             Fx.validate(r.getXsd(), xml);
+            if (this == XML_FILE || this == XSD_FILE_POPULATE) {
+                r.writeXmlFile(file("xml"), embedded, states);
+                assertEquals(xml, Files.readString(Path.of(file("xml"))));
+                r.writeXsdFile(file("xsd"));
+                assertEquals(r.getXsd(), Files.readString(Path.of(file("xsd"))));
+            }
             return embedded ? new Object[] {xml} : new Object[] {r.getXsd(), xml};
         }
 
         Replica read(Object[] w, String name) {
             if (binary()) {
-                return Replica.getReplicaFromBinary((byte[]) w[0], this == BINARY_COMPRESSED);
+                return this == BINARY_FILE || this == BINARY_FILE_COMPRESSED ? Replica.readBinaryFile(file("bin"))
+                        : this == BINARY ? Replica.getReplicaFromBinary((byte[]) w[0]) // compression from the header
+                        : Replica.getReplicaFromBinary((byte[]) w[0], true);
             }
             Replica.setFeature("validate", this == XML || this == XSD_POPULATE_STATES);
+            if (this == XML_FILE) {
+                return Replica.readFromXmlFile(file("xml"));
+            }
             if (w.length == 1) {
                 return Replica.readFromXmlString((String) w[0]);
             }
             Replica r = new Replica(name);
+            if (this == XSD_FILE_POPULATE) {
+                r.insertSchemaFile(file("xsd"));
+                r.populatesFromXmlFile(file("xml"));
+                return r;
+            }
             r.insertSchemaString((String) w[0]);
             r.populatesFromXmlString((String) w[1]);
             return r;
@@ -104,7 +155,8 @@ class RoundTripTest {
         r.commit();
         same(r, f);
         if (!f.binary()) {
-            String xml = (String) f.write(r)[f == Form.XML || f == Form.XML_STATES ? 0 : 1];
+            Object[] w = f.write(r);
+            String xml = (String) w[w.length - 1];
             assertFalse(xml.contains("\u0001") || xml.contains("\r") || xml.contains("\ud800"), xml);
         }
     }
@@ -116,7 +168,8 @@ class RoundTripTest {
      * commit as the original does.
      */
     @ParameterizedTest
-    @EnumSource(value = Form.class, names = {"XML_STATES", "XSD_POPULATE_STATES", "BINARY", "BINARY_COMPRESSED"})
+    @EnumSource(value = Form.class, names = {"XML_STATES", "XSD_POPULATE_STATES", "BINARY", "BINARY_COMPRESSED",
+        "XML_FILE", "XSD_FILE_POPULATE", "BINARY_FILE", "BINARY_FILE_COMPRESSED"})
     void everySchemaPropertyAndPendingInstanceSurvives(Form f) throws Exception {
         Replica r = sample(f.binary());
         Replica back = trip(r, f);
