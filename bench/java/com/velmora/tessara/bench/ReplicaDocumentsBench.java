@@ -5,8 +5,16 @@ import com.velmora.tessara.kdmreplica.AttributeType;
 import com.velmora.tessara.kdmreplica.ClassDef;
 import com.velmora.tessara.kdmreplica.Instance;
 import com.velmora.tessara.kdmreplica.Model;
+import com.velmora.tessara.kdmreplica.Progress;
 import com.velmora.tessara.kdmreplica.Replica;
+import java.io.BufferedInputStream;
+import java.io.IOException;
+import java.io.InputStream;
+import java.io.Reader;
 import java.io.StringReader;
+import java.io.UncheckedIOException;
+import java.nio.file.Files;
+import java.nio.file.Path;
 import java.nio.charset.StandardCharsets;
 import java.util.Arrays;
 import java.util.Date;
@@ -85,6 +93,107 @@ public final class ReplicaDocumentsBench {
         System.out.printf("  binary / XML size:            %.3f   (target <= 0.5)%n", (double) bin.length
                 / xmlBytes.length);
         System.out.printf("  compressed binary / XML size: %.3f%n", (double) packed.length / xmlBytes.length);
+        files(replica, reps, warm);
+    }
+
+    /**
+     * Files: the XML file written (streamed) against the same file read back, the read against a
+     * bare StAX pass over the file, binary files against XML files, and the memory a write adds.
+     */
+    private static void files(Replica replica, int reps, int warm) throws IOException {
+        Path dir = Files.createTempDirectory("corvexa-bench");
+        Path xml = dir.resolve("replica.xml");
+        Path bin = dir.resolve("replica.bin");
+        try {
+            long written = rssGrowth(() -> replica.writeXmlFile(xml.toString(), true, false));
+            long held = heldDuring(() -> replica.writeXmlFile(xml.toString(), true, false));
+            long heldAsString = heldDuring(() -> sink = replica.getXml(true));
+            sink = null;
+            double[] paired = pairedMedians(reps, warm, () -> staxFilePass(xml), () -> Replica.readFromXmlFile(
+                    xml.toString()));
+            double write = median(reps, warm, () -> {
+                replica.writeXmlFile(xml.toString(), true, false);
+                return xml;
+            });
+            double binWrite = median(reps, warm, () -> {
+                replica.writeBinaryFile(bin.toString(), false);
+                return bin;
+            });
+            double binRead = median(reps, warm, () -> Replica.readBinaryFile(bin.toString()));
+            checkSame(replica, Replica.readBinaryFile(bin.toString()), replica.getModels().getItem(CLASS).getInstances()
+                    .getCount());
+            double mb = Files.size(xml) / 1e6;
+            System.out.printf("%nFiles (XML with its schema, %.1f MB; binary %.1f MB, uncompressed):%n", mb,
+                    Files.size(bin) / 1e6);
+            System.out.printf("  XML file write       %8.1f ms   write / read of the same file: %.2f (target <= 1)%n",
+                    write * 1e3, write / paired[1]);
+            System.out.printf("  XML file read        %8.1f ms   throughput against a bare StAX pass over the file:"
+                    + " %.2f (target >= 0.7)%n", paired[1] * 1e3, paired[2]);
+            System.out.printf("  binary file write    %8.1f ms   XML file write / binary file write: %.1fx (target >= 4)%n",
+                    binWrite * 1e3, write / binWrite);
+            System.out.printf("  binary file read     %8.1f ms   XML file read / binary file read:   %.1fx (target >= 4)%n",
+                    binRead * 1e3, paired[1] / binRead);
+            System.out.printf("  memory an XML file write holds beyond the replica: %s of heap, sampled after collections"
+                    + " during the write (target <= 64 MB; getXml into a String holds %s); resident memory it"
+                    + " adds: %s%n", megabytes(held), megabytes(heldAsString), megabytes(written));
+        } finally {
+            Files.deleteIfExists(xml);
+            Files.deleteIfExists(bin);
+            Files.deleteIfExists(dir);
+        }
+    }
+
+    /**
+     * How far the process's resident memory rises above where it was while work runs (its peak,
+     * reset through /proc/self/clear_refs first); -1 where the system does not tell.
+     */
+    private static long rssGrowth(Runnable work) {
+        gc();
+        try {
+            Files.writeString(Path.of("/proc/self/clear_refs"), "5");
+            long before = status("VmRSS:");
+            work.run();
+            return status("VmHWM:") - before;
+        } catch (IOException | RuntimeException e) {
+            work.run();
+            return -1;
+        }
+    }
+
+    /**
+     * The most heap that work holds beyond what was in use before, sampled after a collection at
+     * its progress reports past each fifth of the work (collections are slow: no more samples).
+     */
+    private static long heldDuring(Runnable work) {
+        long base = usedAfterGc();
+        long[] peak = {base, 1};
+        Progress.setListener((done, total) -> {
+            if (total > 0 && done * 5 >= peak[1] * total && peak[1] < 5) {
+                peak[1] = done * 5 / total + 1;
+                peak[0] = Math.max(peak[0], usedAfterGc());
+            }
+            return true;
+        });
+        try {
+            work.run();
+        } finally {
+            Progress.setListener(null);
+        }
+        return peak[0] - base;
+    }
+
+    /** A field of /proc/self/status in bytes. */
+    private static long status(String field) throws IOException {
+        for (String line : Files.readAllLines(Path.of("/proc/self/status"))) {
+            if (line.startsWith(field)) {
+                return Long.parseLong(line.substring(field.length()).trim().split("\\s+")[0]) * 1024;
+            }
+        }
+        throw new IOException(field + " not in /proc/self/status");
+    }
+
+    private static String megabytes(long bytes) {
+        return bytes < 0 ? "not measured here" : String.format("%.1f MB", bytes / 1e6);
     }
 
     // ------------------------------------------------------------------ data
@@ -150,6 +259,19 @@ public final class ReplicaDocumentsBench {
      * the package sets it (a new factory per document, as the package makes one per read).
      */
     private static long staxPass(String xml) {
+        return staxPass(new StringReader(xml), null);
+    }
+
+    /** The same pass over a file, read as the package reads files (a buffered stream, its encoding from the document). */
+    private static long staxFilePass(Path file) {
+        try (InputStream in = new BufferedInputStream(Files.newInputStream(file), 1 << 16)) {
+            return staxPass(null, in);
+        } catch (IOException e) {
+            throw new UncheckedIOException(e);
+        }
+    }
+
+    private static long staxPass(Reader reader, InputStream stream) {
         XMLInputFactory f = XMLInputFactory.newDefaultFactory();
         f.setProperty(XMLInputFactory.SUPPORT_DTD, Boolean.FALSE);
         f.setProperty(XMLInputFactory.IS_SUPPORTING_EXTERNAL_ENTITIES, Boolean.FALSE);
@@ -161,7 +283,7 @@ public final class ReplicaDocumentsBench {
         });
         long sum = 0;
         try {
-            XMLStreamReader r = f.createXMLStreamReader(new StringReader(xml));
+            XMLStreamReader r = reader != null ? f.createXMLStreamReader(reader) : f.createXMLStreamReader(stream);
             while (r.hasNext()) {
                 int e = r.next();
                 if (e == XMLStreamReader.CHARACTERS) {

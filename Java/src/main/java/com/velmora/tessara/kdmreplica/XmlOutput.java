@@ -1,7 +1,13 @@
 package com.velmora.tessara.kdmreplica;
 
+import java.io.BufferedWriter;
+import java.io.IOException;
+import java.io.UncheckedIOException;
 import java.io.OutputStream;
+import java.io.OutputStreamWriter;
 import java.io.StringWriter;
+import java.io.Writer;
+import java.nio.charset.StandardCharsets;
 import javax.xml.stream.XMLOutputFactory;
 import javax.xml.stream.XMLStreamException;
 import javax.xml.stream.XMLStreamWriter;
@@ -10,6 +16,8 @@ import javax.xml.stream.XMLStreamWriter;
 final class XmlOutput {
     final XMLStreamWriter w;
     private final StringWriter buffer;
+    /** The characters' way into the stream, when there is one. */
+    private final Writer encoder;
     private final boolean indent;
     private int depth;
     /** Whether the element open at each depth has child elements (bit per depth, up to 64). */
@@ -27,7 +35,11 @@ final class XmlOutput {
         this.indent = indent;
         try {
             XMLOutputFactory f = XMLOutputFactory.newDefaultFactory();
-            this.w = stream == null ? f.createXMLStreamWriter(buffer) : f.createXMLStreamWriter(stream, "UTF-8");
+            // Characters are encoded in bulk by a writer of our own: the factory's own UTF-8 stream
+            // encodes them one at a time.
+            this.encoder = stream == null ? null
+                    : new BufferedWriter(new OutputStreamWriter(stream, StandardCharsets.UTF_8), 1 << 14);
+            this.w = f.createXMLStreamWriter(stream == null ? buffer : encoder);
         } catch (XMLStreamException e) {
             throw new IllegalStateException("cannot create an XML writer: " + e.getMessage(), e);
         }
@@ -162,8 +174,13 @@ final class XmlOutput {
             }
             w.writeEndDocument();
             w.close();
+            if (encoder != null) {
+                encoder.flush();
+            }
         } catch (XMLStreamException e) {
             throw failed(e);
+        } catch (IOException e) {
+            throw new UncheckedIOException(e);
         }
         return buffer == null ? null : buffer.toString();
     }
