@@ -257,6 +257,22 @@ std::string IdOf(VLXKDMInstance& x)
   return isText ? Text(text) : "0x" + Hex(bytes);
 }
 
+// The items of a row: its one value (single-valued) or its list, each shown as text.
+template <class One, class List, class Show>
+void Items(const VLXKDMColumns& b, long k, long r, bool multi, long (VLXKDMColumns::*one)(long, long, One&) const,
+           long (VLXKDMColumns::*list)(long, long, List&) const, Show show, std::vector<std::string>& items)
+{
+  List values;
+  if (multi) {
+    (b.*list)(k, r, values);
+  } else {
+    One value{};
+    (b.*one)(k, r, value);
+    values.Append(value);
+  }
+  for (int i = 1; i <= values.Size(); ++i) items.push_back(show(values[i]));
+}
+
 // One value of a column's row as text (j: JSON, quoted where JSON quotes; t, c: plain).
 std::string ValueText(const VLXKDMColumns& b, long k, long r, const Attribute& a, char format)
 {
@@ -265,81 +281,50 @@ std::string ValueText(const VLXKDMColumns& b, long k, long r, const Attribute& a
   if (!has) return format == 'j' ? "null" : "";
   auto quote = [format](const std::string& s) { return format == 'j' ? Escaped(s, 'j') : s; };
   std::vector<std::string> items;
+  using C = VLXKDMColumns;
   switch (a.type) {
-    case VLXKDMAttributeType::Integer: {
-      VLXRawCollint v;
-      int one = 0;
-      if (!a.multi)
-        b.GetInteger(k, r, one), v.Append(one);
-      else
-        b.GetIntegers(k, r, v);
-      for (int i = 1; i <= v.Size(); ++i) items.push_back(std::to_string(v[i]));
+    case VLXKDMAttributeType::Integer:
+      Items(
+          b, k, r, a.multi, &C::GetInteger, &C::GetIntegers, [](int v) { return std::to_string(v); }, items);
       break;
-    }
-    case VLXKDMAttributeType::Double: {
-      VLXRawColldouble v;
-      double one = 0;
-      if (!a.multi)
-        b.GetDouble(k, r, one), v.Append(one);
-      else
-        b.GetDoubles(k, r, v);
-      for (int i = 1; i <= v.Size(); ++i) items.push_back(std::isfinite(v[i]) ? Number(v[i]) : quote(Number(v[i])));
+    case VLXKDMAttributeType::Double:
+      Items(
+          b, k, r, a.multi, &C::GetDouble, &C::GetDoubles,
+          [&](double v) { return std::isfinite(v) ? Number(v) : quote(Number(v)); }, items);
       break;
-    }
-    case VLXKDMAttributeType::Boolean: {
-      VLXListValVLXBoolean v;
-      VLXBoolean one = 0;
-      if (!a.multi)
-        b.GetBoolean(k, r, one), v.Append(one);
-      else
-        b.GetBooleans(k, r, v);
-      for (int i = 1; i <= v.Size(); ++i) items.push_back(v[i] ? "true" : "false");
+    case VLXKDMAttributeType::Boolean:
+      Items(
+          b, k, r, a.multi, &C::GetBoolean, &C::GetBooleans, [](VLXBoolean v) { return v ? "true" : "false"; }, items);
       break;
-    }
-    case VLXKDMAttributeType::Date: {
-      long long ms = 0;
+    case VLXKDMAttributeType::Date:  // single dates to the millisecond, lists as whole seconds
       if (!a.multi) {
+        long long ms = 0;
         b.GetMilliseconds(k, r, ms);
         items.push_back(quote(IsoTime(ms)));
       } else {
-        VLXListValVLXTime v;  // lists of dates read as seconds
-        b.GetTimes(k, r, v);
-        for (int i = 1; i <= v.Size(); ++i) items.push_back(quote(IsoTime(v[i].Gettime_t() * 1000LL)));
+        Items(
+            b, k, r, true, &C::GetTime, &C::GetTimes,
+            [&](const VLXTime& t) { return quote(IsoTime(t.Gettime_t() * 1000LL)); }, items);
       }
       break;
-    }
-    case VLXKDMAttributeType::String: {
-      VLXListOfVLXUnicodeString v;
-      VLXUnicodeString one;
-      if (!a.multi)
-        b.GetText(k, r, one), v.Append(one);
-      else
-        b.GetTexts(k, r, v);
-      for (int i = 1; i <= v.Size(); ++i) items.push_back(quote(Text(v[i])));
+    case VLXKDMAttributeType::String:
+      Items(
+          b, k, r, a.multi, &C::GetText, &C::GetTexts, [&](const VLXUnicodeString& v) { return quote(Text(v)); },
+          items);
       break;
-    }
-    case VLXKDMAttributeType::Binary: {
-      VLXListValVLXBinary v;
-      VLXBinary one;
-      if (!a.multi)
-        b.GetBinary(k, r, one), v.Append(one);
-      else
-        b.GetBinaries(k, r, v);
-      for (int i = 1; i <= v.Size(); ++i) items.push_back(quote("0x" + Hex(v[i])));
+    case VLXKDMAttributeType::Binary:
+      Items(
+          b, k, r, a.multi, &C::GetBinary, &C::GetBinaries, [&](const VLXBinary& v) { return quote("0x" + Hex(v)); },
+          items);
       break;
-    }
-    default: {
-      VLXListValVLXKDMInstance v;
-      VLXKDMInstance one;
-      if (!a.multi)
-        b.GetInstance(k, r, one), v.Append(one);
-      else
-        b.GetInstances(k, r, v);
-      for (int i = 1; i <= v.Size(); ++i) {
-        const std::string id = IdOf(v[i]);
-        items.push_back(quote(id.empty() ? "(instance without identifier)" : id));
-      }
-    }
+    default:
+      Items(
+          b, k, r, a.multi, &C::GetInstance, &C::GetInstances,
+          [&](VLXKDMInstance& x) {
+            const std::string id = IdOf(x);
+            return quote(id.empty() ? "(instance without identifier)" : id);
+          },
+          items);
   }
   if (!a.multi) return items.empty() ? "" : items[0];
   std::string out = "[";
