@@ -49,7 +49,7 @@ TEST_F(StartupTest, TheProcessJvmWasCreatedOnceWithTheOptionsListAndTheClassPath
   EXPECT_EQ(again, env);
   JavaVM* vms[2] = {nullptr, nullptr};
   jsize count = 0;
-  ASSERT_EQ(JNI_GetCreatedJavaVMs(vms, 2, &count), JNI_OK);
+  ASSERT_EQ(VLXJBXDetail::LoadJvm().created(vms, 2, &count), JNI_OK);
   ASSERT_EQ(count, 1);
   EXPECT_EQ(VLXJBXJNIUtilities::GetJavaVM(), vms[0]);
   EXPECT_FALSE(TakeLastError().present);

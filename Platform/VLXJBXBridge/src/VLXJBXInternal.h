@@ -102,6 +102,17 @@ long WithUtf8(JNIEnv* env, jstring text, const char* operation, Use use)
   return 0;
 }
 
+// The JVM's invocation functions, from the libjvm.so already in the process, else the first that
+// loads of $JAVA_HOME/lib/server/libjvm.so, libjvm.so through the library's run path and the
+// system's default JDK; loaded once. Without one, create is null and problem names the paths tried.
+struct Jvm {
+  jint(JNICALL* create)(JavaVM**, void**, void*) = nullptr;
+  jint(JNICALL* created)(JavaVM**, jsize, jsize*) = nullptr;
+  std::string path;
+  std::string problem;
+};
+const Jvm& LoadJvm();
+
 // The start-up configuration, exposed for tests.
 // The directory of the bridge library ("" if it cannot be found).
 std::string LibraryDirectory();

@@ -149,7 +149,9 @@ bool CannotStopTheJvm(const std::string& option)
 std::string JavaLauncher()
 {
   Dl_info info;
-  if (dladdr(reinterpret_cast<void*>(&JNI_CreateJavaVM), &info) == 0 || info.dli_fname == nullptr) return std::string();
+  const VLXJBXDetail::Jvm& jvm = VLXJBXDetail::LoadJvm();
+  if (!jvm.create || dladdr(reinterpret_cast<void*>(jvm.create), &info) == 0 || info.dli_fname == nullptr)
+    return std::string();
   std::string directory = info.dli_fname;
   for (int level = 0; level < 4; ++level) {
     const size_t slash = directory.rfind('/');
@@ -287,6 +289,42 @@ bool LauncherAccepts(const std::vector<std::string>& options, std::string& refus
   return false;
 }
 
+}  // namespace
+
+const VLXJBXDetail::Jvm& VLXJBXDetail::LoadJvm()
+{
+  static const Jvm jvm = [] {
+    Jvm found;
+    auto take = [&found](void* handle, const std::string& path) {
+      found.create = reinterpret_cast<decltype(found.create)>(dlsym(handle, "JNI_CreateJavaVM"));
+      found.created = reinterpret_cast<decltype(found.created)>(dlsym(handle, "JNI_GetCreatedJavaVMs"));
+      if (found.create && found.created) found.path = path;
+      else found.create = nullptr, found.created = nullptr;
+      return found.create != nullptr;
+    };
+    // A JVM already in the process (a Java program that loaded the library, or a program linked
+    // with libjvm) is the one to use: a second libjvm in one process cannot work.
+    if (take(RTLD_DEFAULT, "the process's own libjvm")) return found;
+    std::vector<std::string> candidates;
+    if (const char* home = std::getenv("JAVA_HOME"); home && *home) candidates.push_back(std::string(home) + "/lib/server/libjvm.so");
+    candidates.push_back("libjvm.so");  // through the library's run path (the JDK it was built with)
+    candidates.push_back("/usr/lib/jvm/default-java/lib/server/libjvm.so");
+    std::string tried;
+    for (const std::string& path : candidates) {
+      void* handle = dlopen(path.c_str(), RTLD_NOW | RTLD_GLOBAL);
+      if (handle && take(handle, path)) return found;
+      const char* error = dlerror();
+      tried += (tried.empty() ? "" : "; ") + path + " (" + (error ? error : "no JNI_CreateJavaVM in it") + ")";
+    }
+    found.problem = "no Java virtual machine library (libjvm.so) could be loaded; set JAVA_HOME to a JDK 17. Tried: " +
+                    tried + (std::getenv("JAVA_HOME") ? "" : "; JAVA_HOME is not set");
+    return found;
+  }();
+  return jvm;
+}
+
+namespace {
+
 long StartFailed(const std::string& why)
 {
   g_startFailed = true;
@@ -339,7 +377,7 @@ long CreateJavaVM(const VLXListValVLXUnicodeString& extraOptions, JavaVM*& vm, J
   args.ignoreUnrecognized = JNI_FALSE;
 
   void* envOut = nullptr;
-  const jint rc = JNI_CreateJavaVM(&vm, &envOut, &args);
+  const jint rc = VLXJBXDetail::LoadJvm().create(&vm, &envOut, &args);
   if (rc == JNI_OK) {
     env = static_cast<JNIEnv*>(envOut);
     return VLX_S_OK;
@@ -362,7 +400,13 @@ long SlowGetJNIEnv(JNIEnv*& env, const VLXListValVLXUnicodeString& options)
         return Raise(VLX_E_FAIL, VLXJBXMessages::JvmCreationFailed, {g_startFailure}, __FILE__, __LINE__);
       jsize count = 0;
       JavaVM* existing = nullptr;
-      if (JNI_GetCreatedJavaVMs(&existing, 1, &count) == JNI_OK && count > 0 && existing != nullptr) {
+      const VLXJBXDetail::Jvm& jvm = VLXJBXDetail::LoadJvm();
+      if (!jvm.create) {
+        g_startFailed = true;
+        g_startFailure = jvm.problem;
+        return Raise(VLX_E_FAIL, VLXJBXMessages::JvmCreationFailed, {g_startFailure}, __FILE__, __LINE__);
+      }
+      if (jvm.created(&existing, 1, &count) == JNI_OK && count > 0 && existing != nullptr) {
         vm = existing;
       } else {
         JNIEnv* created = nullptr;
