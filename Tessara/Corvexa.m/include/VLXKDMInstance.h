@@ -78,6 +78,9 @@ class CORVEXA_API VLXKDMInstance : public VLXKDMJavaObject {
   long SetValue(int position, double value);
   long SetValue(const VLXUnicodeString& name, VLXBoolean value);
   long SetValue(int position, VLXBoolean value);
+  // A bool stores a Boolean, as a VLXBoolean does (without these, true would go as the int 1).
+  long SetValue(const VLXUnicodeString& name, bool value);
+  long SetValue(int position, bool value);
   long SetValue(const VLXUnicodeString& name, const VLXUnicodeString& value);
   long SetValue(int position, const VLXUnicodeString& value);
   long SetValue(const VLXUnicodeString& name, const VLXTime& value);

@@ -269,6 +269,16 @@ long VLXKDMInstance::SetValue(int position, VLXBoolean value)
   return SetConverted("VLXKDMInstance::SetValue(int, VLXBoolean)", position, value);
 }
 
+long VLXKDMInstance::SetValue(const VLXUnicodeString& name, bool value)
+{
+  return SetConverted("VLXKDMInstance::SetValue(const VLXUnicodeString&, bool)", name, VLXBoolean(value ? 1 : 0));
+}
+
+long VLXKDMInstance::SetValue(int position, bool value)
+{
+  return SetConverted("VLXKDMInstance::SetValue(int, bool)", position, VLXBoolean(value ? 1 : 0));
+}
+
 long VLXKDMInstance::SetValue(const VLXUnicodeString& name, const VLXUnicodeString& value)
 {
   return SetConverted("VLXKDMInstance::SetValue(const VLXUnicodeString&, const VLXUnicodeString&)", name, value);
