@@ -62,21 +62,21 @@ long Convert(JNIEnv* env, jobject object, Typed<int>& out)
 {
   if (!Is(env, object, Integer)) return Mismatch(env, object, out);
   out.value = Helper::CallIntMethod(env, object, FrameAccess::Table()->Method(Integer_intValue));
-  return VLX_S_OK;
+  return Helper::ExceptionCheck(env) ? VLX_E_FAIL : VLX_S_OK;
 }
 template <>
 long Convert(JNIEnv* env, jobject object, Typed<double>& out)
 {
   if (!Is(env, object, Double)) return Mismatch(env, object, out);
   out.value = Helper::CallDoubleMethod(env, object, FrameAccess::Table()->Method(Double_doubleValue));
-  return VLX_S_OK;
+  return Helper::ExceptionCheck(env) ? VLX_E_FAIL : VLX_S_OK;
 }
 template <>
 long Convert(JNIEnv* env, jobject object, Typed<bool>& out)
 {
   if (!Is(env, object, Boolean)) return Mismatch(env, object, out);
   out.value = Helper::CallBooleanMethod(env, object, FrameAccess::Table()->Method(Boolean_booleanValue)) == JNI_TRUE;
-  return VLX_S_OK;
+  return Helper::ExceptionCheck(env) ? VLX_E_FAIL : VLX_S_OK;
 }
 template <>
 long Convert(JNIEnv* env, jobject object, Typed<std::string>& out)
@@ -101,7 +101,7 @@ long Convert(JNIEnv* env, jobject object, Typed<bytes>& out)
   if (!read.empty())
     env->GetByteArrayRegion(array, 0, static_cast<jsize>(read.size()), reinterpret_cast<jbyte*>(read.data()));
   out.value.swap(read);
-  return VLX_S_OK;
+  return Helper::ExceptionCheck(env) ? VLX_E_FAIL : VLX_S_OK;
 }
 template <>
 long Convert(JNIEnv* env, jobject object, Typed<InstanceHandle>& out)
@@ -120,7 +120,7 @@ long Convert(JNIEnv* env, jobject object, Typed<std::vector<int>>& out)
   std::vector<int> read(static_cast<std::size_t>(Helper::GetArrayLength(env, array)));
   if (!read.empty()) env->GetIntArrayRegion(array, 0, static_cast<jsize>(read.size()), read.data());
   out.value.swap(read);
-  return VLX_S_OK;
+  return Helper::ExceptionCheck(env) ? VLX_E_FAIL : VLX_S_OK;
 }
 template <>
 long Convert(JNIEnv* env, jobject object, Typed<std::vector<double>>& out)
@@ -130,7 +130,7 @@ long Convert(JNIEnv* env, jobject object, Typed<std::vector<double>>& out)
   std::vector<double> read(static_cast<std::size_t>(Helper::GetArrayLength(env, array)));
   if (!read.empty()) env->GetDoubleArrayRegion(array, 0, static_cast<jsize>(read.size()), read.data());
   out.value.swap(read);
-  return VLX_S_OK;
+  return Helper::ExceptionCheck(env) ? VLX_E_FAIL : VLX_S_OK;
 }
 template <>
 long Convert(JNIEnv* env, jobject object, Typed<std::vector<bool>>& out)
@@ -141,7 +141,7 @@ long Convert(JNIEnv* env, jobject object, Typed<std::vector<bool>>& out)
   if (!flags.empty()) env->GetBooleanArrayRegion(array, 0, static_cast<jsize>(flags.size()), flags.data());
   out.value.assign(flags.size(), false);
   for (std::size_t i = 0; i < flags.size(); ++i) out.value[i] = flags[i] != JNI_FALSE;
-  return VLX_S_OK;
+  return Helper::ExceptionCheck(env) ? VLX_E_FAIL : VLX_S_OK;
 }
 template <>
 long Convert(JNIEnv* env, jobject object, Typed<std::vector<std::string>>& out)

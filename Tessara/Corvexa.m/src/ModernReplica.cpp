@@ -69,9 +69,12 @@ std::string Get(VLXKDMJavaObject& proxy, long (VLXKDMClassDef::*getter)(VLXUnico
   return Text(text);
 }
 
-bool Flag(long code, VLXBoolean flag, const char* operation)
+// A flag read by getter from proxy.
+template <class Proxy>
+bool Flag(Proxy& proxy, long (Proxy::*getter)(VLXBoolean&), const char* operation)
 {
-  Check(code, operation);
+  VLXBoolean flag = 0;
+  Check((proxy.*getter)(flag), operation);
   return flag != 0;
 }
 
@@ -98,20 +101,17 @@ Type AttributeDef::type() const
 
 bool AttributeDef::multi_valued() const
 {
-  VLXBoolean flag = 0;
-  return Flag(_proxy.IsMultiValuated(flag), flag, "corvexa::AttributeDef::multi_valued");
+  return Flag(_proxy, &VLXKDMAttributeDef::IsMultiValuated, "corvexa::AttributeDef::multi_valued");
 }
 
 bool AttributeDef::mandatory() const
 {
-  VLXBoolean flag = 0;
-  return Flag(_proxy.IsMandatory(flag), flag, "corvexa::AttributeDef::mandatory");
+  return Flag(_proxy, &VLXKDMAttributeDef::IsMandatory, "corvexa::AttributeDef::mandatory");
 }
 
 bool AttributeDef::unique() const
 {
-  VLXBoolean flag = 0;
-  return Flag(_proxy.IsUnique(flag), flag, "corvexa::AttributeDef::unique");
+  return Flag(_proxy, &VLXKDMAttributeDef::IsUnique, "corvexa::AttributeDef::unique");
 }
 
 int AttributeDef::length() const
@@ -153,8 +153,7 @@ std::string ClassDef::comment() const
 
 bool ClassDef::is_abstract() const
 {
-  VLXBoolean flag = 0;
-  return Flag(_proxy.IsAbstract(flag), flag, "corvexa::ClassDef::is_abstract");
+  return Flag(_proxy, &VLXKDMClassDef::IsAbstract, "corvexa::ClassDef::is_abstract");
 }
 
 namespace {
@@ -277,6 +276,22 @@ std::optional<InstanceHandle> Find(Owner& owner, const Id& id, const char* opera
 }
 
 VLXBinary Binary(const bytes& data) { return VLXBinary(data.data(), static_cast<int>(data.size())); }
+VLXBoolean Platform(bool v) { return v ? 1 : 0; }
+VLXUnicodeString Platform(const std::string& v) { return Text(v); }
+VLXBinary Platform(const bytes& v) { return Binary(v); }
+template <class T>
+const T& Platform(const T& v)
+{
+  return v;
+}
+// A platform value list of the elements of a vector.
+template <class List, class T>
+List ListOf(const std::vector<T>& values)
+{
+  List out(static_cast<int>(values.size()));
+  for (const auto& v : values) out.Append(Platform(v));
+  return out;
+}
 
 }  // namespace
 
@@ -301,6 +316,11 @@ CORVEXA_VALUE(double, SetDouble, v)
 CORVEXA_VALUE(bool, SetBoolean, v ? 1 : 0)
 CORVEXA_VALUE(std::string_view, SetString, Text(v))
 CORVEXA_VALUE(const bytes&, SetBinary, Binary(v))
+CORVEXA_VALUE(const std::vector<int>&, SetListOfInteger, ListOf<VLXRawCollint>(v))
+CORVEXA_VALUE(const std::vector<double>&, SetListOfDouble, ListOf<VLXRawColldouble>(v))
+CORVEXA_VALUE(const std::vector<bool>&, SetListOfBoolean, ListOf<VLXListValVLXBoolean>(v))
+CORVEXA_VALUE(const std::vector<std::string>&, SetListOfString, ListOf<VLXListValVLXUnicodeString>(v))
+CORVEXA_VALUE(const std::vector<bytes>&, SetListOfBinary, ListOf<VLXListValVLXBinary>(v))
 #undef CORVEXA_VALUE
 
 Model::Value Model::Value::of(const InstanceHandle& v)
@@ -311,13 +331,28 @@ Model::Value Model::Value::of(const InstanceHandle& v)
   return value;
 }
 
+ModelHandle::Value ModelHandle::Value::of(const std::vector<InstanceHandle>& v)
+{
+  Value value;
+  VLXListValVLXKDMInstance list(static_cast<int>(v.size()));
+  for (const InstanceHandle& one : v) list.Append(of(one).holder.GetInstance());
+  value.holder.SetListOfInstance(list);
+  return value;
+}
+
 std::vector<InstanceHandle> Model::select_value(std::string_view attribute, const Value& value,
                                                 bool with_subclasses) const
 {
+  const char* const operation = "corvexa::Model::select";
   VLXKDMInstanceValue holder(value.holder);
   VLXListValVLXKDMInstance found;
-  Check(_proxy.SelectInstances(Text(attribute), holder, with_subclasses ? 1 : 0, found), "corvexa::Model::select",
-        attribute);
+  const VLXBoolean subclasses = with_subclasses ? 1 : 0;
+  // A value without type goes as null (no value), which the value holder cannot send.
+  auto call = Call(_proxy, operation, slot<Model_selectInstances>);
+  Check(holder.GetType() == static_cast<VLXKDMInstanceValue::Type>(-1)
+            ? call.with(Text(attribute), jobject(nullptr), subclasses).returning(found)
+            : call.with(Text(attribute), Remote(holder), subclasses).returning(found),
+        operation, attribute);
   return std::vector<InstanceHandle>(found.begin(), found.end());
 }
 

@@ -257,8 +257,9 @@ class CORVEXA_API Model {
   // The live instance with this identifier; empty when none has it.
   [[nodiscard]] std::optional<Instance> find(std::string_view id) const;
   [[nodiscard]] std::optional<Instance> find(const bytes& id) const;
-  // The live instances whose attribute holds value (multi-valued ones: among their elements);
-  // with_subclasses also searches the models of the subclasses.
+  // The live instances whose attribute holds value: one of int, double, bool, a text, bytes or an
+  // Instance (by identity), or for a multi-valued attribute a std::vector of them, compared element
+  // by element. with_subclasses also searches the models of the subclasses.
   template <class T>
   [[nodiscard]] std::vector<Instance> select(std::string_view attribute, const T& value,
                                              bool with_subclasses = false) const
@@ -283,6 +284,12 @@ class CORVEXA_API Model {
     static Value of(const char* v) { return of(std::string_view(v)); }
     static Value of(const bytes& v);
     static Value of(const Instance& v);
+    static Value of(const std::vector<int>& v);
+    static Value of(const std::vector<double>& v);
+    static Value of(const std::vector<bool>& v);
+    static Value of(const std::vector<std::string>& v);
+    static Value of(const std::vector<bytes>& v);
+    static Value of(const std::vector<Instance>& v);
   };
   std::vector<Instance> select_value(std::string_view attribute, const Value& value, bool with_subclasses) const;
 
