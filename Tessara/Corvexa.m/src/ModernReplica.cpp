@@ -34,7 +34,10 @@ namespace {
   std::vector<std::string> parameters;
   if (VLXError* error = VLXError::VLXGetOperationError()) {
     id = error->GetId();
-    text = Text(error->GetMessageText());
+    // A refused argument's text repeats the operation: its cause is the second parameter.
+    text = id == VLXJBXMessages::InvalidArgument && error->GetNLSParameterCount() == 2
+               ? Text(error->GetNLSParameter(2))
+               : Text(error->GetMessageText());
     for (int i = 1; i <= error->GetNLSParameterCount(); ++i) parameters.push_back(Text(error->GetNLSParameter(i)));
     error->Release();
   } else {
