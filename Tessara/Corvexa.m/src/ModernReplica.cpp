@@ -35,9 +35,8 @@ namespace {
   if (VLXError* error = VLXError::VLXGetOperationError()) {
     id = error->GetId();
     // A refused argument's text repeats the operation: its cause is the second parameter.
-    text = id == VLXJBXMessages::InvalidArgument && error->GetNLSParameterCount() == 2
-               ? Text(error->GetNLSParameter(2))
-               : Text(error->GetMessageText());
+    text = id == VLXJBXMessages::InvalidArgument && error->GetNLSParameterCount() == 2 ? Text(error->GetNLSParameter(2))
+                                                                                       : Text(error->GetMessageText());
     for (int i = 1; i <= error->GetNLSParameterCount(); ++i) parameters.push_back(Text(error->GetNLSParameter(i)));
     error->Release();
   } else {
@@ -65,16 +64,17 @@ void Refuse(const char* operation, std::string_view argument, const std::string&
 
 namespace {
 
-std::string Get(VLXKDMJavaObject& proxy, long (VLXKDMClassDef::*getter)(VLXUnicodeString&), const char* operation)
+std::string Get(const VLXKDMClassDef& proxy, long (VLXKDMClassDef::*getter)(VLXUnicodeString&) const,
+                const char* operation)
 {
   VLXUnicodeString text;
-  Check((static_cast<VLXKDMClassDef&>(proxy).*getter)(text), operation);
+  Check((proxy.*getter)(text), operation);
   return Text(text);
 }
 
 // A flag read by getter from proxy.
 template <class Proxy>
-bool Flag(Proxy& proxy, long (Proxy::*getter)(VLXBoolean&), const char* operation)
+bool Flag(const Proxy& proxy, long (Proxy::*getter)(VLXBoolean&) const, const char* operation)
 {
   VLXBoolean flag = 0;
   Check((proxy.*getter)(flag), operation);
