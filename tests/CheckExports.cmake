@@ -12,7 +12,7 @@ foreach(wanted "T VELMORA_QKA2_INTERNAL_Corvexa\n" "VLXKDMReplica::GetName" "VLX
   endif()
 endforeach()
 # The modern interface's classes are API; anything else in namespace corvexa is the frame's.
-string(REGEX REPLACE "[^\n]* (typeinfo name for |typeinfo for |vtable for )?corvexa::(Error|Replica|ClassDef|AttributeDef|Model|Instances|Instance)(::|\n)[^\n]*" "" remaining "${symbols}")
+string(REGEX REPLACE "[^\n]* (typeinfo name for |typeinfo for |vtable for )?corvexa::(Error|Replica|ClassDef|AttributeDef|Model|Instances|Instance|Columns)(::|\n)[^\n]*" "" remaining "${symbols}")
 # Standard-library templates instantiated over those classes are exported with them.
 string(REGEX REPLACE "[^\n]* [TWV] ([^ \n]+ )?std::[^\n]*" "" remaining "${remaining}")
 string(REGEX MATCHALL "[^\n]*(corvexa::|ReplicaStubs)[^\n]*" internals "${remaining}")

@@ -153,6 +153,8 @@ TEST(ModernValues, MisusesThrowNamingWhat)
        }},
       {"corvexa::Replica::name", [&] { (void)Replica().name(); }},
       {"corvexa::Model::create", [&] { (void)Model().create(); }},
+      {"the type 9 is not a corvexa::Type",
+       [&] { s.replica.define(ClassSpec("Odd").attribute("x", static_cast<Type>(9))); }},
   };
   for (const auto& [fragment, misuse] : cases) {
     SCOPED_TRACE(fragment);
@@ -263,6 +265,33 @@ TEST(ModernDocuments, FilesStringsLookupsAndStates)
   std::remove((dir + "/modern.bin").c_str());
   std::remove((dir + "/modern.xml").c_str());
   std::remove((dir + "/modern.xsd").c_str());
+}
+
+TEST(ModernColumns, BatchesWriteAndReadByType)
+{
+  Sample s;
+  const std::string nul("a\0b", 3);
+  Columns batch(2);
+  const std::size_t i = batch.add_column("i", Type::integer), ss = batch.add_column("ss", Type::text, true),
+                    t = batch.add_column("t", Type::date), r = batch.add_column("r", Type::reference);
+  batch.set(i, 0, INT_MIN);
+  batch.set(ss, 0, std::vector<std::string>{"x", nul});
+  batch.set(t, 1, Ms(-1));
+  batch.set(r, 1, s.a);
+  batch.create_in(s.model);
+  Columns read;
+  for (const char* name : {"i", "ss", "t", "r"}) read.add_column(name);
+  read.read(s.model);
+  ASSERT_EQ(4u, read.rows());
+  EXPECT_EQ(INT_MIN, read.get<int>(i, 2));
+  EXPECT_EQ((std::vector<std::string>{"x", nul}), read.get<std::vector<std::string>>(ss, 2));
+  EXPECT_EQ(Ms(-1), read.get<time_point>(t, 3));
+  EXPECT_EQ(s.a, *read.try_get<Instance>(r, 3));
+  EXPECT_FALSE(read.try_get<int>(i, 3).has_value());
+  for (const auto& misuse :
+       std::vector<std::function<void()>>{[&] { (void)read.get<int>(i, 3); }, [&] { (void)read.get<double>(i, 2); },
+                                          [&] { batch.set(i, 9, 1); }, [&] { batch.set(i, 0, 1.5); }})
+    EXPECT_THROW(misuse(), Error);
 }
 
 TEST(ModernExchange, ReplicaToJavaAndBack)

@@ -580,6 +580,8 @@ ClassHandle Replica::define(const ClassSpec& spec)
   Check(cls.GetAttributes(list), operation, name);
   for (const AttributeSpec& a : spec.attributes()) {
     const std::string named = spec.name() + "." + a.name();
+    if (a.type() < Type::integer || a.type() > Type::reference)
+      Refuse(operation, named, "the type " + std::to_string(static_cast<int>(a.type())) + " is not a corvexa::Type");
     VLXKDMAttributeDef def;
     Check(def.Build(Text(a.name()), ProxyType(a.type())), operation, named);
     if (a.is_multi_valued()) Check(def.SetMultiValuation(1), operation, named);

@@ -10,12 +10,13 @@
 
 namespace corvexa {
 // The handles under names of their own: the binding table's slots, declared next in the same
-// namespace, hide the class names Instance, Model, Replica, ClassDef and AttributeDef.
+// namespace, hide the class names Instance, Model, Replica, ClassDef, AttributeDef and Columns.
 using InstanceHandle = Instance;
 using ModelHandle = Model;
 using ReplicaHandle = Replica;
 using ClassHandle = ClassDef;
 using AttributeHandle = AttributeDef;
+using ColumnsHandle = Columns;
 }  // namespace corvexa
 
 #include "CallFrame.h"

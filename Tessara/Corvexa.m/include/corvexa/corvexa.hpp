@@ -184,6 +184,7 @@ class CORVEXA_API Instance {
 
   friend class Model;
   friend class Instances;
+  friend class Columns;
   mutable VLXKDMInstance _proxy;
 };
 
@@ -294,6 +295,7 @@ class CORVEXA_API Model {
   std::vector<Instance> select_value(std::string_view attribute, const Value& value, bool with_subclasses) const;
 
   friend class Replica;
+  friend class Columns;
   mutable VLXKDMModel _proxy;
 };
 
@@ -364,3 +366,5 @@ class CORVEXA_API Replica {
 };
 
 }  // namespace corvexa
+
+#include "corvexa/columns.hpp"
