@@ -41,12 +41,6 @@ void FromList(const List& list, std::vector<Out>& out, Convert convert)
   for (const auto& v : list) out.push_back(convert(v));
 }
 
-VLXBinary Binary(const bytes& b) { return VLXBinary(b.data(), static_cast<int>(b.size())); }
-bytes Bytes(const VLXBinary& b)
-{
-  const auto* begin = reinterpret_cast<const std::byte*>(b.getData());
-  return bytes(begin, begin + b.getLength());
-}
 VLXListValVLXKDMInstance Proxies(const std::vector<InstanceHandle>& instances, const char* operation)
 {
   VLXListValVLXKDMInstance out(static_cast<int>(instances.size()));
@@ -106,7 +100,7 @@ std::size_t Columns::add_column(std::string_view attribute)
 CORVEXA_SET(int, SetInteger(c, r, value))
 CORVEXA_SET(double, SetDouble(c, r, value))
 CORVEXA_SET(bool, SetBoolean(c, r, value ? 1 : 0))
-CORVEXA_SET(std::string_view, SetText(c, r, value.data(), static_cast<int>(value.size())))
+CORVEXA_SET(std::string_view, SetText(c, r, value.data(), Length(value.size())))
 CORVEXA_SET(time_point,
             SetMilliseconds(c, r, std::chrono::floor<std::chrono::milliseconds>(value.time_since_epoch()).count()))
 CORVEXA_SET(const bytes&, SetBinary(c, r, Binary(value)))
@@ -116,7 +110,8 @@ CORVEXA_SET(const std::vector<bool>&,
             SetBooleans(c, r, ListOf<VLXListValVLXBoolean>(value, [](bool v) { return VLXBoolean(v ? 1 : 0); })))
 CORVEXA_SET(const std::vector<std::string>&,
             SetTexts(c, r, ListOf<VLXListValVLXUnicodeString>(value, [](const std::string& v) { return Text(v); })))
-CORVEXA_SET(const std::vector<bytes>&, SetBinaries(c, r, ListOf<VLXListValVLXBinary>(value, Binary)))
+CORVEXA_SET(const std::vector<bytes>&,
+            SetBinaries(c, r, ListOf<VLXListValVLXBinary>(value, [](const bytes& v) { return Binary(v); })))
 CORVEXA_SET(const std::vector<InstanceHandle>&, SetInstances(c, r, Proxies(value, "corvexa::Columns::set")))
 #undef CORVEXA_SET
 
@@ -180,7 +175,8 @@ CORVEXA_FETCH(std::vector<bool>, VLXListValVLXBoolean, GetBooleans,
               FromList(read, value, [](VLXBoolean v) { return v != 0; }))
 CORVEXA_FETCH(std::vector<std::string>, VLXListValVLXUnicodeString, GetTexts,
               FromList(read, value, [](const VLXUnicodeString& v) { return Text(v); }))
-CORVEXA_FETCH(std::vector<bytes>, VLXListValVLXBinary, GetBinaries, FromList(read, value, Bytes))
+CORVEXA_FETCH(std::vector<bytes>, VLXListValVLXBinary, GetBinaries,
+              FromList(read, value, [](const VLXBinary& v) { return Bytes(v); }))
 CORVEXA_FETCH(std::vector<InstanceHandle>, VLXListValVLXKDMInstance, GetInstances,
               FromList(read, value, [](const VLXKDMInstance& v) { return InstanceHandle(v); }))
 #undef CORVEXA_FETCH

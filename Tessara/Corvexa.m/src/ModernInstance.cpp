@@ -340,8 +340,7 @@ void Instance::set(std::string_view attribute, time_point value)
 }
 void Instance::set(std::string_view attribute, const bytes& value)
 {
-  Write(_proxy, attribute, AsJava(VLXBinary(value.data(), static_cast<int>(value.size()))),
-        "corvexa::Instance::set(bytes)");
+  Write(_proxy, attribute, AsJava(Binary(value)), "corvexa::Instance::set(bytes)");
 }
 void Instance::set(std::string_view attribute, const InstanceHandle& value)
 {
@@ -352,13 +351,13 @@ void Instance::set(std::string_view attribute, const InstanceHandle& value)
 void Instance::set(std::string_view attribute, const std::vector<int>& values)
 {
   VLXRawCollint list;
-  list.Assign(values.data(), static_cast<int>(values.size()));
+  list.Assign(values.data(), Length(values.size()));
   Write(_proxy, attribute, AsJava(list), "corvexa::Instance::set(std::vector<int>)");
 }
 void Instance::set(std::string_view attribute, const std::vector<double>& values)
 {
   VLXRawColldouble list;
-  list.Assign(values.data(), static_cast<int>(values.size()));
+  list.Assign(values.data(), Length(values.size()));
   Write(_proxy, attribute, AsJava(list), "corvexa::Instance::set(std::vector<double>)");
 }
 void Instance::set(std::string_view attribute, const std::vector<bool>& values)
@@ -380,7 +379,7 @@ void Instance::set(std::string_view attribute, const std::vector<time_point>& va
 void Instance::set(std::string_view attribute, const std::vector<bytes>& values)
 {
   VLXListValVLXBinary list(static_cast<int>(values.size()));
-  for (const bytes& v : values) list.Append(VLXBinary(v.data(), static_cast<int>(v.size())));
+  for (const bytes& v : values) list.Append(Binary(v));
   Write(_proxy, attribute, AsJava(list), "corvexa::Instance::set(std::vector<bytes>)");
 }
 void Instance::set(std::string_view attribute, const std::vector<InstanceHandle>& values)
@@ -423,10 +422,7 @@ std::optional<bytes> Instance::bytes_id() const
 
 void Instance::set_id(std::string_view id) { Check(_proxy.SetID(Text(id)), "corvexa::Instance::set_id", id); }
 
-void Instance::set_id(const bytes& id)
-{
-  Check(_proxy.SetID(VLXBinary(id.data(), static_cast<int>(id.size()))), "corvexa::Instance::set_id(bytes)");
-}
+void Instance::set_id(const bytes& id) { Check(_proxy.SetID(Binary(id)), "corvexa::Instance::set_id(bytes)"); }
 
 #define CORVEXA_STATE(member, Getter)                           \
   bool Instance::member() const                                 \

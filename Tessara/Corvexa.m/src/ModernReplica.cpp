@@ -278,7 +278,6 @@ std::optional<InstanceHandle> Find(Owner& owner, const Id& id, const char* opera
   return InstanceHandle(found);
 }
 
-VLXBinary Binary(const bytes& data) { return VLXBinary(data.data(), static_cast<int>(data.size())); }
 VLXBoolean Platform(bool v) { return v ? 1 : 0; }
 VLXUnicodeString Platform(const std::string& v) { return Text(v); }
 VLXBinary Platform(const bytes& v) { return Binary(v); }
@@ -400,12 +399,6 @@ bytes ReadWhole(const std::string& path, const char* operation)
   if (in.bad()) Refuse(operation, path, "cannot read '" + path + "'");
   const auto* begin = reinterpret_cast<const std::byte*>(chars.data());
   return bytes(begin, begin + chars.size());
-}
-
-bytes Bytes(const VLXBinary& data)
-{
-  const auto* begin = reinterpret_cast<const std::byte*>(data.getData());
-  return bytes(begin, begin + data.getLength());
 }
 
 }  // namespace

@@ -2,6 +2,7 @@
 // checks that turn a failed operation into corvexa::Error, and the call frame.
 #pragma once
 
+#include <climits>
 #include <string>
 #include <string_view>
 
@@ -23,13 +24,26 @@ using ColumnsHandle = Columns;
 
 namespace corvexa {
 
-inline VLXUnicodeString Text(std::string_view text)
+// Records the refusal of an argument as the thread's last error and throws it.
+[[noreturn]] void Refuse(const char* operation, std::string_view argument, const std::string& why);
+
+// A count of bytes or values as the platform's int; beyond it (2 GiB) the value is refused.
+inline int Length(std::size_t count)
 {
-  return VLXUnicodeString(text.data(), static_cast<int>(text.size()));
+  if (count > static_cast<std::size_t>(INT_MAX))
+    Refuse("corvexa", {}, std::to_string(count) + " bytes or values are more than one value may hold");
+  return static_cast<int>(count);
 }
+inline VLXUnicodeString Text(std::string_view text) { return VLXUnicodeString(text.data(), Length(text.size())); }
 inline std::string Text(const VLXUnicodeString& text)
 {
   return std::string(text.c_str(), static_cast<std::size_t>(text.GetLengthInByte()));
+}
+inline VLXBinary Binary(const bytes& data) { return VLXBinary(data.data(), Length(data.size())); }
+inline bytes Bytes(const VLXBinary& data)
+{
+  const auto* begin = reinterpret_cast<const std::byte*>(data.getData());
+  return bytes(begin, begin + data.getLength());
 }
 
 // Throws the Error of a failed operation: its code, and the last error the operation recorded.
@@ -45,7 +59,5 @@ inline void Check(long code, const char* operation, std::string_view argument)
 {
   if (code < 0) Throw(code, Named(operation, argument));
 }
-// Records the refusal of an argument as the thread's last error and throws it.
-[[noreturn]] void Refuse(const char* operation, std::string_view argument, const std::string& why);
 
 }  // namespace corvexa
