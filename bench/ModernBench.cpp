@@ -113,11 +113,12 @@ void PrintModernSummary(const SummaryReporter& reporter)
   const std::pair<const char*, const char*> rows[] = {
       {"ModernGetInt", "get<int>"}, {"ModernSetInt", "set(int)"}, {"ModernIterate", "iteration"}};
   for (const auto& [key, what] : rows) {
-    const double modern = reporter.Nanoseconds(std::string(key) + "/modern").real,
-                 proxy = reporter.Nanoseconds(std::string(key) + "/proxy").real;
-    if (modern > 0 && proxy > 0)
-      std::printf("modern %s over %d instances: %s, the proxy API %s; target at most 1.1x: %sx\n", what, gModern->count,
-                  Figure(modern).c_str(), Figure(proxy).c_str(), Ratio(modern, proxy).c_str());
+    const SummaryReporter::Times modern = reporter.Nanoseconds(std::string(key) + "/modern"),
+                                 proxy = reporter.Nanoseconds(std::string(key) + "/proxy");
+    if (modern.real > 0 && proxy.real > 0)
+      std::printf("modern %s over %d instances: %s, the proxy API %s (thread CPU time %sx); target at most 1.1x: %sx\n",
+                  what, gModern->count, Figure(modern.real).c_str(), Figure(proxy.real).c_str(),
+                  Ratio(modern.cpu, proxy.cpu).c_str(), Ratio(modern.real, proxy.real).c_str());
   }
 }
 
