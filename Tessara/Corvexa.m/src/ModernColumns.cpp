@@ -133,7 +133,11 @@ void Columns::write_to(const std::vector<InstanceHandle>& instances)
   Check(_batch->SetValues(Proxies(instances, "corvexa::Columns::write_to")), "corvexa::Columns::write_to");
 }
 
-void Columns::read(const ModelHandle& model) { Check(_batch->GetValues(model._proxy), "corvexa::Columns::read"); }
+void Columns::read(const ModelHandle& model)
+{
+  VLXKDMModel proxy(model._proxy);  // VLXKDMColumns takes a model it could change
+  Check(_batch->GetValues(proxy), "corvexa::Columns::read");
+}
 
 void Columns::read(const std::vector<InstanceHandle>& instances)
 {

@@ -256,7 +256,7 @@ struct ArgOf<MillisList> {
 namespace {
 
 template <class T>
-bool Read(VLXKDMInstance& proxy, std::string_view attribute, T& value, const char* operation, const char* wanted)
+bool Read(const VLXKDMInstance& proxy, std::string_view attribute, T& value, const char* operation, const char* wanted)
 {
   Typed<T> out{value, operation, attribute, wanted};
   Check(Call(proxy, operation, slot<Instance_getValueNamed>).with(Text(attribute)).returning(out), operation,

@@ -161,7 +161,7 @@ bool ClassDef::is_abstract() const
 
 namespace {
 
-void AppendOwn(VLXKDMClassDef& cls, std::vector<AttributeHandle>& out, const char* operation)
+void AppendOwn(const VLXKDMClassDef& cls, std::vector<AttributeHandle>& out, const char* operation)
 {
   VLXKDMAttributeDefList list;
   Check(cls.GetAttributes(list), operation);

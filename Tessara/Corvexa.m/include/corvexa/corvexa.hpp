@@ -67,7 +67,7 @@ class CORVEXA_API AttributeDef {
   [[nodiscard]] const VLXKDMAttributeDef& proxy() const { return _proxy; }
 
  private:
-  mutable VLXKDMAttributeDef _proxy;
+  VLXKDMAttributeDef _proxy;
 };
 
 // A class definition. A class reached through a replica lists its layout: the attributes it
@@ -92,7 +92,8 @@ class CORVEXA_API ClassDef {
   [[nodiscard]] const VLXKDMClassDef& proxy() const { return _proxy; }
 
  private:
-  mutable VLXKDMClassDef _proxy;
+  VLXKDMClassDef _proxy;
+  // For the super classes; its getters are not const.
   mutable VLXKDMReplica _replica;
 };
 
@@ -185,7 +186,7 @@ class CORVEXA_API Instance {
   friend class Model;
   friend class Instances;
   friend class Columns;
-  mutable VLXKDMInstance _proxy;
+  VLXKDMInstance _proxy;
 };
 
 // The live instances of a model, in creation order. Positions count from 0.
@@ -237,7 +238,7 @@ class CORVEXA_API Instances {
   [[nodiscard]] const VLXKDMInstanceSet& proxy() const { return _proxy; }
 
  private:
-  mutable VLXKDMInstanceSet _proxy;
+  VLXKDMInstanceSet _proxy;
   std::size_t _size = 0;
 };
 
@@ -296,7 +297,7 @@ class CORVEXA_API Model {
 
   friend class Replica;
   friend class Columns;
-  mutable VLXKDMModel _proxy;
+  VLXKDMModel _proxy;
 };
 
 // A replica: a schema (classes) and its data (one model per class).
@@ -362,6 +363,7 @@ class CORVEXA_API Replica {
   [[nodiscard]] const VLXKDMReplica& proxy() const { return _proxy; }
 
  private:
+  // The replica proxy's getters are not const.
   mutable VLXKDMReplica _proxy;
 };
 
