@@ -35,7 +35,8 @@
 namespace corvexa {
 
 // A date: milliseconds since 1970-01-01 00:00 UTC, as the replica keeps them (finer parts of a
-// time point are dropped, toward the past).
+// time point are dropped, toward the past). A time_point spans about 292 years either side of
+// 1970: reading a date beyond that throws.
 using time_point = std::chrono::system_clock::time_point;
 // A binary value.
 using bytes = std::vector<std::byte>;
