@@ -39,6 +39,7 @@
 #include "BenchJava.h"
 #include "BenchReport.h"
 #include "DataBench.h"
+#include "ModernBench.h"
 #include "HandStrings.h"
 #include "JniCallCounter.h"
 #include "VLXBinary.h"
@@ -716,12 +717,14 @@ bool ParseOption(const char* arg, const char* name, int& value)
 int main(int argc, char** argv)
 {
   benchmark::Initialize(&argc, argv);
+  int modernInstances = 100000;
   int kept = 1;
   for (int i = 1; i < argc; ++i) {
     if (ParseOption(argv[i], "--fill_instances", gOptions.fillInstances) ||
         ParseOption(argv[i], "--fill_iterations", gOptions.fillIterations) ||
         ParseOption(argv[i], "--lookup_instances", gOptions.lookupInstances) ||
         ParseOption(argv[i], "--bulk_instances", gOptions.bulkInstances) ||
+        ParseOption(argv[i], "--modern_instances", modernInstances) ||
         ParseOption(argv[i], "--warmup_calls", gOptions.warmupCalls))
       continue;
     argv[kept++] = argv[i];
@@ -747,7 +750,8 @@ int main(int argc, char** argv)
   std::string why;
   if (!SetUp(*world, why) || !FillsAgree(*world, why) ||
       !RegisterDataBenchmarks(world->env, {gOptions.lookupInstances, gOptions.bulkInstances, gOptions.fillIterations},
-                              why)) {
+                              why) ||
+      !RegisterModernBenchmarks(modernInstances, why)) {
     std::fprintf(stderr, "corvexa-bench: set-up failed: %s\n", why.c_str());
     TearDown(*world);
     return 1;
@@ -808,7 +812,9 @@ int main(int argc, char** argv)
   benchmark::RunSpecifiedBenchmarks(&reporter);
   PrintSummary(reporter, allocations, fillAllocations);
   PrintDataSummary(reporter);
+  PrintModernSummary(reporter);
   benchmark::Shutdown();
+  ReleaseModernBenchmarks();
   ReleaseDataBenchmarks(world->env);
   TearDown(*world);
   return 0;

@@ -144,7 +144,7 @@ bool Matches(const std::string& expected, const std::string& actual)
 
 // An enumeration getter's answer written into out.
 template <class P, class E>
-long AsNumber(P& proxy, long (P::*get)(E&), int& out)
+long AsNumber(const P& proxy, long (P::*get)(E&) const, int& out)
 {
   E value = E();
   const long rc = (proxy.*get)(value);

@@ -19,3 +19,13 @@ endif()
 run(${CMAKE_COMMAND} -S ${SOURCE_DIR} -B ${work}/build -DCMAKE_PREFIX_PATH=${work}/moved ${consumer_flags})
 run(${CMAKE_COMMAND} --build ${work}/build)
 run(${work}/build/consumer)
+# The modern interface's program, in a folder of its own with the installed sample data.
+set(data ${work}/moved/share/corvexa/examples)
+file(COPY ${data}/inventory.xml ${data}/inventory.xsd DESTINATION ${work}/run)
+execute_process(COMMAND ${work}/build/inventory WORKING_DIRECTORY ${work}/run
+                RESULT_VARIABLE rc OUTPUT_VARIABLE out ERROR_VARIABLE err)
+message(STATUS "${out}${err}")
+if(NOT rc EQUAL 0 OR NOT out MATCHES "Bolt: number quantity weight tags photo supplier diameter stainless lengths\n"
+   OR NOT out MATCHES "\n3 parts\n$" OR NOT EXISTS ${work}/run/inventory.bin)
+  message(FATAL_ERROR "the installed program failed (${rc})")
+endif()

@@ -265,6 +265,32 @@ TEST(BaseUnknown, TheLastReleaseDeletesEvenUnderConcurrentAddRefAndRelease)
   EXPECT_EQ(copy.GetRefCount() + assigned.GetRefCount(), 2u);
 }
 
+TEST(BaseUnknown, ReleaseFreesOnlyWhatNewMade)
+{
+  g_destroyed = 0;
+  struct Holder {
+    shapes::Counted inside;
+  };
+  {
+    shapes::Counted onStack;
+    auto* held = new Holder;  // the standard new: a member is never freed by Release
+    shapes::Counted* made = new shapes::Counted;
+    shapes::Counted copy(*made);
+    void* same = nullptr;
+    for (VLXBaseUnknown* object : {static_cast<VLXBaseUnknown*>(&onStack), static_cast<VLXBaseUnknown*>(&copy),
+                                   static_cast<VLXBaseUnknown*>(&held->inside)}) {
+      EXPECT_EQ(VLX_S_OK, object->QueryInterface(IID_VLXBaseUnknown, &same));
+      EXPECT_EQ(1u, object->Release());
+      EXPECT_EQ(0u, object->Release());
+    }
+    EXPECT_EQ(0, g_destroyed);
+    EXPECT_EQ(0u, made->Release());
+    EXPECT_EQ(1, g_destroyed);
+    delete held;
+  }
+  EXPECT_EQ(4, g_destroyed);
+}
+
 TEST(BaseUnknown, ClassNamesAndInterfacesComeFromTheDynamicType)
 {
   shapes::Derived object;

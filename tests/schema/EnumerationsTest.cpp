@@ -11,7 +11,7 @@ const char* const kNullClassDef = "com/velmora/tessara/testdoubles/NullSchema$Cl
 
 // Sets each enumerator through the setter and reads it back through the getter.
 template <class E, class Proxy>
-void RoundTrip(Proxy& proxy, int count, long (Proxy::*set)(E), long (Proxy::*get)(E&))
+void RoundTrip(Proxy& proxy, int count, long (Proxy::*set)(E), long (Proxy::*get)(E&) const)
 {
   for (int value = 0; value < count; ++value) {
     SCOPED_TRACE(value);
@@ -53,7 +53,7 @@ TEST(Enumerations, EveryEnumeratorCrossesBothWays)
 
 // Answers a getter writes into a sentinel.
 template <class E, class Proxy>
-int Got(Proxy& proxy, long (Proxy::*get)(E&), int sentinel)
+int Got(Proxy& proxy, long (Proxy::*get)(E&) const, int sentinel)
 {
   E value = static_cast<E>(sentinel);
   EXPECT_EQ(VLX_S_OK, (proxy.*get)(value));

@@ -4,8 +4,8 @@
 // - a class-level allocator: `new` on a derived class never throws; it yields null when memory
 //   cannot be obtained (the constructor then does not run);
 // - a thread-safe reference count that starts at 1. An object made with `new` is freed by the
-//   Release() that brings the count to 0; an object on the stack or inside another object is never
-//   Released;
+//   Release() that brings the count to 0; an object on the stack, static, or inside another object
+//   (a proxy held by value) is never freed by Release, which then only counts;
 // - a small introspection interface over the C++ run-time type information. Objects carry no
 //   scripting type information: GetTypeInfo, GetIDsOfNames and Invoke answer VLX_E_NOTIMPL.
 //
@@ -35,7 +35,9 @@ extern const VLXIID IID_VLXBaseUnknown;
 
 class VLXBaseUnknown {
  public:
-  VLXBaseUnknown() = default;
+  // Notes whether the object is being made by this class's `new` (only such an object is freed by
+  // Release).
+  VLXBaseUnknown();
   // A copy has its own reference count (1); the implementation pointer and component state are copied.
   VLXBaseUnknown(const VLXBaseUnknown& other);
   // Copies the implementation pointer and component state; the reference count is left alone.
@@ -54,7 +56,8 @@ class VLXBaseUnknown {
   virtual long QueryInterface(const VLXIID& iid, void** object);
   // Adds a reference; returns the new count.
   virtual unsigned long AddRef();
-  // Drops a reference; deletes the object when the count reaches 0. Returns the new count.
+  // Drops a reference; deletes an object made with `new` when the count reaches 0. Returns the new
+  // count.
   virtual unsigned long Release();
   // Writes 0 (no type information) and returns VLX_S_OK; VLX_E_INVALIDARG for a null `count`.
   virtual long GetTypeInfoCount(unsigned int* count);
@@ -97,6 +100,7 @@ class VLXBaseUnknown {
   std::atomic<unsigned long> _refCount{1};
   void* _impl = nullptr;
   int _componentState = 0;
+  bool _madeByNew = false;
 };
 
 #endif

@@ -89,6 +89,15 @@ class VLXList {
   // The number of elements the current storage can hold without growing (0: no storage).
   int Capacity() const { return static_cast<int>(_items.capacity()); }
 
+  // The elements in order, for range-for and the standard algorithms (operator[] keeps counting
+  // from 1).
+  typedef typename std::vector<T>::iterator iterator;
+  typedef typename std::vector<T>::const_iterator const_iterator;
+  iterator begin() { return _items.begin(); }
+  iterator end() { return _items.end(); }
+  const_iterator begin() const { return _items.begin(); }
+  const_iterator end() const { return _items.end(); }
+
   int operator==(const VLXList& other) const { return this == &other || _items == other._items; }
   int operator!=(const VLXList& other) const { return !(*this == other); }
 

@@ -39,7 +39,33 @@ bool IsKindOf(const std::type_info& type, const char* name)
 }
 }  // namespace
 
-VLXBaseUnknown::VLXBaseUnknown(const VLXBaseUnknown& other) : _impl(other._impl), _componentState(other._componentState)
+namespace {
+// The block the calling thread's last class `new` returned, until the object made in it claims it.
+thread_local const char* t_newBlock = nullptr;
+thread_local std::size_t t_newSize = 0;
+
+void* Allocated(std::size_t size)
+{
+  void* memory = std::malloc(size != 0 ? size : 1);
+  t_newBlock = static_cast<const char*>(memory);
+  t_newSize = size;
+  return memory;
+}
+
+// Whether object lies in the block of the last class `new` (then claimed: a later object is not).
+bool Claim(const void* object)
+{
+  const char* at = static_cast<const char*>(object);
+  if (t_newBlock == nullptr || at < t_newBlock || at >= t_newBlock + t_newSize) return false;
+  t_newBlock = nullptr;
+  return true;
+}
+}  // namespace
+
+VLXBaseUnknown::VLXBaseUnknown() : _madeByNew(Claim(this)) {}
+
+VLXBaseUnknown::VLXBaseUnknown(const VLXBaseUnknown& other)
+    : _impl(other._impl), _componentState(other._componentState), _madeByNew(Claim(this))
 {
 }
 
@@ -52,12 +78,9 @@ VLXBaseUnknown& VLXBaseUnknown::operator=(const VLXBaseUnknown& other)
 
 VLXBaseUnknown::~VLXBaseUnknown() = default;
 
-void* VLXBaseUnknown::operator new(std::size_t size) noexcept { return std::malloc(size != 0 ? size : 1); }
+void* VLXBaseUnknown::operator new(std::size_t size) noexcept { return Allocated(size); }
 
-void* VLXBaseUnknown::operator new(std::size_t size, const std::nothrow_t&) noexcept
-{
-  return std::malloc(size != 0 ? size : 1);
-}
+void* VLXBaseUnknown::operator new(std::size_t size, const std::nothrow_t&) noexcept { return Allocated(size); }
 
 void VLXBaseUnknown::operator delete(void* memory) noexcept { std::free(memory); }
 
@@ -80,7 +103,7 @@ unsigned long VLXBaseUnknown::AddRef() { return _refCount.fetch_add(1, std::memo
 unsigned long VLXBaseUnknown::Release()
 {
   const unsigned long count = _refCount.fetch_sub(1, std::memory_order_acq_rel) - 1;
-  if (count == 0) delete this;
+  if (count == 0 && _madeByNew) delete this;
   return count;
 }
 

@@ -11,13 +11,13 @@ class CORVEXA_API VLXKDMAttributeDefList : public VLXKDMJavaObject {
   VLXKDM_PROXY_SPECIAL_MEMBERS(VLXKDMAttributeDefList)
 
  public:
-  long GetCount(int& count);
+  long GetCount(int& count) const;
   // Attaches item to the definition at position (from 0), or to the one named name.
-  long GetItem(int position, VLXKDMAttributeDef& item);
-  long GetItem(const VLXUnicodeString& name, VLXKDMAttributeDef& item);
-  long Includes(const VLXUnicodeString& name, VLXBoolean& included);
-  long IndexOf(const VLXKDMAttributeDef& item, int& position);
-  long IndexOf(const VLXUnicodeString& name, int& position);
+  long GetItem(int position, VLXKDMAttributeDef& item) const;
+  long GetItem(const VLXUnicodeString& name, VLXKDMAttributeDef& item) const;
+  long Includes(const VLXUnicodeString& name, VLXBoolean& included) const;
+  long IndexOf(const VLXKDMAttributeDef& item, int& position) const;
+  long IndexOf(const VLXUnicodeString& name, int& position) const;
   // Adds item (built with VLXKDMAttributeDef::Build) to the class.
   long Add(const VLXKDMAttributeDef& item);
   long Remove(const VLXKDMAttributeDef& item);

@@ -28,27 +28,27 @@ class CORVEXA_API VLXKDMInstance : public VLXKDMJavaObject {
 
  public:
   // Attaches classDef to the class of the instance.
-  long GetClassDef(VLXKDMClassDef& classDef);
+  long GetClassDef(VLXKDMClassDef& classDef) const;
 
   // The identifier. Without one: writes 1 into noID and nothing else. With a text: writes 0, 1 and
   // the text, leaving bytes alone. With bytes: writes 0, 0 and the bytes, leaving text alone. An
   // identifier of any other Java class fails (after writing 0 into noID) with a last error naming
   // that class.
-  long GetID(VLXBoolean& noID, VLXBoolean& isText, VLXUnicodeString& text, VLXBinary& bytes);
+  long GetID(VLXBoolean& noID, VLXBoolean& isText, VLXUnicodeString& text, VLXBinary& bytes) const;
   // Sets the identifier, a text or bytes; identifiers are unique among the live instances of a
   // model (a text never collides with bytes).
   long SetID(const VLXUnicodeString& id);
   long SetID(const VLXBinary& id);
 
   // The states: created since the last commit, modified since then, removed from its set.
-  long IsCreated(VLXBoolean& created);
-  long IsModified(VLXBoolean& modified);
-  long IsDeleted(VLXBoolean& deleted);
+  long IsCreated(VLXBoolean& created) const;
+  long IsModified(VLXBoolean& modified) const;
+  long IsDeleted(VLXBoolean& deleted) const;
 
   // Whether the attribute holds a value. A name that is not well-formed UTF-8 returns the
   // converter's own code, with no translation.
-  long IsValuated(const VLXUnicodeString& name, VLXBoolean& valuated);
-  long IsValuated(int position, VLXBoolean& valuated);
+  long IsValuated(const VLXUnicodeString& name, VLXBoolean& valuated) const;
+  long IsValuated(int position, VLXBoolean& valuated) const;
   // Removes the value of the attribute.
   long ClearValue(const VLXUnicodeString& name);
   long ClearValue(int position);
@@ -57,8 +57,8 @@ class CORVEXA_API VLXKDMInstance : public VLXKDMJavaObject {
   // attribute without value fails, since there is no Java object to read. Returns the result of
   // reading the value's local form. A name that is not well-formed UTF-8 returns the converter's
   // own code, with no translation, and leaves value untouched; a Java failure leaves it untouched.
-  long GetValue(const VLXUnicodeString& name, VLXKDMInstanceValue& value);
-  long GetValue(int position, VLXKDMInstanceValue& value);
+  long GetValue(const VLXUnicodeString& name, VLXKDMInstanceValue& value) const;
+  long GetValue(int position, VLXKDMInstanceValue& value) const;
   // Writes the attribute's value from value: first gives value its Java form (which it keeps),
   // then sends it. A value without type is a broken precondition, reported through VLXFatalError;
   // if the report returns, the operation fails without any Java call, leaving the attribute as it
@@ -78,6 +78,9 @@ class CORVEXA_API VLXKDMInstance : public VLXKDMJavaObject {
   long SetValue(int position, double value);
   long SetValue(const VLXUnicodeString& name, VLXBoolean value);
   long SetValue(int position, VLXBoolean value);
+  // A bool stores a Boolean, as a VLXBoolean does (without these, true would go as the int 1).
+  long SetValue(const VLXUnicodeString& name, bool value);
+  long SetValue(int position, bool value);
   long SetValue(const VLXUnicodeString& name, const VLXUnicodeString& value);
   long SetValue(int position, const VLXUnicodeString& value);
   long SetValue(const VLXUnicodeString& name, const VLXTime& value);
@@ -124,8 +127,8 @@ class CORVEXA_API VLXKDMInstance : public VLXKDMJavaObject {
   long SetValueStrings(int position, int count, ...);
 
   // A readable text form of the instance; with withValues (any non-zero byte), its values too.
-  long ToString(VLXUnicodeString& text);
-  long ToString(VLXBoolean withValues, VLXUnicodeString& text);
+  long ToString(VLXUnicodeString& text) const;
+  long ToString(VLXBoolean withValues, VLXUnicodeString& text) const;
 
  private:
   // Sends object, which the caller owns, as the attribute's new value. Every typed setter ends here.

@@ -11,10 +11,10 @@ class CORVEXA_API VLXKDMInstanceSet : public VLXKDMJavaObject {
   VLXKDM_PROXY_SPECIAL_MEMBERS(VLXKDMInstanceSet)
 
  public:
-  long GetCount(int& count);
+  long GetCount(int& count) const;
   // Attaches instance to the instance at position (from 0).
-  long GetItem(int position, VLXKDMInstance& instance);
-  long IndexOf(const VLXKDMInstance& instance, int& position);
+  long GetItem(int position, VLXKDMInstance& instance) const;
+  long IndexOf(const VLXKDMInstance& instance, int& position) const;
   // Removes an instance: it is marked deleted until the next commit (one created since the last
   // commit simply disappears), and so are the instances it holds by composition. Proxies attached
   // to removed instances stay attached.

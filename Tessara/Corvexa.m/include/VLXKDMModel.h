@@ -27,21 +27,21 @@ class CORVEXA_API VLXKDMModel : public VLXKDMJavaObject {
   // is in no replica.
   long CreateInstance(VLXKDMInstance& instance);
   // Attaches classDef to the class definition the model holds the data of.
-  long GetClassDef(VLXKDMClassDef& classDef);
+  long GetClassDef(VLXKDMClassDef& classDef) const;
   // Attaches instances to the model's own (live) instance set.
-  long GetInstances(VLXKDMInstanceSet& instances);
+  long GetInstances(VLXKDMInstanceSet& instances) const;
   // The live instance whose identifier is this text (or these bytes), through the model's
   // identifier index: as fast for a million instances as for ten. To an unbuilt proxy when no
   // instance has it.
-  long FindInstance(const VLXUnicodeString& id, VLXKDMInstance& instance);
-  long FindInstance(const VLXBinary& id, VLXKDMInstance& instance);
+  long FindInstance(const VLXUnicodeString& id, VLXKDMInstance& instance) const;
+  long FindInstance(const VLXBinary& id, VLXKDMInstance& instance) const;
   // The live instances of the model (with withSubclasses, also of its subclasses' models) whose
   // attribute holds a value equal to value, in one call: multi-valued ones element by element,
   // instances by identity; a value holder without type selects the instances without a value.
   long SelectInstances(const VLXUnicodeString& attribute, VLXKDMInstanceValue& value, VLXBoolean withSubclasses,
-                       VLXListValVLXKDMInstance& instances);
+                       VLXListValVLXKDMInstance& instances) const;
   // Attaches replica to the replica that holds the model; to nothing (not built) when it is in none.
-  long GetReplica(VLXKDMReplica& replica);
+  long GetReplica(VLXKDMReplica& replica) const;
   // A readable text form of the model.
-  long ToString(VLXUnicodeString& text);
+  long ToString(VLXUnicodeString& text) const;
 };

@@ -9,6 +9,9 @@
 // creation, release and comparison of references.
 #pragma once
 
+#include <cstddef>
+#include <iterator>
+
 #include "CorvexaExport.h"
 #include "VLXKDMInstance.h"
 #include "VLXRawCollPV.h"
@@ -40,6 +43,49 @@ class CORVEXA_API VLXListValVLXKDMInstance : public VLXCollecRoot {
   const VLXKDMInstance& operator[](int position) const;
 
   int Size() const;
+
+  // The elements in order, for range-for and the standard algorithms (operator[] keeps counting
+  // from 1).
+  template <class List, class Element>
+  class Iterator {
+   public:
+    using iterator_category = std::random_access_iterator_tag;
+    using value_type = VLXKDMInstance;
+    using difference_type = std::ptrdiff_t;
+    using pointer = Element*;
+    using reference = Element&;
+    Iterator() = default;
+    Iterator(List* list, int position) : _list(list), _position(position) {}
+    reference operator*() const { return (*_list)[_position]; }
+    pointer operator->() const { return &(*_list)[_position]; }
+    reference operator[](difference_type n) const { return (*_list)[_position + static_cast<int>(n)]; }
+    Iterator& operator++() { return ++_position, *this; }
+    Iterator operator++(int) { return Iterator(_list, _position++); }
+    Iterator& operator--() { return --_position, *this; }
+    Iterator operator--(int) { return Iterator(_list, _position--); }
+    Iterator& operator+=(difference_type n) { return _position += static_cast<int>(n), *this; }
+    Iterator& operator-=(difference_type n) { return _position -= static_cast<int>(n), *this; }
+    Iterator operator+(difference_type n) const { return Iterator(_list, _position + static_cast<int>(n)); }
+    Iterator operator-(difference_type n) const { return Iterator(_list, _position - static_cast<int>(n)); }
+    difference_type operator-(const Iterator& other) const { return _position - other._position; }
+    bool operator==(const Iterator& other) const { return _position == other._position; }
+    bool operator!=(const Iterator& other) const { return _position != other._position; }
+    bool operator<(const Iterator& other) const { return _position < other._position; }
+    bool operator>(const Iterator& other) const { return _position > other._position; }
+    bool operator<=(const Iterator& other) const { return _position <= other._position; }
+    bool operator>=(const Iterator& other) const { return _position >= other._position; }
+
+   private:
+    List* _list = nullptr;
+    int _position = 1;
+  };
+  typedef Iterator<VLXListValVLXKDMInstance, VLXKDMInstance> iterator;
+  typedef Iterator<const VLXListValVLXKDMInstance, const VLXKDMInstance> const_iterator;
+  iterator begin() { return iterator(this, 1); }
+  iterator end() { return iterator(this, Size() + 1); }
+  const_iterator begin() const { return const_iterator(this, 1); }
+  const_iterator end() const { return const_iterator(this, Size() + 1); }
+
   // Appends a copy of instance.
   void Append(const VLXKDMInstance& instance);
   // Writes the address of element i into pointers[i - 1], for every position. The addresses stay

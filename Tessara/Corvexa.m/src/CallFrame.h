@@ -127,6 +127,12 @@ class Call {
       : _self(&self), _name(name), _class(SlotCount), _target(Target::Handle)
   {
   }
+  // The same for an operation that changes nothing on the native side (a const getter): the proxy
+  // is only read, the Java call goes through its handle.
+  Call(const VLXKDMJavaObject& self, const char* name, SlotTag<S>)
+      : Call(const_cast<VLXKDMJavaObject&>(self), name, slot<S>)
+  {
+  }
   // A static method of the class in slot cls (CallStatic), or a constructor of that class whose new
   // object is attached to created (Construct).
   Call(const char* name, Slot cls, Target target, VLXKDMJavaObject* created)

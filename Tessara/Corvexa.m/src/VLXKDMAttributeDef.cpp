@@ -23,20 +23,20 @@ long VLXKDMAttributeDef::Build(const VLXUnicodeString& name, VLXKDMAttributeType
       .construct();
 }
 
-long VLXKDMAttributeDef::GetAttributeName(VLXUnicodeString& name)
+long VLXKDMAttributeDef::GetAttributeName(VLXUnicodeString& name) const
 {
   return Call(*this, "VLXKDMAttributeDef::GetAttributeName(VLXUnicodeString&)", slot<AttributeDef_getAttributeName>)
       .returning(name);
 }
 
-long VLXKDMAttributeDef::GetAttributeType(VLXKDMAttributeType::Type& type)
+long VLXKDMAttributeDef::GetAttributeType(VLXKDMAttributeType::Type& type) const
 {
   return Call(*this, "VLXKDMAttributeDef::GetAttributeType(VLXKDMAttributeType::Type&)",
               slot<AttributeDef_getAttributeType>)
       .returning(Enum(type));
 }
 
-long VLXKDMAttributeDef::GetUuid(VLXUnicodeString& uuid)
+long VLXKDMAttributeDef::GetUuid(VLXUnicodeString& uuid) const
 {
   return Call(*this, "VLXKDMAttributeDef::GetUuid(VLXUnicodeString&)", slot<AttributeDef_getUuid>).returning(uuid);
 }
@@ -48,7 +48,7 @@ long VLXKDMAttributeDef::SetUuid(const VLXUnicodeString& uuid)
       .run();
 }
 
-long VLXKDMAttributeDef::GetQKAComment(VLXUnicodeString& comment)
+long VLXKDMAttributeDef::GetQKAComment(VLXUnicodeString& comment) const
 {
   return Call(*this, "VLXKDMAttributeDef::GetQKAComment(VLXUnicodeString&)", slot<AttributeDef_getQKAComment>)
       .returning(comment);
@@ -62,7 +62,7 @@ long VLXKDMAttributeDef::SetQKAComment(const VLXUnicodeString& comment)
       .run();
 }
 
-long VLXKDMAttributeDef::GetTargetNames(VLXListOfVLXUnicodeString& names)
+long VLXKDMAttributeDef::GetTargetNames(VLXListOfVLXUnicodeString& names) const
 {
   return Call(*this, "VLXKDMAttributeDef::GetTargetNames(VLXListOfVLXUnicodeString&)",
               slot<AttributeDef_getTargetNames>)
@@ -84,7 +84,7 @@ long VLXKDMAttributeDef::SetTargetNames(int count, ...)
                      SetTargetNames);
 }
 
-long VLXKDMAttributeDef::GetTargetRefs(VLXListOfVLXUnicodeString& refs)
+long VLXKDMAttributeDef::GetTargetRefs(VLXListOfVLXUnicodeString& refs) const
 {
   return Call(*this, "VLXKDMAttributeDef::GetTargetRefs(VLXListOfVLXUnicodeString&)", slot<AttributeDef_getTargetRefs>)
       .returning(refs);
@@ -104,7 +104,7 @@ long VLXKDMAttributeDef::SetTargetRefs(int count, ...)
                      SetTargetRefs);
 }
 
-long VLXKDMAttributeDef::GetAggregationType(VLXKDMAggregationType::Type& type)
+long VLXKDMAttributeDef::GetAggregationType(VLXKDMAggregationType::Type& type) const
 {
   return Call(*this, "VLXKDMAttributeDef::GetAggregationType(VLXKDMAggregationType::Type&)",
               slot<AttributeDef_getAggregationType>)
@@ -119,7 +119,7 @@ long VLXKDMAttributeDef::SetAggregationType(VLXKDMAggregationType::Type type)
       .run();
 }
 
-long VLXKDMAttributeDef::GetAccessMode(VLXKDMAccessMode::Mode& mode)
+long VLXKDMAttributeDef::GetAccessMode(VLXKDMAccessMode::Mode& mode) const
 {
   return Call(*this, "VLXKDMAttributeDef::GetAccessMode(VLXKDMAccessMode::Mode&)", slot<AttributeDef_getAccessMode>)
       .returning(Enum(mode));
@@ -132,7 +132,7 @@ long VLXKDMAttributeDef::SetAccessMode(VLXKDMAccessMode::Mode mode)
       .run();
 }
 
-long VLXKDMAttributeDef::GetSoftwareVisibility(VLXKDMVisibility::Mode& visibility)
+long VLXKDMAttributeDef::GetSoftwareVisibility(VLXKDMVisibility::Mode& visibility) const
 {
   return Call(*this, "VLXKDMAttributeDef::GetSoftwareVisibility(VLXKDMVisibility::Mode&)",
               slot<AttributeDef_getSoftwareVisibility>)
@@ -147,7 +147,7 @@ long VLXKDMAttributeDef::SetSoftwareVisibility(VLXKDMVisibility::Mode visibility
       .run();
 }
 
-long VLXKDMAttributeDef::GetLength(int& length)
+long VLXKDMAttributeDef::GetLength(int& length) const
 {
   return Call(*this, "VLXKDMAttributeDef::GetLength(int&)", slot<AttributeDef_getLength>).returning(length);
 }
@@ -157,7 +157,7 @@ long VLXKDMAttributeDef::SetLength(int length)
   return Call(*this, "VLXKDMAttributeDef::SetLength(int)", slot<AttributeDef_setLength>).with(length).run();
 }
 
-long VLXKDMAttributeDef::IsMandatory(VLXBoolean& isMandatory)
+long VLXKDMAttributeDef::IsMandatory(VLXBoolean& isMandatory) const
 {
   return Call(*this, "VLXKDMAttributeDef::IsMandatory(VLXBoolean&)", slot<AttributeDef_isMandatory>)
       .returning(isMandatory);
@@ -170,7 +170,7 @@ long VLXKDMAttributeDef::SetMandatory(VLXBoolean isMandatory)
       .run();
 }
 
-long VLXKDMAttributeDef::IsMultiValuated(VLXBoolean& isMultiValuated)
+long VLXKDMAttributeDef::IsMultiValuated(VLXBoolean& isMultiValuated) const
 {
   return Call(*this, "VLXKDMAttributeDef::IsMultiValuated(VLXBoolean&)", slot<AttributeDef_isMultiValuated>)
       .returning(isMultiValuated);
@@ -183,7 +183,7 @@ long VLXKDMAttributeDef::SetMultiValuation(VLXBoolean isMultiValuated)
       .run();
 }
 
-long VLXKDMAttributeDef::IsUnique(VLXBoolean& isUnique)
+long VLXKDMAttributeDef::IsUnique(VLXBoolean& isUnique) const
 {
   return Call(*this, "VLXKDMAttributeDef::IsUnique(VLXBoolean&)", slot<AttributeDef_isUnique>).returning(isUnique);
 }
@@ -193,13 +193,13 @@ long VLXKDMAttributeDef::SetUnicity(VLXBoolean isUnique)
   return Call(*this, "VLXKDMAttributeDef::SetUnicity(VLXBoolean)", slot<AttributeDef_setUnicity>).with(isUnique).run();
 }
 
-long VLXKDMAttributeDef::GetClassDef(VLXKDMClassDef& classDef)
+long VLXKDMAttributeDef::GetClassDef(VLXKDMClassDef& classDef) const
 {
   return Call(*this, "VLXKDMAttributeDef::GetClassDef(VLXKDMClassDef&)", slot<AttributeDef_getClassDef>)
       .returning(classDef);
 }
 
-long VLXKDMAttributeDef::ToString(VLXUnicodeString& text)
+long VLXKDMAttributeDef::ToString(VLXUnicodeString& text) const
 {
   return Call(*this, "VLXKDMAttributeDef::ToString(VLXUnicodeString&)", slot<AttributeDef_toString>).returning(text);
 }

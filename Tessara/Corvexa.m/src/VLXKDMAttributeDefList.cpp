@@ -7,19 +7,19 @@ using namespace corvexa;
 
 VLXKDM_PROXY_DEFINITIONS(VLXKDMAttributeDefList, AttributeDefList)
 
-long VLXKDMAttributeDefList::GetCount(int& count)
+long VLXKDMAttributeDefList::GetCount(int& count) const
 {
   return Call(*this, "VLXKDMAttributeDefList::GetCount(int&)", slot<AttributeDefList_getCount>).returning(count);
 }
 
-long VLXKDMAttributeDefList::GetItem(int position, VLXKDMAttributeDef& item)
+long VLXKDMAttributeDefList::GetItem(int position, VLXKDMAttributeDef& item) const
 {
   return Call(*this, "VLXKDMAttributeDefList::GetItem(int, VLXKDMAttributeDef&)", slot<AttributeDefList_getItemAt>)
       .with(position)
       .returning(item);
 }
 
-long VLXKDMAttributeDefList::GetItem(const VLXUnicodeString& name, VLXKDMAttributeDef& item)
+long VLXKDMAttributeDefList::GetItem(const VLXUnicodeString& name, VLXKDMAttributeDef& item) const
 {
   return Call(*this, "VLXKDMAttributeDefList::GetItem(const VLXUnicodeString&, VLXKDMAttributeDef&)",
               slot<AttributeDefList_getItemNamed>)
@@ -27,7 +27,7 @@ long VLXKDMAttributeDefList::GetItem(const VLXUnicodeString& name, VLXKDMAttribu
       .returning(item);
 }
 
-long VLXKDMAttributeDefList::Includes(const VLXUnicodeString& name, VLXBoolean& included)
+long VLXKDMAttributeDefList::Includes(const VLXUnicodeString& name, VLXBoolean& included) const
 {
   return Call(*this, "VLXKDMAttributeDefList::Includes(const VLXUnicodeString&, VLXBoolean&)",
               slot<AttributeDefList_includes>)
@@ -35,14 +35,14 @@ long VLXKDMAttributeDefList::Includes(const VLXUnicodeString& name, VLXBoolean& 
       .returning(included);
 }
 
-long VLXKDMAttributeDefList::IndexOf(const VLXKDMAttributeDef& item, int& position)
+long VLXKDMAttributeDefList::IndexOf(const VLXKDMAttributeDef& item, int& position) const
 {
   return Call(*this, "VLXKDMAttributeDefList::IndexOf(const VLXKDMAttributeDef&, int&)", slot<AttributeDefList_indexOf>)
       .with(item)
       .returning(position);
 }
 
-long VLXKDMAttributeDefList::IndexOf(const VLXUnicodeString& name, int& position)
+long VLXKDMAttributeDefList::IndexOf(const VLXUnicodeString& name, int& position) const
 {
   return Call(*this, "VLXKDMAttributeDefList::IndexOf(const VLXUnicodeString&, int&)",
               slot<AttributeDefList_indexOfNamed>)

@@ -25,7 +25,7 @@ long VLXKDMClassDef::Build()
   return Construct(*this, "VLXKDMClassDef::Build()", ClassDef, slot<ClassDef_new>).construct();
 }
 
-long VLXKDMClassDef::GetClassName(VLXUnicodeString& name)
+long VLXKDMClassDef::GetClassName(VLXUnicodeString& name) const
 {
   return Call(*this, "VLXKDMClassDef::GetClassName(VLXUnicodeString&)", slot<ClassDef_getClassName>).returning(name);
 }
@@ -37,7 +37,7 @@ long VLXKDMClassDef::SetClassName(const VLXUnicodeString& name)
       .run();
 }
 
-long VLXKDMClassDef::GetSuperName(VLXUnicodeString& name)
+long VLXKDMClassDef::GetSuperName(VLXUnicodeString& name) const
 {
   return Call(*this, "VLXKDMClassDef::GetSuperName(VLXUnicodeString&)", slot<ClassDef_getSuperName>).returning(name);
 }
@@ -49,7 +49,7 @@ long VLXKDMClassDef::SetSuperName(const VLXUnicodeString& name)
       .run();
 }
 
-long VLXKDMClassDef::GetUuid(VLXUnicodeString& uuid)
+long VLXKDMClassDef::GetUuid(VLXUnicodeString& uuid) const
 {
   return Call(*this, "VLXKDMClassDef::GetUuid(VLXUnicodeString&)", slot<ClassDef_getUuid>).returning(uuid);
 }
@@ -59,7 +59,7 @@ long VLXKDMClassDef::SetUuid(const VLXUnicodeString& uuid)
   return Call(*this, "VLXKDMClassDef::SetUuid(const VLXUnicodeString&)", slot<ClassDef_setUuid>).with(uuid).run();
 }
 
-long VLXKDMClassDef::GetQKAComment(VLXUnicodeString& comment)
+long VLXKDMClassDef::GetQKAComment(VLXUnicodeString& comment) const
 {
   return Call(*this, "VLXKDMClassDef::GetQKAComment(VLXUnicodeString&)", slot<ClassDef_getQKAComment>)
       .returning(comment);
@@ -72,7 +72,7 @@ long VLXKDMClassDef::SetQKAComment(const VLXUnicodeString& comment)
       .run();
 }
 
-long VLXKDMClassDef::GetQKADerivability(VLXUnicodeString& derivability)
+long VLXKDMClassDef::GetQKADerivability(VLXUnicodeString& derivability) const
 {
   return Call(*this, "VLXKDMClassDef::GetQKADerivability(VLXUnicodeString&)", slot<ClassDef_getQKADerivability>)
       .returning(derivability);
@@ -85,7 +85,7 @@ long VLXKDMClassDef::SetQKADerivability(const VLXUnicodeString& derivability)
       .run();
 }
 
-long VLXKDMClassDef::GetScopeNames(VLXListOfVLXUnicodeString& names)
+long VLXKDMClassDef::GetScopeNames(VLXListOfVLXUnicodeString& names) const
 {
   return Call(*this, "VLXKDMClassDef::GetScopeNames(VLXListOfVLXUnicodeString&)", slot<ClassDef_getScopeNames>)
       .returning(names);
@@ -103,7 +103,7 @@ long VLXKDMClassDef::SetScopeNames(int count, ...)
   VLXKDM_GATHER_THEN(VLXListValVLXUnicodeString, GatherTexts, "VLXKDMClassDef::SetScopeNames(int, ...)", SetScopeNames);
 }
 
-long VLXKDMClassDef::IsAbstract(VLXBoolean& isAbstract)
+long VLXKDMClassDef::IsAbstract(VLXBoolean& isAbstract) const
 {
   return Call(*this, "VLXKDMClassDef::IsAbstract(VLXBoolean&)", slot<ClassDef_isAbstract>).returning(isAbstract);
 }
@@ -113,7 +113,7 @@ long VLXKDMClassDef::SetAbstract(VLXBoolean isAbstract)
   return Call(*this, "VLXKDMClassDef::SetAbstract(VLXBoolean)", slot<ClassDef_setAbstract>).with(isAbstract).run();
 }
 
-long VLXKDMClassDef::IsExtensible(VLXBoolean& isExtensible)
+long VLXKDMClassDef::IsExtensible(VLXBoolean& isExtensible) const
 {
   return Call(*this, "VLXKDMClassDef::IsExtensible(VLXBoolean&)", slot<ClassDef_isExtensible>).returning(isExtensible);
 }
@@ -125,7 +125,7 @@ long VLXKDMClassDef::SetExtensibility(VLXBoolean isExtensible)
       .run();
 }
 
-long VLXKDMClassDef::IsPersistent(VLXBoolean& isPersistent)
+long VLXKDMClassDef::IsPersistent(VLXBoolean& isPersistent) const
 {
   return Call(*this, "VLXKDMClassDef::IsPersistent(VLXBoolean&)", slot<ClassDef_isPersistent>).returning(isPersistent);
 }
@@ -137,7 +137,7 @@ long VLXKDMClassDef::SetPersistency(VLXBoolean isPersistent)
       .run();
 }
 
-long VLXKDMClassDef::GetClassType(VLXKDMClassType::Type& type)
+long VLXKDMClassDef::GetClassType(VLXKDMClassType::Type& type) const
 {
   return Call(*this, "VLXKDMClassDef::GetClassType(VLXKDMClassType::Type&)", slot<ClassDef_getClassType>)
       .returning(Enum(type));
@@ -150,7 +150,7 @@ long VLXKDMClassDef::SetClassType(VLXKDMClassType::Type type)
       .run();
 }
 
-long VLXKDMClassDef::GetSoftwareVisibility(VLXKDMVisibility::Mode& visibility)
+long VLXKDMClassDef::GetSoftwareVisibility(VLXKDMVisibility::Mode& visibility) const
 {
   return Call(*this, "VLXKDMClassDef::GetSoftwareVisibility(VLXKDMVisibility::Mode&)",
               slot<ClassDef_getSoftwareVisibility>)
@@ -165,13 +165,13 @@ long VLXKDMClassDef::SetSoftwareVisibility(VLXKDMVisibility::Mode visibility)
       .run();
 }
 
-long VLXKDMClassDef::GetAttributes(VLXKDMAttributeDefList& attributes)
+long VLXKDMClassDef::GetAttributes(VLXKDMAttributeDefList& attributes) const
 {
   return Call(*this, "VLXKDMClassDef::GetAttributes(VLXKDMAttributeDefList&)", slot<ClassDef_getAttributes>)
       .returning(attributes);
 }
 
-long VLXKDMClassDef::ToString(VLXUnicodeString& text)
+long VLXKDMClassDef::ToString(VLXUnicodeString& text) const
 {
   return Call(*this, "VLXKDMClassDef::ToString(VLXUnicodeString&)", slot<ClassDef_toString>).returning(text);
 }

@@ -64,7 +64,7 @@ struct ResultOf<IdentifierOut> {
 template <class Attribute>
 struct ValueOut {
   VLXKDMInstanceValue& value;
-  VLXKDMInstance& instance;
+  const VLXKDMInstance& instance;
   const Attribute& attribute;
   const char* operation;
 };
@@ -98,12 +98,12 @@ struct ResultOf<ValueOut<Attribute>> {
 
 VLXKDM_PROXY_DEFINITIONS(VLXKDMInstance, Instance)
 
-long VLXKDMInstance::GetClassDef(VLXKDMClassDef& classDef)
+long VLXKDMInstance::GetClassDef(VLXKDMClassDef& classDef) const
 {
   return Call(*this, "VLXKDMInstance::GetClassDef(VLXKDMClassDef&)", slot<Instance_getClassDef>).returning(classDef);
 }
 
-long VLXKDMInstance::GetID(VLXBoolean& noID, VLXBoolean& isText, VLXUnicodeString& text, VLXBinary& bytes)
+long VLXKDMInstance::GetID(VLXBoolean& noID, VLXBoolean& isText, VLXUnicodeString& text, VLXBinary& bytes) const
 {
   return Call(*this, "VLXKDMInstance::GetID(VLXBoolean&, VLXBoolean&, VLXUnicodeString&, VLXBinary&)",
               slot<Instance_getID>)
@@ -120,22 +120,22 @@ long VLXKDMInstance::SetID(const VLXBinary& id)
   return Call(*this, "VLXKDMInstance::SetID(const VLXBinary&)", slot<Instance_setID>).with(id).run();
 }
 
-long VLXKDMInstance::IsCreated(VLXBoolean& created)
+long VLXKDMInstance::IsCreated(VLXBoolean& created) const
 {
   return Call(*this, "VLXKDMInstance::IsCreated(VLXBoolean&)", slot<Instance_isCreated>).returning(created);
 }
 
-long VLXKDMInstance::IsModified(VLXBoolean& modified)
+long VLXKDMInstance::IsModified(VLXBoolean& modified) const
 {
   return Call(*this, "VLXKDMInstance::IsModified(VLXBoolean&)", slot<Instance_isModified>).returning(modified);
 }
 
-long VLXKDMInstance::IsDeleted(VLXBoolean& deleted)
+long VLXKDMInstance::IsDeleted(VLXBoolean& deleted) const
 {
   return Call(*this, "VLXKDMInstance::IsDeleted(VLXBoolean&)", slot<Instance_isDeleted>).returning(deleted);
 }
 
-long VLXKDMInstance::IsValuated(const VLXUnicodeString& name, VLXBoolean& valuated)
+long VLXKDMInstance::IsValuated(const VLXUnicodeString& name, VLXBoolean& valuated) const
 {
   return Call(*this, "VLXKDMInstance::IsValuated(const VLXUnicodeString&, VLXBoolean&)", slot<Instance_isValuatedNamed>)
       .rawConversionCode()
@@ -143,7 +143,7 @@ long VLXKDMInstance::IsValuated(const VLXUnicodeString& name, VLXBoolean& valuat
       .returning(valuated);
 }
 
-long VLXKDMInstance::IsValuated(int position, VLXBoolean& valuated)
+long VLXKDMInstance::IsValuated(int position, VLXBoolean& valuated) const
 {
   return Call(*this, "VLXKDMInstance::IsValuated(int, VLXBoolean&)", slot<Instance_isValuatedAt>)
       .with(position)
@@ -162,12 +162,12 @@ long VLXKDMInstance::ClearValue(int position)
   return Call(*this, "VLXKDMInstance::ClearValue(int)", slot<Instance_clearValueAt>).with(position).run();
 }
 
-long VLXKDMInstance::ToString(VLXUnicodeString& text)
+long VLXKDMInstance::ToString(VLXUnicodeString& text) const
 {
   return Call(*this, "VLXKDMInstance::ToString(VLXUnicodeString&)", slot<Instance_toString>).returning(text);
 }
 
-long VLXKDMInstance::ToString(VLXBoolean withValues, VLXUnicodeString& text)
+long VLXKDMInstance::ToString(VLXBoolean withValues, VLXUnicodeString& text) const
 {
   return Call(*this, "VLXKDMInstance::ToString(VLXBoolean, VLXUnicodeString&)", slot<Instance_toStringWithValues>)
       .with(withValues)
@@ -176,7 +176,7 @@ long VLXKDMInstance::ToString(VLXBoolean withValues, VLXUnicodeString& text)
 
 // ---- Values ----------------------------------------------------------------------------------
 
-long VLXKDMInstance::GetValue(const VLXUnicodeString& name, VLXKDMInstanceValue& value)
+long VLXKDMInstance::GetValue(const VLXUnicodeString& name, VLXKDMInstanceValue& value) const
 {
   const char* const text = "VLXKDMInstance::GetValue(const VLXUnicodeString&, VLXKDMInstanceValue&)";
   return Call(*this, text, slot<Instance_getValueNamed>)
@@ -185,7 +185,7 @@ long VLXKDMInstance::GetValue(const VLXUnicodeString& name, VLXKDMInstanceValue&
       .returning(ValueOut<VLXUnicodeString>{value, *this, name, text});
 }
 
-long VLXKDMInstance::GetValue(int position, VLXKDMInstanceValue& value)
+long VLXKDMInstance::GetValue(int position, VLXKDMInstanceValue& value) const
 {
   const char* const text = "VLXKDMInstance::GetValue(int, VLXKDMInstanceValue&)";
   return Call(*this, text, slot<Instance_getValueAt>)
@@ -267,6 +267,16 @@ long VLXKDMInstance::SetValue(const VLXUnicodeString& name, VLXBoolean value)
 long VLXKDMInstance::SetValue(int position, VLXBoolean value)
 {
   return SetConverted("VLXKDMInstance::SetValue(int, VLXBoolean)", position, value);
+}
+
+long VLXKDMInstance::SetValue(const VLXUnicodeString& name, bool value)
+{
+  return SetConverted("VLXKDMInstance::SetValue(const VLXUnicodeString&, bool)", name, VLXBoolean(value ? 1 : 0));
+}
+
+long VLXKDMInstance::SetValue(int position, bool value)
+{
+  return SetConverted("VLXKDMInstance::SetValue(int, bool)", position, VLXBoolean(value ? 1 : 0));
 }
 
 long VLXKDMInstance::SetValue(const VLXUnicodeString& name, const VLXUnicodeString& value)

@@ -7,19 +7,19 @@ using namespace corvexa;
 
 VLXKDM_PROXY_DEFINITIONS(VLXKDMInstanceSet, InstanceSet)
 
-long VLXKDMInstanceSet::GetCount(int& count)
+long VLXKDMInstanceSet::GetCount(int& count) const
 {
   return Call(*this, "VLXKDMInstanceSet::GetCount(int&)", slot<InstanceSet_getCount>).returning(count);
 }
 
-long VLXKDMInstanceSet::GetItem(int position, VLXKDMInstance& instance)
+long VLXKDMInstanceSet::GetItem(int position, VLXKDMInstance& instance) const
 {
   return Call(*this, "VLXKDMInstanceSet::GetItem(int, VLXKDMInstance&)", slot<InstanceSet_getItem>)
       .with(position)
       .returning(instance);
 }
 
-long VLXKDMInstanceSet::IndexOf(const VLXKDMInstance& instance, int& position)
+long VLXKDMInstanceSet::IndexOf(const VLXKDMInstance& instance, int& position) const
 {
   return Call(*this, "VLXKDMInstanceSet::IndexOf(const VLXKDMInstance&, int&)", slot<InstanceSet_indexOf>)
       .with(instance)

@@ -20,24 +20,24 @@ long VLXKDMModel::CreateInstance(VLXKDMInstance& instance)
   return Call(*this, "VLXKDMModel::CreateInstance(VLXKDMInstance&)", slot<Model_createInstance>).returning(instance);
 }
 
-long VLXKDMModel::GetClassDef(VLXKDMClassDef& classDef)
+long VLXKDMModel::GetClassDef(VLXKDMClassDef& classDef) const
 {
   return Call(*this, "VLXKDMModel::GetClassDef(VLXKDMClassDef&)", slot<Model_getClassDef>).returning(classDef);
 }
 
-long VLXKDMModel::GetInstances(VLXKDMInstanceSet& instances)
+long VLXKDMModel::GetInstances(VLXKDMInstanceSet& instances) const
 {
   return Call(*this, "VLXKDMModel::GetInstances(VLXKDMInstanceSet&)", slot<Model_getInstances>).returning(instances);
 }
 
-long VLXKDMModel::FindInstance(const VLXUnicodeString& id, VLXKDMInstance& instance)
+long VLXKDMModel::FindInstance(const VLXUnicodeString& id, VLXKDMInstance& instance) const
 {
   return Call(*this, "VLXKDMModel::FindInstance(const VLXUnicodeString&, VLXKDMInstance&)", slot<Model_findInstance>)
       .with(id)
       .returning(instance);
 }
 
-long VLXKDMModel::FindInstance(const VLXBinary& id, VLXKDMInstance& instance)
+long VLXKDMModel::FindInstance(const VLXBinary& id, VLXKDMInstance& instance) const
 {
   return Call(*this, "VLXKDMModel::FindInstance(const VLXBinary&, VLXKDMInstance&)", slot<Model_findInstance>)
       .with(id)
@@ -45,7 +45,7 @@ long VLXKDMModel::FindInstance(const VLXBinary& id, VLXKDMInstance& instance)
 }
 
 long VLXKDMModel::SelectInstances(const VLXUnicodeString& attribute, VLXKDMInstanceValue& value,
-                                  VLXBoolean withSubclasses, VLXListValVLXKDMInstance& instances)
+                                  VLXBoolean withSubclasses, VLXListValVLXKDMInstance& instances) const
 {
   return Call(*this,
               "VLXKDMModel::SelectInstances(const VLXUnicodeString&, VLXKDMInstanceValue&, VLXBoolean, "
@@ -55,12 +55,12 @@ long VLXKDMModel::SelectInstances(const VLXUnicodeString& attribute, VLXKDMInsta
       .returning(instances);
 }
 
-long VLXKDMModel::GetReplica(VLXKDMReplica& replica)
+long VLXKDMModel::GetReplica(VLXKDMReplica& replica) const
 {
   return Call(*this, "VLXKDMModel::GetReplica(VLXKDMReplica&)", slot<Model_getReplica>).returning(replica);
 }
 
-long VLXKDMModel::ToString(VLXUnicodeString& text)
+long VLXKDMModel::ToString(VLXUnicodeString& text) const
 {
   return Call(*this, "VLXKDMModel::ToString(VLXUnicodeString&)", slot<Model_toString>).returning(text);
 }

@@ -7,26 +7,26 @@ using namespace corvexa;
 
 VLXKDM_PROXY_DEFINITIONS(VLXKDMModelSet, ModelSet)
 
-long VLXKDMModelSet::GetCount(int& count)
+long VLXKDMModelSet::GetCount(int& count) const
 {
   return Call(*this, "VLXKDMModelSet::GetCount(int&)", slot<ModelSet_getCount>).returning(count);
 }
 
-long VLXKDMModelSet::GetItem(int position, VLXKDMModel& model)
+long VLXKDMModelSet::GetItem(int position, VLXKDMModel& model) const
 {
   return Call(*this, "VLXKDMModelSet::GetItem(int, VLXKDMModel&)", slot<ModelSet_getItemAt>)
       .with(position)
       .returning(model);
 }
 
-long VLXKDMModelSet::GetItem(const VLXUnicodeString& className, VLXKDMModel& model)
+long VLXKDMModelSet::GetItem(const VLXUnicodeString& className, VLXKDMModel& model) const
 {
   return Call(*this, "VLXKDMModelSet::GetItem(const VLXUnicodeString&, VLXKDMModel&)", slot<ModelSet_getItemNamed>)
       .with(className)
       .returning(model);
 }
 
-long VLXKDMModelSet::Includes(const VLXUnicodeString& className, VLXBoolean& included)
+long VLXKDMModelSet::Includes(const VLXUnicodeString& className, VLXBoolean& included) const
 {
   return Call(*this, "VLXKDMModelSet::Includes(const VLXUnicodeString&, VLXBoolean&)", slot<ModelSet_includes>)
       .rawConversionCode()
@@ -34,14 +34,14 @@ long VLXKDMModelSet::Includes(const VLXUnicodeString& className, VLXBoolean& inc
       .returning(included);
 }
 
-long VLXKDMModelSet::IndexOf(const VLXKDMClassDef& classDef, int& position)
+long VLXKDMModelSet::IndexOf(const VLXKDMClassDef& classDef, int& position) const
 {
   return Call(*this, "VLXKDMModelSet::IndexOf(const VLXKDMClassDef&, int&)", slot<ModelSet_indexOf>)
       .with(classDef)
       .returning(position);
 }
 
-long VLXKDMModelSet::IndexOf(const VLXUnicodeString& className, int& position)
+long VLXKDMModelSet::IndexOf(const VLXUnicodeString& className, int& position) const
 {
   return Call(*this, "VLXKDMModelSet::IndexOf(const VLXUnicodeString&, int&)", slot<ModelSet_indexOfNamed>)
       .with(className)
