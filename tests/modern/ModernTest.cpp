@@ -8,6 +8,7 @@
 #include <functional>
 #include <numeric>
 
+#include "VLXJBXJNIUtilities.h"
 #include "corvexa/corvexa.hpp"
 
 using namespace corvexa;
@@ -297,9 +298,8 @@ TEST(ModernColumns, BatchesWriteAndReadByType)
 TEST(ModernExchange, ReplicaToJavaAndBack)
 {
   Replica r = Replica::create("exchanged");
-  JavaVM* vm = nullptr;
-  jsize count = 0;
-  ASSERT_EQ(JNI_OK, JNI_GetCreatedJavaVMs(&vm, 1, &count));
+  JavaVM* vm = VLXJBXJNIUtilities::GetJavaVM();
+  ASSERT_NE(nullptr, vm);
   JNIEnv* env = nullptr;
   ASSERT_EQ(JNI_OK, vm->GetEnv(reinterpret_cast<void**>(&env), JNI_VERSION_1_8));
   const jobject java = r.to_java(env);

@@ -365,44 +365,6 @@ std::vector<InstanceHandle> Model::select_without_value(std::string_view attribu
 
 // ---- Replica ---------------------------------------------------------------------------------
 
-namespace {
-
-// Writes data to path whole or not at all: into a temporary file of the same folder, renamed into
-// place once complete. The one place files are written.
-void WriteWhole(const std::string& path, const void* data, std::size_t size, const char* operation)
-{
-  static std::atomic<unsigned> counter{0};
-  const std::string temporary =
-      path + ".tmp-" + std::to_string(::getpid()) + "-" + std::to_string(counter.fetch_add(1));
-  {
-    std::ofstream out(temporary, std::ios::binary | std::ios::trunc);
-    if (out) out.write(static_cast<const char*>(data), static_cast<std::streamsize>(size));
-    if (out) out.close();
-    if (!out) {
-      const int error = errno;
-      std::remove(temporary.c_str());
-      Refuse(operation, path, std::string("cannot write '") + temporary + "': " + std::strerror(error));
-    }
-  }
-  if (std::rename(temporary.c_str(), path.c_str()) != 0) {
-    const int error = errno;
-    std::remove(temporary.c_str());
-    Refuse(operation, path, "cannot rename '" + temporary + "' to '" + path + "': " + std::strerror(error));
-  }
-}
-
-bytes ReadWhole(const std::string& path, const char* operation)
-{
-  std::ifstream in(path, std::ios::binary);
-  if (!in) Refuse(operation, path, "cannot open '" + path + "': " + std::strerror(errno));
-  std::vector<char> chars((std::istreambuf_iterator<char>(in)), std::istreambuf_iterator<char>());
-  if (in.bad()) Refuse(operation, path, "cannot read '" + path + "'");
-  const auto* begin = reinterpret_cast<const std::byte*>(chars.data());
-  return bytes(begin, begin + chars.size());
-}
-
-}  // namespace
-
 ReplicaHandle Replica::create(std::string_view name)
 {
   ReplicaHandle out;
@@ -426,22 +388,15 @@ ReplicaHandle Replica::read_xml_string(std::string_view xml)
 
 ReplicaHandle Replica::read_binary_file(const std::string& path)
 {
-  const bytes data = ReadWhole(path, "corvexa::Replica::read_binary_file");
-  try {
-    return from_binary(data);
-  } catch (const Error& e) {
-    throw Error(e.code(), Named("corvexa::Replica::read_binary_file", path), e.cause(), e.id(), e.parameters());
-  }
+  ReplicaHandle out;
+  Check(VLXKDMReplica::ReadBinaryFile(Text(path), out._proxy), "corvexa::Replica::read_binary_file", path);
+  return out;
 }
 
 ReplicaHandle Replica::from_binary(const bytes& data)
 {
-  // The header says whether the body is deflated: "CVRB", a version, then the flags (1: deflated).
-  const bool deflated =
-      data.size() > 5 && std::memcmp(data.data(), "CVRB", 4) == 0 && (std::to_integer<int>(data[5]) & 1) != 0;
-  ReplicaHandle out;
-  Check(VLXKDMReplica::GetReplicaFromBinary(Binary(data), deflated ? 1 : 0, out._proxy),
-        "corvexa::Replica::from_binary");
+  ReplicaHandle out;  // deflated or not as the header says
+  Check(VLXKDMReplica::GetReplicaFromBinary(Binary(data), out._proxy), "corvexa::Replica::from_binary");
   return out;
 }
 
@@ -484,24 +439,22 @@ bytes Replica::binary(Compression compression) const
   return Bytes(data);
 }
 
+// Files are streamed by the Java side into a temporary file renamed into place when complete.
 void Replica::write_xml_file(const std::string& path, bool with_schema, bool with_state) const
 {
-  const std::string text = xml(with_schema, with_state);
-  WriteWhole(path, text.data(), text.size(), "corvexa::Replica::write_xml_file");
+  Check(_proxy.WriteXmlFile(Text(path), with_schema ? 1 : 0, with_state ? 1 : 0), "corvexa::Replica::write_xml_file",
+        path);
 }
 
 void Replica::write_xsd_file(const std::string& path) const
 {
-  const std::string text = xsd();
-  WriteWhole(path, text.data(), text.size(), "corvexa::Replica::write_xsd_file");
+  Check(_proxy.WriteXsdFile(Text(path)), "corvexa::Replica::write_xsd_file", path);
 }
 
 void Replica::write_binary_file(const std::string& path, Compression compression) const
 {
-  VLXBinary data;
-  Check(VLXKDMReplica::GetBinaryFromReplica(_proxy, compression == Compression::on ? 1 : 0, data),
+  Check(_proxy.WriteBinaryFile(Text(path), compression == Compression::on ? 1 : 0),
         "corvexa::Replica::write_binary_file", path);
-  WriteWhole(path, data.getData(), static_cast<std::size_t>(data.getLength()), "corvexa::Replica::write_binary_file");
 }
 
 std::string Replica::name() const
