@@ -146,8 +146,9 @@ TEST(ModernValues, MisusesThrowNamingWhat)
       {"class 'Sample' has no attribute 'nope'", [&] { (void)s.replica.class_def("Sample").attribute("nope"); }},
       {"position 2 is out of range (size 2)", [&] { (void)s.model.instances()[2]; }},
       {"/nonexistent/x.xml", [&] { (void)Replica::read_xml_file("/nonexistent/x.xml"); }},
-      {"cannot open '/nonexistent/x.bin'", [&] { (void)Replica::read_binary_file("/nonexistent/x.bin"); }},
-      {"cannot write '/nonexistent/x.bin", [&] { s.replica.write_binary_file("/nonexistent/x.bin"); }},
+      {"cannot read binary file '/nonexistent/x.bin'", [&] { (void)Replica::read_binary_file("/nonexistent/x.bin"); }},
+      {"cannot write binary file '/nonexistent/x.bin': the directory '/nonexistent' does not exist",
+       [&] { s.replica.write_binary_file("/nonexistent/x.bin"); }},
       {"corvexa::Replica::from_binary",
        [&] {
          (void)Replica::from_binary(B({1, 2, 3}));

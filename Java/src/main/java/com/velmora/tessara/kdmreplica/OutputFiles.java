@@ -50,6 +50,10 @@ final class OutputFiles {
         if (Files.isDirectory(target)) {
             throw new IllegalArgumentException("cannot write " + what + " '" + target + "': it is a directory");
         }
+        if (!Files.isDirectory(dir)) {
+            throw new IllegalArgumentException("cannot write " + what + " '" + target + "': the directory '" + dir
+                    + "' does not exist");
+        }
         Path temp;
         try {
             temp = Files.createTempFile(dir, "." + target.getFileName() + ".", ".part");
