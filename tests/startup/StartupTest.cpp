@@ -10,6 +10,7 @@
 #include "ReplicaStubs.h"
 #include "VLXJBXInternal.h"
 #include "VLXKDMReplica.h"
+#include "corvexa/Version.h"
 
 using namespace corvexa_test;
 using namespace corvexa;
@@ -43,6 +44,21 @@ std::string JavaThreads()
   const std::string result = chars;
   env->ReleaseStringUTFChars(static_cast<jstring>(text.get()), chars);
   return result;
+}
+
+// A replica jar of another version than the library's is refused at start, naming both versions;
+// every operation fails the same way.
+TEST(StartupOtherVersion, TheJarOfAnotherVersionIsRefusedNamingBoth)
+{
+  VLXKDMReplica replica;
+  for (int call = 0; call < 2; ++call) {
+    EXPECT_EQ(VLX_E_FAIL, replica.Build(U("never")));
+    const LastError error = PeekLastError();
+    EXPECT_EQ("VLXJBXInfraERR_1010", error.id);
+    EXPECT_NE(std::string::npos, error.text.find(std::string("a replica jar of version ") + CorvexaVersion() +
+                                                 ", the library's (the jar on the class path is version 9.9.9)"))
+        << error.text;
+  }
 }
 
 TEST(StartupMissingClass, InitStopsAtTheMissingClassAndEveryOperationFailsCleanly)

@@ -2,9 +2,13 @@
 #include "ReplicaStubs.h"
 
 #include <cstdio>
+#include <string>
+
+#include "corvexa/Version.h"
 
 #include "VLXError.h"
 #include "VLXJBXException.h"
+#include "VLXJBXJNIConverter.h"
 #include "VLXJBXJNIHelper.h"
 #include "VLXJBXJNIUtilities.h"
 #include "VLXJBXLocalRef.h"
@@ -97,10 +101,26 @@ long ReplicaStubs::init(JNIEnv* env)
       return VLXKDMJavaObject::HandleReplicaError(_env, status, kMethodName);
     }
   }
-  const long result = VLXKDMJavaObject::HandleReplicaError(_env, VLX_S_OK, kMethodName);
+  long result = VLXKDMJavaObject::HandleReplicaError(_env, VLX_S_OK, kMethodName);
   if (result < 0) snprintf(_missing, sizeof _missing, "a Java exception raised while binding");
+  if (result >= 0) result = CheckVersion();
   _state.store(result < 0 ? kFailed : kBound, std::memory_order_release);
   return result;
+}
+
+// The replica package must be of the library's own version: another one is refused at start.
+long ReplicaStubs::CheckVersion()
+{
+  const VLXJBXLocalRef version(
+      _env, VLXJBXJNIHelper::CallStaticObjectMethod(_env, Class(Replica), Method(Replica_getVersion)));
+  VLXUnicodeString text;
+  long status = VLXJBXJNIHelper::ExceptionCheck(_env) ? VLX_E_FAIL : VLX_S_OK;
+  if (status >= 0) status = VLXJBXJNIConverter::BuildFromJavaString(_env, static_cast<jstring>(version.get()), text);
+  if (status >= 0 && std::string(text.c_str()) == CORVEXA_VERSION) return VLX_S_OK;
+  snprintf(_missing, sizeof _missing, "a replica jar of version %s, the library's (the jar on the class path is version %s)",
+           CORVEXA_VERSION, status >= 0 ? text.c_str() : "unknown");
+  return VLXJBXException::Raise(VLX_E_FAIL, VLXJBXMessages::BindingMissing, {kMethodName, _missing}, kSourcePath,
+                                __LINE__);
 }
 
 long ReplicaStubs::ReportUnbound(const char* methodName) const

@@ -25,7 +25,7 @@ enum Slot : int {
 #undef RESERVED
   SlotCount
 };
-static_assert(SlotCount == 211, "the binding table has 211 slots");
+static_assert(SlotCount == 212, "the binding table has 212 slots");
 
 enum class BindingKind { Class, Method, Static, SetterFirst, Constant, Reserved };
 
@@ -76,6 +76,8 @@ class ReplicaStubs {
   bool IsBound() const { return _state.load(std::memory_order_acquire) == kBound; }
   // True once init() has returned, whether it bound everything or stopped at a missing member.
   bool IsSettled() const { return _state.load(std::memory_order_acquire) != kFilling; }
+  // After binding: fails, recording why, when the replica package's version is not the library's.
+  long CheckVersion();
   // Fails the operation methodName because the Java side could not be bound: records a last error
   // naming the first missing class or member and returns VLX_E_FAIL.
   long ReportUnbound(const char* methodName) const;

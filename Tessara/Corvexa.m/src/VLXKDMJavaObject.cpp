@@ -1,6 +1,8 @@
 // The proxy base: the start of the Java side, the built test and the error translation.
 #include "VLXKDMJavaObject.h"
 
+#include "corvexa/Version.h"
+
 #include <cstdio>
 #include <string>
 
@@ -177,3 +179,5 @@ long VLXKDMJavaObject::CheckJavaClass(JNIEnv* env, jobject object, int javaClass
 }
 
 extern "C" int VELMORA_QKA2_INTERNAL_Corvexa() { return 1; }
+
+extern "C" const char* CorvexaVersion() { return CORVEXA_VERSION; }

@@ -684,6 +684,11 @@ public class Replica {
         return BinaryCodec.read(bytes, null);
     }
 
+    /** The version of the replica package ("0.1.0"); the native library refuses a package of another. */
+    public static String getVersion() {
+        return Version.get();
+    }
+
     /** For example {@code Replica 'plant' (3 classes, 120 instances, 2 deleted)}. */
     @Override
     public String toString() {
