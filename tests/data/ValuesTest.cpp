@@ -299,4 +299,19 @@ TEST(Identifiers, EachKindWritesOnlyItsOutParameters)
   }
 }
 
+// A value holder without type selects the instances that have no value (and reports nothing).
+TEST(Selection, AnUntypedValueSelectsTheInstancesWithoutValue)
+{
+  FatalRecorder fatal;
+  SampleReplica s;
+  VLXKDMInstance with = s.Create(), without = s.Create();
+  ASSERT_EQ(VLX_S_OK, with.SetValue(0, 7));
+  VLXKDMInstanceValue untyped;
+  VLXListValVLXKDMInstance found;
+  ASSERT_EQ(VLX_S_OK, s.model.SelectInstances(U("integer"), untyped, 0, found)) << PeekLastError().text;
+  ASSERT_EQ(1, found.Size());
+  EXPECT_TRUE(found[1] == without);
+  EXPECT_TRUE(Reports().empty());
+}
+
 }  // namespace

@@ -28,28 +28,28 @@ class CORVEXA_API VLXKDMReplica : public VLXKDMJavaObject {
   long Build(const VLXUnicodeString& name);
 
   // The replica's name.
-  long GetName(VLXUnicodeString& name);
+  long GetName(VLXUnicodeString& name) const;
   // Renames the replica. A name that is not well-formed UTF-8 returns the converter's own code.
   long SetName(const VLXUnicodeString& name);
   // A readable text form of the replica.
-  long ToString(VLXUnicodeString& text);
+  long ToString(VLXUnicodeString& text) const;
   // Checks the whole replica and, when it is consistent, makes its pending changes permanent;
   // otherwise fails, changing nothing, with a last error that lists every violation.
   long Commit();
 
   // Attaches models to the replica's model set.
-  long GetModels(VLXKDMModelSet& models);
+  long GetModels(VLXKDMModelSet& models) const;
   // Attaches classDef to the class definition named className; to nothing (not built) when the
   // replica has no such class.
-  long GetClassDef(const VLXUnicodeString& className, VLXKDMClassDef& classDef);
+  long GetClassDef(const VLXUnicodeString& className, VLXKDMClassDef& classDef) const;
   // Attaches attributeDef to the attribute definition named attributeName ("Class.attribute", or a
   // bare name that exactly one class holds); to nothing when there is none.
-  long GetAttributeDef(const VLXUnicodeString& attributeName, VLXKDMAttributeDef& attributeDef);
+  long GetAttributeDef(const VLXUnicodeString& attributeName, VLXKDMAttributeDef& attributeDef) const;
   // The live instance whose identifier is this text (or these bytes), through each model's
   // identifier index, models in order (identifiers are unique within a model, so the first model
   // holding it wins). To an unbuilt proxy when no instance has it.
-  long FindInstance(const VLXUnicodeString& id, VLXKDMInstance& instance);
-  long FindInstance(const VLXBinary& id, VLXKDMInstance& instance);
+  long FindInstance(const VLXUnicodeString& id, VLXKDMInstance& instance) const;
+  long FindInstance(const VLXBinary& id, VLXKDMInstance& instance) const;
 
   // ---- Documents. Parsing, validation and writing happen on the Java side; a malformed or hostile
   // document or buffer fails with a last error that says what was wrong, leaving the replica as it
@@ -58,7 +58,7 @@ class CORVEXA_API VLXKDMReplica : public VLXKDMJavaObject {
   // Sets the schema location written into XML output, for the whole process. Needs no proxy.
   static long SetSchemaLocation(const VLXUnicodeString& location);
   // The schema location this replica was read with (or the one in force when it was created).
-  long GetSchemaLocation(VLXUnicodeString& location);
+  long GetSchemaLocation(VLXUnicodeString& location) const;
   // Sets a process-wide feature of the replica implementation: "validate" (validate XML input
   // against the replica's schema; default off) or "indent" (indent XML output; default on). Needs
   // no proxy; an unknown name fails, listing the known ones.
@@ -92,12 +92,12 @@ class CORVEXA_API VLXKDMReplica : public VLXKDMJavaObject {
   static long ReadFromXmlString(const VLXUnicodeString& xml, VLXKDMReplica& replica);
 
   // The replica as XML; withSchema embeds its XSD so that the document stands alone.
-  long GetXml(VLXBoolean withSchema, VLXUnicodeString& xml);
+  long GetXml(VLXBoolean withSchema, VLXUnicodeString& xml) const;
   // As above; withState also writes pending changes (states, deleted instances) so that reading
   // the document back restores them.
-  long GetXml(VLXBoolean withSchema, VLXBoolean withState, VLXUnicodeString& xml);
+  long GetXml(VLXBoolean withSchema, VLXBoolean withState, VLXUnicodeString& xml) const;
   // The schema as a W3C XML Schema that validates the replica's own XML.
-  long GetXsd(VLXUnicodeString& xsd);
+  long GetXsd(VLXUnicodeString& xsd) const;
 
   // The replica as bytes (deflated when compressed), and back. The flag given to read must be the
   // one the bytes were written with.
@@ -113,9 +113,9 @@ class CORVEXA_API VLXKDMReplica : public VLXKDMJavaObject {
 
   // The replica as an XML file (as GetXml), an XSD file (as GetXsd), a binary file (as
   // GetBinaryFromReplica).
-  long WriteXmlFile(const VLXUnicodeString& path, VLXBoolean withSchema, VLXBoolean withState);
-  long WriteXsdFile(const VLXUnicodeString& path);
-  long WriteBinaryFile(const VLXUnicodeString& path, VLXBoolean compressed);
+  long WriteXmlFile(const VLXUnicodeString& path, VLXBoolean withSchema, VLXBoolean withState) const;
+  long WriteXsdFile(const VLXUnicodeString& path) const;
+  long WriteBinaryFile(const VLXUnicodeString& path, VLXBoolean compressed) const;
   // Attaches replica to a new replica read from a binary file, compressed or not as its header says.
   static long ReadBinaryFile(const VLXUnicodeString& path, VLXKDMReplica& replica);
 

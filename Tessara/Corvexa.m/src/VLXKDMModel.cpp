@@ -6,6 +6,28 @@
 
 using namespace corvexa;
 
+namespace {
+// The value a selection compares with: a holder without type stands for no value (Java null).
+struct Compared {
+  VLXKDMInstanceValue& value;
+};
+}  // namespace
+
+template <>
+struct corvexa::ArgOf<Compared> {
+  using J = jobject;
+  static constexpr bool kOwnsRef = false;
+  static constexpr bool kEarly = true;
+  static long To(JNIEnv* env, const Compared& arg, J& out)
+  {
+    if (arg.value.GetType() == static_cast<VLXKDMInstanceValue::Type>(-1)) {
+      out = nullptr;
+      return VLX_S_OK;
+    }
+    return ArgOf<RemoteForm>::To(env, Remote(arg.value), out);
+  }
+};
+
 VLXKDM_PROXY_DEFINITIONS(VLXKDMModel, Model)
 
 long VLXKDMModel::Build(const VLXKDMClassDef& classDef)
@@ -51,7 +73,7 @@ long VLXKDMModel::SelectInstances(const VLXUnicodeString& attribute, VLXKDMInsta
               "VLXKDMModel::SelectInstances(const VLXUnicodeString&, VLXKDMInstanceValue&, VLXBoolean, "
               "VLXListValVLXKDMInstance&)",
               slot<Model_selectInstances>)
-      .with(attribute, Remote(value), withSubclasses)
+      .with(attribute, Compared{value}, withSubclasses)
       .returning(instances);
 }
 

@@ -22,7 +22,7 @@ long VLXKDMReplica::Build(const VLXUnicodeString& name)
       .construct();
 }
 
-long VLXKDMReplica::GetName(VLXUnicodeString& name)
+long VLXKDMReplica::GetName(VLXUnicodeString& name) const
 {
   return Call(*this, "VLXKDMReplica::GetName(VLXUnicodeString&)", slot<Replica_getName>).returning(name);
 }
@@ -35,26 +35,26 @@ long VLXKDMReplica::SetName(const VLXUnicodeString& name)
       .run();
 }
 
-long VLXKDMReplica::ToString(VLXUnicodeString& text)
+long VLXKDMReplica::ToString(VLXUnicodeString& text) const
 {
   return Call(*this, "VLXKDMReplica::ToString(VLXUnicodeString&)", slot<Replica_toString>).returning(text);
 }
 
 long VLXKDMReplica::Commit() { return Call(*this, "VLXKDMReplica::Commit()", slot<Replica_commit>).run(); }
 
-long VLXKDMReplica::GetModels(VLXKDMModelSet& models)
+long VLXKDMReplica::GetModels(VLXKDMModelSet& models) const
 {
   return Call(*this, "VLXKDMReplica::GetModels(VLXKDMModelSet&)", slot<Replica_getModels>).returning(models);
 }
 
-long VLXKDMReplica::GetClassDef(const VLXUnicodeString& className, VLXKDMClassDef& classDef)
+long VLXKDMReplica::GetClassDef(const VLXUnicodeString& className, VLXKDMClassDef& classDef) const
 {
   return Call(*this, "VLXKDMReplica::GetClassDef(const VLXUnicodeString&, VLXKDMClassDef&)", slot<Replica_getClassDef>)
       .with(className)
       .returning(classDef);
 }
 
-long VLXKDMReplica::GetAttributeDef(const VLXUnicodeString& attributeName, VLXKDMAttributeDef& attributeDef)
+long VLXKDMReplica::GetAttributeDef(const VLXUnicodeString& attributeName, VLXKDMAttributeDef& attributeDef) const
 {
   return Call(*this, "VLXKDMReplica::GetAttributeDef(const VLXUnicodeString&, VLXKDMAttributeDef&)",
               slot<Replica_getAttributeDef>)
@@ -62,7 +62,7 @@ long VLXKDMReplica::GetAttributeDef(const VLXUnicodeString& attributeName, VLXKD
       .returning(attributeDef);
 }
 
-long VLXKDMReplica::FindInstance(const VLXUnicodeString& id, VLXKDMInstance& instance)
+long VLXKDMReplica::FindInstance(const VLXUnicodeString& id, VLXKDMInstance& instance) const
 {
   return Call(*this, "VLXKDMReplica::FindInstance(const VLXUnicodeString&, VLXKDMInstance&)",
               slot<Replica_findInstance>)
@@ -70,7 +70,7 @@ long VLXKDMReplica::FindInstance(const VLXUnicodeString& id, VLXKDMInstance& ins
       .returning(instance);
 }
 
-long VLXKDMReplica::FindInstance(const VLXBinary& id, VLXKDMInstance& instance)
+long VLXKDMReplica::FindInstance(const VLXBinary& id, VLXKDMInstance& instance) const
 {
   return Call(*this, "VLXKDMReplica::FindInstance(const VLXBinary&, VLXKDMInstance&)", slot<Replica_findInstance>)
       .with(id)
@@ -87,7 +87,7 @@ long VLXKDMReplica::SetSchemaLocation(const VLXUnicodeString& location)
       .run();
 }
 
-long VLXKDMReplica::GetSchemaLocation(VLXUnicodeString& location)
+long VLXKDMReplica::GetSchemaLocation(VLXUnicodeString& location) const
 {
   return Call(*this, "VLXKDMReplica::GetSchemaLocation(VLXUnicodeString&)", slot<Replica_getSchemaLocation>)
       .returning(location);
@@ -172,21 +172,21 @@ long VLXKDMReplica::ReadFromXmlString(const VLXUnicodeString& xml, VLXKDMReplica
       .returning(replica);
 }
 
-long VLXKDMReplica::GetXml(VLXBoolean withSchema, VLXUnicodeString& xml)
+long VLXKDMReplica::GetXml(VLXBoolean withSchema, VLXUnicodeString& xml) const
 {
   return Call(*this, "VLXKDMReplica::GetXml(VLXBoolean, VLXUnicodeString&)", slot<Replica_getXml>)
       .with(withSchema)
       .returning(xml);
 }
 
-long VLXKDMReplica::GetXml(VLXBoolean withSchema, VLXBoolean withState, VLXUnicodeString& xml)
+long VLXKDMReplica::GetXml(VLXBoolean withSchema, VLXBoolean withState, VLXUnicodeString& xml) const
 {
   return Call(*this, "VLXKDMReplica::GetXml(VLXBoolean, VLXBoolean, VLXUnicodeString&)", slot<Replica_getXmlWithState>)
       .with(withSchema, withState)
       .returning(xml);
 }
 
-long VLXKDMReplica::GetXsd(VLXUnicodeString& xsd)
+long VLXKDMReplica::GetXsd(VLXUnicodeString& xsd) const
 {
   return Call(*this, "VLXKDMReplica::GetXsd(VLXUnicodeString&)", slot<Replica_getXsd>).returning(xsd);
 }
@@ -217,7 +217,7 @@ long VLXKDMReplica::GetReplicaFromBinary(const VLXBinary& bytes, VLXKDMReplica& 
 
 // ---- Files ---------------------------------------------------------------------------------------
 
-long VLXKDMReplica::WriteXmlFile(const VLXUnicodeString& path, VLXBoolean withSchema, VLXBoolean withState)
+long VLXKDMReplica::WriteXmlFile(const VLXUnicodeString& path, VLXBoolean withSchema, VLXBoolean withState) const
 {
   return Call(*this, "VLXKDMReplica::WriteXmlFile(const VLXUnicodeString&, VLXBoolean, VLXBoolean)",
               slot<Replica_writeXmlFile>)
@@ -225,14 +225,14 @@ long VLXKDMReplica::WriteXmlFile(const VLXUnicodeString& path, VLXBoolean withSc
       .run();
 }
 
-long VLXKDMReplica::WriteXsdFile(const VLXUnicodeString& path)
+long VLXKDMReplica::WriteXsdFile(const VLXUnicodeString& path) const
 {
   return Call(*this, "VLXKDMReplica::WriteXsdFile(const VLXUnicodeString&)", slot<Replica_writeXsdFile>)
       .with(path)
       .run();
 }
 
-long VLXKDMReplica::WriteBinaryFile(const VLXUnicodeString& path, VLXBoolean compressed)
+long VLXKDMReplica::WriteBinaryFile(const VLXUnicodeString& path, VLXBoolean compressed) const
 {
   return Call(*this, "VLXKDMReplica::WriteBinaryFile(const VLXUnicodeString&, VLXBoolean)",
               slot<Replica_writeBinaryFile>)
