@@ -76,21 +76,6 @@ TEST(VariadicSetters, SendWhatTheListSettersSend)
       ListOf<VLXListValVLXKDMInstance>({t1, t2, t1}));
 }
 
-TEST(ValueFailures, AClassOutsideTheTableIsReportedAndFails)
-{
-  VLXKDMInstance instance;
-  AttachNew(instance, "com/velmora/tessara/testdoubles/LongInstance");
-  for (int byPosition : {0, 1}) {
-    FatalRecorder fatal;
-    VLXKDMInstanceValue value;
-    const long rc = byPosition ? instance.GetValue(0, value) : instance.GetValue(U("n"), value);
-    EXPECT_LT(rc, 0);
-    ASSERT_FALSE(FatalRecorder::Reports().empty());
-    EXPECT_EQ("AssertionFailed:_type != (Type) -1", FatalRecorder::Reports()[0].message);
-    EXPECT_EQ(static_cast<VLXKDMInstanceValue::Type>(-1), value.GetType());
-  }
-}
-
 TEST(ValueFailures, AHolderThatCannotBeBuiltReachesNoJavaMethod)
 {
   VLXKDMInstance counting;

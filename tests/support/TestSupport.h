@@ -97,11 +97,6 @@ inline jmethodID MethodOf(jobject object, const char* name, const char* signatur
   Local cls(Env()->GetObjectClass(object));
   return Env()->GetMethodID(static_cast<jclass>(cls.get()), name, signature);
 }
-inline jlong TimeOf(jobject date)
-{
-  const jlong value = Env()->CallLongMethod(date, MethodOf(date, "getTime", "()J"));
-  return NoPending("getTime") ? value : 0;
-}
 // An int field of a test double (they count calls).
 inline int IntField(jobject object, const char* field)
 {

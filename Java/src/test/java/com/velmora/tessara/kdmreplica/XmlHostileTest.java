@@ -4,9 +4,7 @@ import static com.velmora.tessara.kdmreplica.Fx.*;
 import static org.junit.jupiter.api.Assertions.*;
 import static org.junit.jupiter.api.Assumptions.assumeTrue;
 
-import java.io.File;
 import java.io.IOException;
-import java.nio.charset.StandardCharsets;
 import java.nio.file.Files;
 import java.nio.file.Path;
 import java.nio.file.Paths;
@@ -282,37 +280,5 @@ class XmlHostileTest {
                 throwsWith(IllegalArgumentException.class, read, "'" + path + "'", "regular file");
             }
         }
-    }
-
-    /** Reads by relative paths, in a process whose directory is not its user.dir (as after a native chdir). */
-    static final class ReadRelative {
-        public static void main(String[] args) {
-            Replica.setSchemaFolder("."); // where a string's schema location is read from
-            Replica r = new Replica("r");
-            r.insertSchemaFile("s.xsd");
-            r.populatesFromXmlFile("d.xml");
-            System.out.print(r.getModels().getItem(0).getClassDef().getClassName() + " "
-                    + Replica.readFromXmlFile("d.xml").getName() + " "
-                    + Replica.readFromXmlString(args[0]).getModels().getItem(0).getClassDef().getClassName());
-        }
-    }
-
-    @Test
-    void relativePathsAreTakenFromTheProcessDirectoryNotFromUserDir() throws Exception {
-        Replica.setSchemaLocation("s.xsd");
-        for (String name : new String[] {"Here", "There"}) { // a schema and a document of the same names in each
-            Replica r = new Replica(name);
-            addClass(r, name, null);
-            write(dir.resolve(name).resolve("s.xsd"), r.getXsd());
-            write(dir.resolve(name).resolve("d.xml"), r.getXml(false));
-        }
-        String cp = Paths.get(Replica.class.getProtectionDomain().getCodeSource().getLocation().toURI())
-                + File.pathSeparator
-                + Paths.get(ReadRelative.class.getProtectionDomain().getCodeSource().getLocation().toURI());
-        Process child = new ProcessBuilder(Paths.get(System.getProperty("java.home"), "bin", "java").toString(),
-                "-Duser.dir=" + dir.resolve("There"), "-cp", cp, ReadRelative.class.getName(),
-                Files.readString(dir.resolve("Here/d.xml"))).directory(dir.resolve("Here").toFile())
-                .redirectErrorStream(true).start();
-        assertEquals("Here Here Here", new String(child.getInputStream().readAllBytes(), StandardCharsets.UTF_8));
     }
 }
