@@ -254,8 +254,18 @@ struct Operation {
 #define MOD "VLXKDMModel::"
 #define ISET "VLXKDMInstanceSet::"
 #define VAL "VLXKDMInstanceValue::"
-#define LIST_NAMED(T) INST "SetValue(const VLXUnicodeString&, const VLXListOf" T "&)"
-#define LIST_AT(T) INST "SetValue(int, const VLXListOf" T "&)"
+// A value setter by attribute name and by position (sig: its value parameter), read back there.
+#define SETS(sig, name, position, landed, value)                       \
+  OP(INST "SetValue(const VLXUnicodeString&, " sig ")", landed,        \
+     THEN(w.i.SetValue(U(name), value), w.i.GetValue(position, o.v))), \
+      OP(INST "SetValue(int, " sig ")", landed, THEN(w.i.SetValue(position, value), w.i.GetValue(position, o.v)))
+// A list setter by name and by position, from a list and from the variadic setter's arguments.
+#define LISTS(T, name, position, landed, list, variadic, ...)                     \
+  SETS("const VLXListOf" T "&", name, position, landed, list),                    \
+      OP(INST "SetValue(const VLXUnicodeString&, const VLXListOf" T "&)", landed, \
+         THEN(w.i.variadic(U(name), __VA_ARGS__), w.i.GetValue(position, o.v))),  \
+      OP(INST "SetValue(int, const VLXListOf" T "&)", landed,                     \
+         THEN(w.i.variadic(position, __VA_ARGS__), w.i.GetValue(position, o.v)))
 
 const VLXBinary kAb("ab", 2);
 const VLXTime kMinute = Seconds(60);
@@ -451,73 +461,24 @@ const Operation kOperations[] = {
     OP(INST "ClearValue(int)", "flag=0", THEN(w.i.ClearValue(0), w.i.IsValuated(0, o.f))),
     OP(INST "GetValue(const VLXUnicodeString&, VLXKDMInstanceValue&)", "value=0:42+", w.i.GetValue(U("integer"), o.v)),
     OP(INST "GetValue(int, VLXKDMInstanceValue&)", "value=0:42+", w.i.GetValue(0, o.v)),
-    OP(INST "SetValue(const VLXUnicodeString&, VLXKDMInstanceValue&)", "value=0:5+",
-       THEN(w.i.SetValue(U("integer"), o.v), w.i.GetValue(0, o.v))),
-    OP(INST "SetValue(int, VLXKDMInstanceValue&)", "value=0:5+", THEN(w.i.SetValue(0, o.v), w.i.GetValue(0, o.v))),
-    OP(INST "SetValue(const VLXUnicodeString&, int)", "value=0:7+",
-       THEN(w.i.SetValue(U("integer"), 7), w.i.GetValue(0, o.v))),
-    OP(INST "SetValue(int, int)", "value=0:7+", THEN(w.i.SetValue(0, 7), w.i.GetValue(0, o.v))),
-    OP(INST "SetValue(const VLXUnicodeString&, double)", "value=1+",
-       THEN(w.i.SetValue(U("double"), 2.5), w.i.GetValue(1, o.v))),
-    OP(INST "SetValue(int, double)", "value=1+", THEN(w.i.SetValue(1, 2.5), w.i.GetValue(1, o.v))),
-    OP(INST "SetValue(const VLXUnicodeString&, const VLXUnicodeString&)", "value=2+",
-       THEN(w.i.SetValue(U("string"), U("s")), w.i.GetValue(2, o.v))),
-    OP(INST "SetValue(int, const VLXUnicodeString&)", "value=2+", THEN(w.i.SetValue(2, U("s")), w.i.GetValue(2, o.v))),
-    OP(INST "SetValue(const VLXUnicodeString&, const VLXTime&)", "value=3+",
-       THEN(w.i.SetValue(U("date"), kMinute), w.i.GetValue(3, o.v))),
-    OP(INST "SetValue(int, const VLXTime&)", "value=3+", THEN(w.i.SetValue(3, kMinute), w.i.GetValue(3, o.v))),
-    OP(INST "SetValue(const VLXUnicodeString&, VLXBoolean)", "value=4+",
-       THEN(w.i.SetValue(U("boolean"), VLXBoolean(1)), w.i.GetValue(4, o.v))),
-    OP(INST "SetValue(int, VLXBoolean)", "value=4+", THEN(w.i.SetValue(4, VLXBoolean(1)), w.i.GetValue(4, o.v))),
-    OP(INST "SetValue(const VLXUnicodeString&, const VLXBinary&)", "value=5+",
-       THEN(w.i.SetValue(U("binary"), kAb), w.i.GetValue(5, o.v))),
-    OP(INST "SetValue(int, const VLXBinary&)", "value=5+", THEN(w.i.SetValue(5, kAb), w.i.GetValue(5, o.v))),
-    OP(INST "SetValue(const VLXUnicodeString&, const VLXKDMInstance&)", "value=6+",
-       THEN(w.i.SetValue(U("instance"), w.t), w.i.GetValue(6, o.v))),
-    OP(INST "SetValue(int, const VLXKDMInstance&)", "value=6+", THEN(w.i.SetValue(6, w.t), w.i.GetValue(6, o.v))),
-    OP(LIST_NAMED("Int"), "value=0L+",
-       THEN(w.i.SetValue(U("integers"), ListOf<VLXRawCollint>({1, 2})), w.i.GetValue(7, o.v))),
-    OP(LIST_AT("Int"), "value=0L+", THEN(w.i.SetValue(7, ListOf<VLXRawCollint>({1})), w.i.GetValue(7, o.v))),
-    OP(LIST_NAMED("Int"), "value=0L+", THEN(w.i.SetValueIntegers(U("integers"), 2, 1, 2), w.i.GetValue(7, o.v))),
-    OP(LIST_AT("Int"), "value=0L+", THEN(w.i.SetValueIntegers(7, 1, 3), w.i.GetValue(7, o.v))),
-    OP(LIST_NAMED("Double"), "value=1L+",
-       THEN(w.i.SetValue(U("doubles"), ListOf<VLXRawColldouble>({0.5})), w.i.GetValue(8, o.v))),
-    OP(LIST_AT("Double"), "value=1L+", THEN(w.i.SetValue(8, ListOf<VLXRawColldouble>({0.5})), w.i.GetValue(8, o.v))),
-    OP(LIST_NAMED("Double"), "value=1L+", THEN(w.i.SetValueDoubles(U("doubles"), 1, 0.5), w.i.GetValue(8, o.v))),
-    OP(LIST_AT("Double"), "value=1L+", THEN(w.i.SetValueDoubles(8, 2, 0.5, 1.5), w.i.GetValue(8, o.v))),
-    OP(LIST_NAMED("VLXUnicodeString"), "value=2L+",
-       THEN(w.i.SetValue(U("strings"), ListOf<VLXListOfVLXUnicodeString>({U("a")})), w.i.GetValue(9, o.v))),
-    OP(LIST_AT("VLXUnicodeString"), "value=2L+",
-       THEN(w.i.SetValue(9, ListOf<VLXListOfVLXUnicodeString>({U("a")})), w.i.GetValue(9, o.v))),
-    OP(LIST_NAMED("VLXUnicodeString"), "value=2L+",
-       THEN(w.i.SetValueStrings(U("strings"), 1, "a"), w.i.GetValue(9, o.v))),
-    OP(LIST_AT("VLXUnicodeString"), "value=2L+", THEN(w.i.SetValueStrings(9, 0), w.i.GetValue(9, o.v))),
-    OP(LIST_NAMED("VLXTime"), "value=3L+",
-       THEN(w.i.SetValue(U("dates"), ListOf<VLXListValVLXTime>({kMinute})), w.i.GetValue(10, o.v))),
-    OP(LIST_AT("VLXTime"), "value=3L+",
-       THEN(w.i.SetValue(10, ListOf<VLXListValVLXTime>({kMinute})), w.i.GetValue(10, o.v))),
-    OP(LIST_NAMED("VLXTime"), "value=3L+", THEN(w.i.SetValueDates(U("dates"), 1, &kMinute), w.i.GetValue(10, o.v))),
-    OP(LIST_AT("VLXTime"), "value=3L+", THEN(w.i.SetValueDates(10, 1, &kMinute), w.i.GetValue(10, o.v))),
-    OP(LIST_NAMED("VLXBoolean"), "value=4L+",
-       THEN(w.i.SetValue(U("booleans"), ListOf<VLXListValVLXBoolean>({VLXBoolean(1)})), w.i.GetValue(11, o.v))),
-    OP(LIST_AT("VLXBoolean"), "value=4L+",
-       THEN(w.i.SetValue(11, ListOf<VLXListValVLXBoolean>({VLXBoolean(0)})), w.i.GetValue(11, o.v))),
-    OP(LIST_NAMED("VLXBoolean"), "value=4L+",
-       THEN(w.i.SetValueBooleans(U("booleans"), 2, 1, 0), w.i.GetValue(11, o.v))),
-    OP(LIST_AT("VLXBoolean"), "value=4L+", THEN(w.i.SetValueBooleans(11, 1, 1), w.i.GetValue(11, o.v))),
-    OP(LIST_NAMED("VLXBinary"), "value=5L+",
-       THEN(w.i.SetValue(U("binaries"), ListOf<VLXListValVLXBinary>({kAb})), w.i.GetValue(12, o.v))),
-    OP(LIST_AT("VLXBinary"), "value=5L+",
-       THEN(w.i.SetValue(12, ListOf<VLXListValVLXBinary>({kAb})), w.i.GetValue(12, o.v))),
-    OP(LIST_NAMED("VLXBinary"), "value=5L+", THEN(w.i.SetValueBinaries(U("binaries"), 1, &kAb), w.i.GetValue(12, o.v))),
-    OP(LIST_AT("VLXBinary"), "value=5L+", THEN(w.i.SetValueBinaries(12, 1, &kAb), w.i.GetValue(12, o.v))),
-    OP(LIST_NAMED("VLXKDMInstance"), "value=6L+",
-       THEN(w.i.SetValue(U("instances"), ListOf<VLXListValVLXKDMInstance>({w.t})), w.i.GetValue(13, o.v))),
-    OP(LIST_AT("VLXKDMInstance"), "value=6L+",
-       THEN(w.i.SetValue(13, ListOf<VLXListValVLXKDMInstance>({w.t})), w.i.GetValue(13, o.v))),
-    OP(LIST_NAMED("VLXKDMInstance"), "value=6L+",
-       THEN(w.i.SetValueInstances(U("instances"), 1, &w.t), w.i.GetValue(13, o.v))),
-    OP(LIST_AT("VLXKDMInstance"), "value=6L+", THEN(w.i.SetValueInstances(13, 2, &w.t, &w.t), w.i.GetValue(13, o.v))),
+    SETS("VLXKDMInstanceValue&", "integer", 0, "value=0:5+", o.v),
+    SETS("int", "integer", 0, "value=0:7+", 7),
+    SETS("double", "double", 1, "value=1+", 2.5),
+    SETS("const VLXUnicodeString&", "string", 2, "value=2+", U("s")),
+    SETS("const VLXTime&", "date", 3, "value=3+", kMinute),
+    SETS("VLXBoolean", "boolean", 4, "value=4+", VLXBoolean(1)),
+    SETS("const VLXBinary&", "binary", 5, "value=5+", kAb),
+    SETS("const VLXKDMInstance&", "instance", 6, "value=6+", w.t),
+    LISTS("Int", "integers", 7, "value=0L+", ListOf<VLXRawCollint>({1, 2}), SetValueIntegers, 2, 1, 3),
+    LISTS("Double", "doubles", 8, "value=1L+", ListOf<VLXRawColldouble>({0.5}), SetValueDoubles, 2, 0.5, 1.5),
+    LISTS("VLXUnicodeString", "strings", 9, "value=2L+", ListOf<VLXListOfVLXUnicodeString>({U("a")}), SetValueStrings,
+          0),
+    LISTS("VLXTime", "dates", 10, "value=3L+", ListOf<VLXListValVLXTime>({kMinute}), SetValueDates, 1, &kMinute),
+    LISTS("VLXBoolean", "booleans", 11, "value=4L+", ListOf<VLXListValVLXBoolean>({VLXBoolean(0)}), SetValueBooleans, 2,
+          1, 0),
+    LISTS("VLXBinary", "binaries", 12, "value=5L+", ListOf<VLXListValVLXBinary>({kAb}), SetValueBinaries, 1, &kAb),
+    LISTS("VLXKDMInstance", "instances", 13, "value=6L+", ListOf<VLXListValVLXKDMInstance>({w.t}), SetValueInstances, 2,
+          &w.t, &w.t),
     OP(INST "ToString(VLXUnicodeString&)", "text", w.i.ToString(o.s)),
     OP(INST "ToString(VLXBoolean, VLXUnicodeString&)", "text", w.i.ToString(1, o.s)),
 
