@@ -126,24 +126,6 @@ TEST(Frame, AnExceptionPendingBeforeTheCallFailsItWithoutAJavaCall)
   EXPECT_EQ("before", NameOf(replica));
 }
 
-// Null Java answers give an empty text and a detached out-proxy; so does a lookup of an absent name.
-TEST(Frame, NullJavaResultsGiveEmptyValuesAndUnbuiltProxies)
-{
-  VLXKDMReplica nulls, real;
-  AttachNew(nulls, "com/velmora/tessara/testdoubles/NullReplica");
-  EXPECT_EQ("", NameOf(nulls));
-  ASSERT_EQ(VLX_S_OK, real.Build());
-  VLXKDMModelSet models;
-  ASSERT_EQ(VLX_S_OK, real.GetModels(models));
-  ASSERT_NE(nullptr, models.GetHandle());
-  EXPECT_EQ(VLX_S_OK, nulls.GetModels(models));
-  EXPECT_EQ(nullptr, models.GetHandle());
-  VLXKDMClassDef classDef;
-  ASSERT_EQ(VLX_S_OK, classDef.Build(U("Elsewhere")));
-  EXPECT_EQ(VLX_S_OK, real.GetClassDef(U("NoSuchClass"), classDef));
-  EXPECT_EQ(nullptr, classDef.GetHandle());
-}
-
 // Build attaches the proxy to a new Java object; a copy keeps the old one. An unbuilt proxy given as
 // an argument goes to Java as null: Java refuses it, and a failing Build leaves the proxy as it was.
 TEST(Frame, BuildAttachesANewObjectAndAFailedOneKeepsTheOld)

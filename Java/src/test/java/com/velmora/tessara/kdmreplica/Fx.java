@@ -243,11 +243,6 @@ final class Fx {
         return r;
     }
 
-    /** The rich schema with pending instances: texts XML cannot carry, NaN payloads, a missing mandatory value. */
-    static Replica richWithData() {
-        return pending(richSchema());
-    }
-
     private static Replica pending(Replica r) {
         Instance s = r.getModels().getItem("Supplier_2").createInstance();
         s.setValue("name", "a\u0002");

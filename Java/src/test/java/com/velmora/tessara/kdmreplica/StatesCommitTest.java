@@ -45,6 +45,7 @@ class StatesCommitTest {
         assertEquals("M,", states(p));
         person.getInstances().remove(p);
         assertEquals("D,", states(p));
+        assertEquals("Instance Person[id=\"ann\"] deleted", p.toString());
         assertEquals("Replica 'garage' (3 classes, 0 instances, 1 deleted)", r.toString());
         throwsWith(IllegalStateException.class, () -> p.setValue("name", "x"), "Person[id=\"ann\"]", "deleted");
         throwsWith(IllegalStateException.class, () -> p.setID("x"), "deleted");
