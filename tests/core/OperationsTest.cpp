@@ -254,6 +254,16 @@ struct Operation {
 #define MOD "VLXKDMModel::"
 #define ISET "VLXKDMInstanceSet::"
 #define VAL "VLXKDMInstanceValue::"
+// A text property's getter, and its setter read back through the getter.
+#define TEXT(prefix, proxy, P, got, value)                             \
+  OP(prefix "Get" #P "(VLXUnicodeString&)", got, w.proxy.Get##P(o.s)), \
+      OP(prefix "Set" #P "(const VLXUnicodeString&)", "text=" value,   \
+         THEN(w.proxy.Set##P(U(value)), w.proxy.Get##P(o.s)))
+// An enumeration's getter into out, and its setter read back as a number.
+#define ENUM(prefix, proxy, P, T, out, got, value, set)       \
+  OP(prefix "Get" #P "(" T "&)", got, w.proxy.Get##P(o.out)), \
+      OP(prefix "Set" #P "(" T ")", set,                      \
+         THEN(w.proxy.Set##P(value), AsNumber(w.proxy, &std::decay_t<decltype(w.proxy)>::Get##P, o.n)))
 // A value setter by attribute name and by position (sig: its value parameter), read back there.
 #define SETS(sig, name, position, landed, value)                       \
   OP(INST "SetValue(const VLXUnicodeString&, " sig ")", landed,        \
@@ -319,20 +329,13 @@ const Operation kOperations[] = {
     // ---- VLXKDMClassDef
     FREE(CLS "Build()", "classDef", o.c.Build()),
     FREE(CLS "Build(const VLXUnicodeString&)", "text=Made classDef", THEN(o.c.Build(U("Made")), o.c.GetClassName(o.s))),
-    OP(CLS "GetClassName(VLXUnicodeString&)", "text=Sample", w.c.GetClassName(o.s)),
-    OP(CLS "SetClassName(const VLXUnicodeString&)", "text=Renamed",
-       THEN(w.c.SetClassName(U("Renamed")), w.c.GetClassName(o.s))),
+    TEXT(CLS, c, ClassName, "text=Sample", "Renamed"),
     OP(CLS "GetSuperName(VLXUnicodeString&)", "text", w.c.GetSuperName(o.s)),
     OP(CLS "SetSuperName(const VLXUnicodeString&)", "text=Base",
        THEN(w.fc.SetSuperName(U("Base")), w.fc.GetSuperName(o.s))),
-    OP(CLS "GetUuid(VLXUnicodeString&)", "text", w.c.GetUuid(o.s)),
-    OP(CLS "SetUuid(const VLXUnicodeString&)", "text=u-1", THEN(w.c.SetUuid(U("u-1")), w.c.GetUuid(o.s))),
-    OP(CLS "GetQKAComment(VLXUnicodeString&)", "text", w.c.GetQKAComment(o.s)),
-    OP(CLS "SetQKAComment(const VLXUnicodeString&)", "text=said",
-       THEN(w.c.SetQKAComment(U("said")), w.c.GetQKAComment(o.s))),
-    OP(CLS "GetQKADerivability(VLXUnicodeString&)", "text", w.c.GetQKADerivability(o.s)),
-    OP(CLS "SetQKADerivability(const VLXUnicodeString&)", "text=derived",
-       THEN(w.c.SetQKADerivability(U("derived")), w.c.GetQKADerivability(o.s))),
+    TEXT(CLS, c, Uuid, "text", "u-1"),
+    TEXT(CLS, c, QKAComment, "text", "said"),
+    TEXT(CLS, c, QKADerivability, "text", "derived"),
     OP(CLS "GetScopeNames(VLXListOfVLXUnicodeString&)", "texts", w.c.GetScopeNames(o.ts)),
     OP(CLS "SetScopeNames(const VLXListOfVLXUnicodeString&)", "texts=a,b",
        THEN(w.c.SetScopeNames(ListOf<VLXListOfVLXUnicodeString>({U("a"), U("b")})), w.c.GetScopeNames(o.ts))),
@@ -344,13 +347,9 @@ const Operation kOperations[] = {
     OP(CLS "SetExtensibility(VLXBoolean)", "flag=0", THEN(w.c.SetExtensibility(0), w.c.IsExtensible(o.f))),
     OP(CLS "IsPersistent(VLXBoolean&)", "flag", w.c.IsPersistent(o.f)),
     OP(CLS "SetPersistency(VLXBoolean)", "flag=0", THEN(w.c.SetPersistency(0), w.c.IsPersistent(o.f))),
-    OP(CLS "GetClassType(VLXKDMClassType::Type&)", "classType=1", w.c.GetClassType(o.ct)),
-    OP(CLS "SetClassType(VLXKDMClassType::Type)", "number=0",
-       THEN(w.c.SetClassType(VLXKDMClassType::Class), AsNumber(w.c, &VLXKDMClassDef::GetClassType, o.n))),
-    OP(CLS "GetSoftwareVisibility(VLXKDMVisibility::Mode&)", "visibility=1", w.c.GetSoftwareVisibility(o.vis)),
-    OP(CLS "SetSoftwareVisibility(VLXKDMVisibility::Mode)", "number=2",
-       THEN(w.c.SetSoftwareVisibility(VLXKDMVisibility::Private),
-            AsNumber(w.c, &VLXKDMClassDef::GetSoftwareVisibility, o.n))),
+    ENUM(CLS, c, ClassType, "VLXKDMClassType::Type", ct, "classType=1", VLXKDMClassType::Class, "number=0"),
+    ENUM(CLS, c, SoftwareVisibility, "VLXKDMVisibility::Mode", vis, "visibility=1", VLXKDMVisibility::Private,
+         "number=2"),
     OP(CLS "GetAttributes(VLXKDMAttributeDefList&)", "attributes", w.c.GetAttributes(o.al)),
     OP(CLS "ToString(VLXUnicodeString&)", "text", w.c.ToString(o.s)),
 
@@ -359,11 +358,8 @@ const Operation kOperations[] = {
          THEN(o.a.Build(U("made"), VLXKDMAttributeType::Boolean), o.a.GetAttributeType(o.type))),
     OP(ATT "GetAttributeName(VLXUnicodeString&)", "text=double", w.a.GetAttributeName(o.s)),
     OP(ATT "GetAttributeType(VLXKDMAttributeType::Type&)", "type=1", w.a.GetAttributeType(o.type)),
-    OP(ATT "GetUuid(VLXUnicodeString&)", "text", w.a.GetUuid(o.s)),
-    OP(ATT "SetUuid(const VLXUnicodeString&)", "text=u-2", THEN(w.a.SetUuid(U("u-2")), w.a.GetUuid(o.s))),
-    OP(ATT "GetQKAComment(VLXUnicodeString&)", "text", w.a.GetQKAComment(o.s)),
-    OP(ATT "SetQKAComment(const VLXUnicodeString&)", "text=noted",
-       THEN(w.a.SetQKAComment(U("noted")), w.a.GetQKAComment(o.s))),
+    TEXT(ATT, a, Uuid, "text", "u-2"),
+    TEXT(ATT, a, QKAComment, "text", "noted"),
     OP(ATT "GetTargetNames(VLXListOfVLXUnicodeString&)", "texts", w.a.GetTargetNames(o.ts)),
     OP(ATT "SetTargetNames(const VLXListOfVLXUnicodeString&)", "texts=P",
        THEN(w.a.SetTargetNames(ListOf<VLXListOfVLXUnicodeString>({U("P")})), w.a.GetTargetNames(o.ts))),
@@ -374,17 +370,11 @@ const Operation kOperations[] = {
        THEN(w.a.SetTargetRefs(ListOf<VLXListOfVLXUnicodeString>({U("r")})), w.a.GetTargetRefs(o.ts))),
     OP(ATT "SetTargetRefs(const VLXListOfVLXUnicodeString&)", "texts=r,s,t",
        THEN(w.a.SetTargetRefs(3, "r", "s", "t"), w.a.GetTargetRefs(o.ts))),
-    OP(ATT "GetAggregationType(VLXKDMAggregationType::Type&)", "aggregation=1", w.a.GetAggregationType(o.agg)),
-    OP(ATT "SetAggregationType(VLXKDMAggregationType::Type)", "number=0",
-       THEN(w.a.SetAggregationType(VLXKDMAggregationType::Composition),
-            AsNumber(w.a, &VLXKDMAttributeDef::GetAggregationType, o.n))),
-    OP(ATT "GetAccessMode(VLXKDMAccessMode::Mode&)", "access=1", w.a.GetAccessMode(o.acc)),
-    OP(ATT "SetAccessMode(VLXKDMAccessMode::Mode)", "number=0",
-       THEN(w.a.SetAccessMode(VLXKDMAccessMode::Read), AsNumber(w.a, &VLXKDMAttributeDef::GetAccessMode, o.n))),
-    OP(ATT "GetSoftwareVisibility(VLXKDMVisibility::Mode&)", "visibility=2", w.a.GetSoftwareVisibility(o.vis)),
-    OP(ATT "SetSoftwareVisibility(VLXKDMVisibility::Mode)", "number=1",
-       THEN(w.a.SetSoftwareVisibility(VLXKDMVisibility::Protected),
-            AsNumber(w.a, &VLXKDMAttributeDef::GetSoftwareVisibility, o.n))),
+    ENUM(ATT, a, AggregationType, "VLXKDMAggregationType::Type", agg, "aggregation=1",
+         VLXKDMAggregationType::Composition, "number=0"),
+    ENUM(ATT, a, AccessMode, "VLXKDMAccessMode::Mode", acc, "access=1", VLXKDMAccessMode::Read, "number=0"),
+    ENUM(ATT, a, SoftwareVisibility, "VLXKDMVisibility::Mode", vis, "visibility=2", VLXKDMVisibility::Protected,
+         "number=1"),
     OP(ATT "GetLength(int&)", "number=12", w.a.GetLength(o.n)),
     OP(ATT "SetLength(int)", "number=-3", THEN(w.a.SetLength(-3), w.a.GetLength(o.n))),
     OP(ATT "IsMandatory(VLXBoolean&)", "flag=0", w.a.IsMandatory(o.f)),
