@@ -154,6 +154,8 @@ class BinaryHostileTest {
             row(changed(plain, b -> b[4] = 2), false, "unsupported version 2"),
             row(changed(plain, b -> b[5] = 4), false, "unknown flags 0x4"),
             row(changed(plain, b -> b[7] = 1), false, "reserved header bytes"),
+            row(packed, false, "the bytes were written compressed but were read as uncompressed", "offset 5 of the buffer"),
+            row(plain, true, "the bytes were written uncompressed but were read as compressed"),
             row(changed(plain, b -> b[16] ^= 1), false, "checksum mismatch", "offset 16 of the buffer"),
             // classes
             row(sealed(2, o -> cls(cls(o, "A", ""), "A", "")), false, "two classes are named 'A'"),
