@@ -9,8 +9,6 @@ using namespace corvexa_test;
 
 namespace {
 
-VLXTime Time(time_t seconds) { return Seconds(seconds); }
-
 VLXKDMInstanceValue Read(VLXKDMInstance& in, int position)
 {
   VLXKDMInstanceValue value;
@@ -53,7 +51,7 @@ TEST(VariadicSetters, SendWhatTheListSettersSend)
   SampleReplica s;
   VLXKDMInstance in = s.Create(), t1 = s.Create(), t2 = s.Create();
   const VLXBinary b1("ab", 2), b2, b3("\0c", 2);
-  const VLXTime d1 = Time(5), d2 = Time(0), d3 = Time(1700000000);
+  const VLXTime d1 = Seconds(5), d2 = Seconds(0), d3 = Seconds(1700000000);
   SendsWhatTheListSetterSends(
       in, 7, [&](auto x, int k) { return in.SetValueIntegers(x, k, 1, 2, 3); }, ListOf<VLXRawCollint>({1, 2, 3}));
   SendsWhatTheListSetterSends(
@@ -116,8 +114,8 @@ TEST(Values, DatesBefore1970AndBooleansReadBackAsWritten)
   const time_t seconds[] = {-86400, -305942400, -1, -62135596800};
   VLXListValVLXTime dates;
   for (time_t t : seconds) {
-    dates.Append(Time(t));
-    ASSERT_EQ(VLX_S_OK, instance.SetValue(U("date"), Time(t)));
+    dates.Append(Seconds(t));
+    ASSERT_EQ(VLX_S_OK, instance.SetValue(U("date"), Seconds(t)));
     VLXKDMInstanceValue value = Read(instance, 3);
     ASSERT_EQ(VLX_S_OK, instance.SetValue(U("date"), value));  // read-modify-write
     EXPECT_EQ(t, Read(instance, 3).GetDate().Gettime_t());
@@ -185,7 +183,7 @@ TEST(VariadicSetters, ANegativeCountOrANullPointerIsRefusedChangingNothing)
   ASSERT_EQ(VLX_S_OK, attribute.Build(U("a"), VLXKDMAttributeType::Relationship));
   ASSERT_EQ(VLX_S_OK, attribute.SetTargetNames(1, "kept"));
   ASSERT_EQ(VLX_S_OK, attribute.SetTargetRefs(1, "kept"));
-  const VLXTime one = Time(1);
+  const VLXTime one = Seconds(1);
   const VLXTime* noTime = nullptr;
   const VLXKDMInstance* noInstance = nullptr;
   const std::string negative = "the count -1 is negative";

@@ -58,6 +58,7 @@ class XmlHostileTest {
     @AfterEach
     void tearDown() {
         Replica.setFeature("validate", false);
+        Replica.setFeature("indent", true);
         Replica.setSchemaLocation(null);
         Replica.setSchemaFolder(null);
         assertEquals(0, net.connections(), "nothing may be fetched from the network");
@@ -174,15 +175,10 @@ class XmlHostileTest {
     @Test
     void everyTruncationOfADocumentFailsCleanly() throws Exception {
         Replica.setFeature("indent", false);
-        String xml;
-        try {
-            Instance x = target.getModels().getItem("Part").getInstances().getItem(0);
-            target.getModels().getItem("Part").createInstance().setValue("peer", x);
-            x.setValue("tags", new String[] {"a", "b\u0001"});
-            xml = target.getXml(true, true);
-        } finally {
-            Replica.setFeature("indent", true);
-        }
+        Instance x = target.getModels().getItem("Part").getInstances().getItem(0);
+        target.getModels().getItem("Part").createInstance().setValue("peer", x);
+        x.setValue("tags", new String[] {"a", "b\u0001"});
+        String xml = target.getXml(true, true);
         Replica copy = new Replica("copy");
         copy.insertSchemaString(target.getXsd());
         String copyBefore = dump(copy);

@@ -6,7 +6,6 @@ import static org.junit.jupiter.api.Assertions.*;
 import java.nio.file.Files;
 import java.nio.file.Path;
 import java.util.Arrays;
-import org.junit.jupiter.api.AfterEach;
 import org.junit.jupiter.api.Test;
 import org.junit.jupiter.api.io.TempDir;
 import org.junit.jupiter.params.ParameterizedTest;
@@ -18,11 +17,6 @@ class XsdTest {
 
     @TempDir
     Path dir;
-
-    @AfterEach
-    void resetFeatures() {
-        Replica.setFeature("indent", true);
-    }
 
     /** Each class as "Name(Super) abstract: attr Type*! length [targets], ..." ('*' multi-valued, '!' mandatory). */
     private static String shape(Replica r) {
