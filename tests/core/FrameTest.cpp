@@ -106,44 +106,6 @@ TEST(Frame, AJavaExceptionIsReportedClearedAndLeavesOutParametersAlone)
   EXPECT_EQ("other", NameOf(other));
 }
 
-// An exception the caller's own JNI code left pending fails the operation without a Java call, and
-// is reported and cleared, on a built proxy and on an unbuilt one.
-TEST(Frame, AnExceptionPendingBeforeTheCallFailsItWithoutAJavaCall)
-{
-  VLXKDMReplica replica, unbuilt;
-  ASSERT_EQ(VLX_S_OK, replica.Build(U("before")));
-  JNIEnv* env = Env();
-  for (VLXKDMReplica* proxy : {&replica, &unbuilt}) {
-    Local cls(env->FindClass("java/lang/IllegalArgumentException"));
-    ASSERT_EQ(0, env->ThrowNew(static_cast<jclass>(cls.get()), "left by the caller"));
-    VLXUnicodeString name("kept");
-    EXPECT_EQ(VLX_E_FAIL, proxy->GetName(name));
-    EXPECT_EQ("kept", Text(name));
-    EXPECT_FALSE(env->ExceptionCheck());
-    const std::string text = PeekLastError().text;
-    EXPECT_TRUE(Has(text, "java.lang.IllegalArgumentException") && Has(text, "left by the caller")) << text;
-  }
-  EXPECT_EQ("before", NameOf(replica));
-}
-
-// Null Java answers give an empty text and a detached out-proxy; so does a lookup of an absent name.
-TEST(Frame, NullJavaResultsGiveEmptyValuesAndUnbuiltProxies)
-{
-  VLXKDMReplica nulls, real;
-  AttachNew(nulls, "com/velmora/tessara/testdoubles/NullReplica");
-  EXPECT_EQ("", NameOf(nulls));
-  ASSERT_EQ(VLX_S_OK, real.Build());
-  VLXKDMModelSet models;
-  ASSERT_EQ(VLX_S_OK, real.GetModels(models));
-  ASSERT_NE(nullptr, models.GetHandle());
-  EXPECT_EQ(VLX_S_OK, nulls.GetModels(models));
-  EXPECT_EQ(nullptr, models.GetHandle());
-  VLXKDMClassDef classDef;
-  ASSERT_EQ(VLX_S_OK, classDef.Build(U("Elsewhere")));
-  EXPECT_EQ(VLX_S_OK, real.GetClassDef(U("NoSuchClass"), classDef));
-  EXPECT_EQ(nullptr, classDef.GetHandle());
-}
-
 // Build attaches the proxy to a new Java object; a copy keeps the old one. An unbuilt proxy given as
 // an argument goes to Java as null: Java refuses it, and a failing Build leaves the proxy as it was.
 TEST(Frame, BuildAttachesANewObjectAndAFailedOneKeepsTheOld)

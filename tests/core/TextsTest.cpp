@@ -53,12 +53,9 @@ TEST(Strings, AMalformedTextArgumentGivesEachOperationsOwnCode)
   VLXKDMInstanceValue value, holder;
   value.SetInteger(8);
   holder.SetInteger(4);
-  // Each malformed text and the offset of its first bad byte (after the ASCII start copied first).
-  const std::pair<const char*, int> kinds[] = {{"bad \xC3\x28 byte", 4},
-                                               {"\xED\xA0\x80 surrogate", 0},
-                                               {"\xC0\xAF overlong", 0},
-                                               {"cut \xE6\x95", 4},
-                                               {"\xF5\x80\x80\x80 too big", 0}};
+  // A malformed text at the start and after an ASCII start copied first, with the offset of its first
+  // bad byte (every kind of malformed text is the string type's own table, in the base suite).
+  const std::pair<const char*, int> kinds[] = {{"\xED\xA0\x80 surrogate", 0}, {"cut \xE6\x95", 4}};
   for (const auto& [malformed, offset] : kinds) {
     const VLXUnicodeString bad(malformed);
     const VLXListOfVLXUnicodeString badList = ListOf<VLXListOfVLXUnicodeString>({U("fine"), bad});

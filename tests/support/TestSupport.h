@@ -97,11 +97,6 @@ inline jmethodID MethodOf(jobject object, const char* name, const char* signatur
   Local cls(Env()->GetObjectClass(object));
   return Env()->GetMethodID(static_cast<jclass>(cls.get()), name, signature);
 }
-inline jlong TimeOf(jobject date)
-{
-  const jlong value = Env()->CallLongMethod(date, MethodOf(date, "getTime", "()J"));
-  return NoPending("getTime") ? value : 0;
-}
 // Whether two Java objects are equal, arrays element by element (java.util.Objects.deepEquals).
 inline bool DeepEquals(jobject a, jobject b)
 {

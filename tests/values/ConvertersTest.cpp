@@ -1,9 +1,8 @@
-// The value converters: times at the rounding boundaries, boxed scalars, and the list converters
+// The value converters: times at the rounding boundaries, null Java objects, and the list converters
 // with null elements, elements that throw and proxies without Java object. Every Java call the
 // converters make runs under the JVM's JNI checks: a call with an exception pending or a local
 // reference left behind fails the process.
 #include <climits>
-#include <cmath>
 
 #include "CallFrame.h"
 #include "TestSupport.h"
@@ -68,36 +67,6 @@ TEST_F(Converters, DateMillisecondsRoundToSecondsAtTheBoundaries)
   for (jobject d : dates) env->DeleteLocalRef(d);
 }
 
-// Seconds become milliseconds exactly, and every whole second comes back as it was, before 1970
-// and at the ends of the range too.
-TEST_F(Converters, SecondsBecomeMillisecondsAndComeBackUnchanged)
-{
-  const time_t cases[] = {1, 2, 0, -1, -2, -86400, -305942400, 1700000000, LLONG_MAX / 1000, LLONG_MIN / 1000};
-  VLXListValVLXTime list;
-  for (const time_t seconds : cases) {
-    SCOPED_TRACE(seconds);
-    const jlong ms = seconds * 1000;
-    jobject out = nullptr;
-    ASSERT_EQ(VLX_S_OK, Values::ConvertToJavaType(env, Seconds(seconds), out));
-    Local date(out);
-    EXPECT_TRUE(IsExactly(date.get(), "java/util/Date"));
-    EXPECT_EQ(ms, TimeOf(date.get()));
-    VLXTime back;
-    ASSERT_EQ(VLX_S_OK, Values::BuildFromJavaType(env, date.get(), back));
-    EXPECT_EQ(seconds, back.Gettime_t());
-    list.Append(Seconds(seconds));
-  }
-  jobject out = nullptr;
-  ASSERT_EQ(VLX_S_OK, Values::ConvertToJavaType(env, list, out));
-  Local array(out);
-  EXPECT_TRUE(IsExactly(array.get(), "[Ljava/util/Date;"));
-  ASSERT_EQ(list.Size(), Length(array.get()));
-  for (int i = 0; i < list.Size(); ++i) {
-    Local date(env->GetObjectArrayElement(static_cast<jobjectArray>(array.get()), i));
-    EXPECT_EQ(cases[i] * 1000, TimeOf(date.get()));
-  }
-}
-
 TEST_F(Converters, ATimeBeyondTheRangeOfAJavaDateFailsAndMakesNothing)
 {
   for (time_t seconds : {static_cast<time_t>(LLONG_MAX), static_cast<time_t>(LLONG_MIN / 1000 - 1)}) {
@@ -115,32 +84,7 @@ TEST_F(Converters, ATimeBeyondTheRangeOfAJavaDateFailsAndMakesNothing)
   }
 }
 
-// ---- Boxed scalars ---------------------------------------------------------------------------
-
-// value as a boxed object of the class at path, and that object back as a value.
-template <class T>
-T Boxed(JNIEnv* env, T value, const char* path)
-{
-  jobject out = nullptr;
-  EXPECT_EQ(VLX_S_OK, Values::ConvertToJavaType(env, value, out));
-  Local boxed(out);
-  EXPECT_TRUE(IsExactly(boxed.get(), path));
-  T back = 7;
-  EXPECT_EQ(VLX_S_OK, Values::BuildFromJavaType(env, boxed.get(), back));
-  return back;
-}
-
-TEST_F(Converters, BoxedScalarsRoundTripThroughTheirJavaClasses)
-{
-  for (int value : {0, 1, -1, INT_MAX, INT_MIN}) EXPECT_EQ(value, Boxed(env, value, "java/lang/Integer"));
-  for (VLXBoolean value : {VLXBoolean(0), VLXBoolean(1)}) EXPECT_EQ(value, Boxed(env, value, "java/lang/Boolean"));
-  for (double value : {0.0, -0.0, 1.5, -1e308, 4.9e-324, HUGE_VAL}) {
-    const double back = Boxed(env, value, "java/lang/Double");
-    EXPECT_EQ(value, back);
-    EXPECT_EQ(std::signbit(value), std::signbit(back));
-  }
-  EXPECT_TRUE(std::isnan(Boxed(env, static_cast<double>(NAN), "java/lang/Double")));
-}
+// ---- Null Java objects -----------------------------------------------------------------------
 
 TEST_F(Converters, ANullJavaObjectFailsForAScalarAndEmptiesAList)
 {
@@ -200,29 +144,6 @@ TEST_F(Converters, ADateArrayWithANullOrThrowingElementFailsAfterTheElementsBefo
   EXPECT_LT(Values::BuildFromJavaType(env, throwing.get(), time), 0);
   EXPECT_EQ(42, time.Gettime_t());
   EXPECT_FALSE(env->ExceptionCheck());
-}
-
-TEST_F(Converters, AnArrayOfByteArraysKeepsTheElementsBeforeOneThatIsNoByteArray)
-{
-  JNIEnv* e = env;
-  const jbyte raw[] = {1, 2, 3};
-  Local bytes(e->NewByteArray(3));
-  e->SetByteArrayRegion(static_cast<jbyteArray>(bytes.get()), 0, 3, raw);
-  Local empty(e->NewByteArray(0));
-  Local text(e->NewStringUTF("not bytes"));
-
-  Local good(NewArray("[B", {bytes.get(), nullptr, empty.get()}));
-  VLXListValVLXBinary list;
-  ASSERT_EQ(VLX_S_OK, Values::BuildFromJavaType(env, good.get(), list));
-  ASSERT_EQ(3, list.Size());
-  EXPECT_TRUE(list[1] == VLXBinary(raw, 3));
-  EXPECT_EQ(0, list[2].getLength());  // a null element gives an empty buffer
-  EXPECT_EQ(0, list[3].getLength());
-
-  Local mixed(NewArray("java/lang/Object", {bytes.get(), text.get(), bytes.get()}));
-  EXPECT_LT(Values::BuildFromJavaType(env, mixed.get(), list), 0);
-  ASSERT_EQ(1, list.Size());
-  EXPECT_TRUE(list[1] == VLXBinary(raw, 3));
 }
 
 // (Lists of every type to Java, empty ones too, are crossed by the value holder suite.)

@@ -1,5 +1,5 @@
 // The list of instance proxies: construction, equality by Java identity, search, de-duplication,
-// resizing, the two Array forms, sorting, copies, and the global references its elements hold.
+// resizing, the two Array forms, sorting, and the global references its elements hold.
 #include "TestSupport.h"
 
 using namespace corvexa_test;
@@ -115,28 +115,6 @@ TEST_F(InstanceList, ArrayOfPointersExposesTheListsOwnElementsAndArrayOfProxiesC
   EXPECT_TRUE(proxies[0] == A && proxies[1] == D && proxies[2] == C);
   ASSERT_EQ(VLX_S_OK, proxies[0].SetHandle(Env(), E.GetHandle()));
   EXPECT_EQ("ADC", Letters(list));
-}
-
-TEST_F(InstanceList, CopiesAndAssignmentsAreIndependent)
-{
-  VLXListValVLXKDMInstance target = Of({&E});
-  {
-    VLXListValVLXKDMInstance source = Of({&A, &B});
-    target = source;
-    VLXListValVLXKDMInstance copy(source);
-    source.RemovePosition(1);
-    source.Append(C);
-    EXPECT_EQ("BC", Letters(source));
-    EXPECT_EQ("AB", Letters(copy));
-    EXPECT_NE(target[1].GetHandle(), copy[1].GetHandle());
-  }
-  EXPECT_EQ("AB", Letters(target));
-  target = target;
-  EXPECT_EQ("AB", Letters(target));
-  target.RemoveAll(VLXCollec::KeepMemory);
-  EXPECT_EQ(0, target.Size());
-  target.Append(A);
-  EXPECT_EQ("A", Letters(target));
 }
 
 // Orders elements by the letter of their object (so by identity, not by proxy address).

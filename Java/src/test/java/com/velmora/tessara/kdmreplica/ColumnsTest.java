@@ -56,10 +56,6 @@ class ColumnsTest {
         return out;
     }
 
-    private static void same(Object expected, Object actual, String what) {
-        assertArrayEquals(new Object[] {expected}, new Object[] {actual}, what);
-    }
-
     /** Columns of 3 rows for NAMES; texts with an unpaired surrogate, empty values and lists. */
     private static Object[] columns(Instance a, Instance b) {
         return new Object[] {new int[] {7, Integer.MIN_VALUE, 0}, new double[] {Double.NaN, -0.0, 1e300},

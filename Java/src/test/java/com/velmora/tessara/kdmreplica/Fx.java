@@ -105,6 +105,11 @@ final class Fx {
         }
     }
 
+    /** Asserts that two values are equal, arrays (nested ones too) by content. */
+    static void same(Object expected, Object actual, String... what) {
+        assertArrayEquals(new Object[] {expected}, new Object[] {actual}, String.join(" ", what));
+    }
+
     /** Everything a replica holds, through public members (and the deleted lists), as text. */
     static String dump(Replica r) {
         StringBuilder b = new StringBuilder();

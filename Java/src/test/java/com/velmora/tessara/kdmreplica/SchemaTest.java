@@ -24,25 +24,6 @@ class SchemaTest {
     }
 
     @Test
-    void forgottenDeletedInstancesKeepTheAttributesTheyLeftWith() {
-        Instance fresh = inst(part, "weight", 3.0);
-        Instance committed = inst(part, "weight", 4.0);
-        r.commit();
-        part.getInstances().remove(committed);
-        r.commit(); // forgotten now
-        Instance neverCommitted = inst(part, "weight", 5.0);
-        part.getInstances().remove(neverCommitted);
-        part.getInstances().remove(fresh);
-        r.commit();
-        part.getClassDef().getAttributes().remove("name");
-        addAttr(part, "colour", AttributeType.String, false);
-        assertEquals(4.0, committed.getValue("weight"));
-        assertEquals(5.0, neverCommitted.getValue(1));
-        throwsWith(IllegalArgumentException.class, () -> neverCommitted.getValue("colour"), "'colour'");
-        assertEquals("Instance Part[deleted] deleted {weight=5.0}", neverCommitted.toString(true));
-    }
-
-    @Test
     void changingTheSuperClassRealignsInstancesAndRefusesUnknownCyclicOrClashingOnes() {
         addAttr(addClass(r, "Base", null), "uid", AttributeType.Integer, false);
         Instance b = inst(bolt, "thread", 6);

@@ -50,10 +50,6 @@ class ValuesTest {
         return Arguments.of(type, single, singleClass, multi, multiClass, wrong);
     }
 
-    private static void assertSameContent(Object expected, Object actual) {
-        assertArrayEquals(new Object[] {expected}, new Object[] {actual});
-    }
-
     /** Sets every element of an array (deeply) or a date to something else. */
     private static void scramble(Object v) {
         if (v instanceof Date) {
@@ -82,19 +78,19 @@ class ValuesTest {
         x.setValue("one", s);
         Object back = x.getValue("one");
         assertSame(singleClass, back.getClass());
-        assertSameContent(s, back);
-        assertSameContent(back, x.getValue(0));
+        same(s, back);
+        same(back, x.getValue(0));
         Object m = multi.apply(target);
         x.setValue(1, m);
         Object backs = x.getValue("many");
         assertSame(multiClass, backs.getClass());
-        assertSameContent(m, backs);
+        same(m, backs);
         // what was given and what was returned are copies: changing them changes nothing held
         for (Object changed : new Object[] {s, back, m, backs}) {
             scramble(changed);
         }
-        assertSameContent(single.apply(target), x.getValue("one"));
-        assertSameContent(multi.apply(target), x.getValue("many"));
+        same(single.apply(target), x.getValue("one"));
+        same(multi.apply(target), x.getValue("many"));
         throwsWith(IllegalArgumentException.class, () -> x.setValue("one", multi.apply(target)), "'Thing.one'",
                 type.name(), Values.className(m));
         throwsWith(IllegalArgumentException.class, () -> x.setValue("many", single.apply(target)), "'Thing.many'",
@@ -102,8 +98,8 @@ class ValuesTest {
         throwsWith(IllegalArgumentException.class, () -> x.setValue("one", wrong), "'Thing.one'", Values.className(wrong));
         throwsWith(IllegalArgumentException.class, () -> x.setValue("many", wrong), "'Thing.many'");
         // failed writes left the values alone
-        assertSameContent(single.apply(target), x.getValue("one"));
-        assertSameContent(multi.apply(target), x.getValue("many"));
+        same(single.apply(target), x.getValue("one"));
+        same(multi.apply(target), x.getValue("many"));
         x.setValue("one", null);
         x.clearValue(1);
         assertFalse(x.isValuated("one") || x.isValuated(1));

@@ -80,26 +80,13 @@ class XmlValueTextTest {
         assertEquals(expected, bits(ValueTexts.parseDouble(text, null)), text);
     }
 
-    @ParameterizedTest
-    @ValueSource(strings = {
-        // halfway between two doubles: ties go to the even one
-        "9007199254740993", "9007199254740995", "9007199254740993.0", "4503599627370496.5", "4503599627370497.5",
-        "2.4703282292062327e-324", "2.4703282292062328e-324",
-        // the ends of the normal and subnormal ranges and beyond
-        "2.2250738585072011e-308", "2.2250738585072012e-308", "2.2250738585072014E-308", "4.9E-324", "5e-324",
-        "1e-325", "1.7976931348623157E308", "1.7976931348623158e308", "1.7976931348623159e308", "1e309",
-        "0e999999", "1e999999", "1e-999999", "-1e999999",
-        // known hard cases, long and short
-        "1e23", "8.41e21", "5.0e-324", "9.8813129168249309e-324", "1.00000000000000011102230246251565404236316680908203125",
-        "7.2057594037927933e16", "0.1", "0.3", "123456789012345678", "9999999999999999999", "18446744073709551615",
-        "18446744073709551616", "0.000000000000000000000000000001", "1000000000000000000000000", "000000001.5e0",
-        "3.0000000000000004", "-0.0", "+0e-5", "1E22", "1E23", "9007199254740992e-22", "9007199254740993e22"})
-    void hardDecimalsAreReadExactly(String text) {
-        readLikeTheJdk(text);
-    }
-
     @Test
     void decimalsOfEveryShapeAreReadExactly() {
+        // ties to even, rounding up into the next binade, subnormals, and the largest double and beyond
+        for (String hard : new String[] {"9007199254740993", "4503599627370497.5", "18446744073709551615",
+            "2.4703282292062327e-324", "1.7976931348623159e308", "1.00000000000000011102230246251565404236316680908203125"}) {
+            readLikeTheJdk(hard);
+        }
         Random rnd = new Random(7);
         for (int i = 0; i < 200_000; i++) {
             StringBuilder b = new StringBuilder();
@@ -169,15 +156,5 @@ class XmlValueTextTest {
         Object m = answer(() -> ValueTexts.parseDate(text));
         assertTrue(m instanceof String && ((String) m).contains("'" + text + "'"), String.valueOf(m));
         assertEquals(m, answer(() -> ValueTexts.parseDate(chars(text), text.length())));
-    }
-
-    @ParameterizedTest
-    @CsvSource(delimiter = '|', value = {"2024-01-01T24:00:00.000Z|2024-01-02T00:00:00Z",
-        "2024-01-01T00:00:00.000+01:00|2023-12-31T23:00:00Z", "2024-01-01T00:00:00Z|2024-01-01T00:00:00Z",
-        "12024-01-01T00:00:00.000Z|+12024-01-01T00:00:00Z", "1969-12-31T23:00:00.000+01:00|1969-12-31T22:00:00Z",
-        "' 2024-01-01T00:00:00.000Z'|2024-01-01T00:00:00Z"})
-    void otherDateFormsTakeTheGeneralPath(String text, String instant) {
-        assertEquals(Instant.parse(instant).toEpochMilli(), ValueTexts.parseDate(text));
-        assertEquals(Instant.parse(instant).toEpochMilli(), ValueTexts.parseDate(chars(text), text.length()));
     }
 }
