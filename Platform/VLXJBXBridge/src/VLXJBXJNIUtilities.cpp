@@ -289,6 +289,25 @@ bool LauncherAccepts(const std::vector<std::string>& options, std::string& refus
   return false;
 }
 
+// The directories the dynamic loader searches for a library this one loads: its run path first.
+std::vector<std::string> RunPathDirectories()
+{
+  std::vector<std::string> directories;
+  Dl_info info;
+  if (dladdr(reinterpret_cast<void*>(&RunPathDirectories), &info) == 0 || !info.dli_fname) return directories;
+  void* self = dlopen(info.dli_fname, RTLD_LAZY | RTLD_NOLOAD);
+  if (!self) return directories;
+  Dl_serinfo size;
+  if (dlinfo(self, RTLD_DI_SERINFOSIZE, &size) == 0) {
+    std::vector<char> buffer(size.dls_size);
+    Dl_serinfo* paths = reinterpret_cast<Dl_serinfo*>(buffer.data());
+    if (dlinfo(self, RTLD_DI_SERINFOSIZE, paths) == 0 && dlinfo(self, RTLD_DI_SERINFO, paths) == 0)
+      for (unsigned i = 0; i < paths->dls_cnt; ++i) directories.emplace_back(paths->dls_serpath[i].dls_name);
+  }
+  dlclose(self);
+  return directories;
+}
+
 }  // namespace
 
 const VLXJBXDetail::Jvm& VLXJBXDetail::LoadJvm()
@@ -298,16 +317,22 @@ const VLXJBXDetail::Jvm& VLXJBXDetail::LoadJvm()
     auto take = [&found](void* handle, const std::string& path) {
       found.create = reinterpret_cast<decltype(found.create)>(dlsym(handle, "JNI_CreateJavaVM"));
       found.created = reinterpret_cast<decltype(found.created)>(dlsym(handle, "JNI_GetCreatedJavaVMs"));
-      if (found.create && found.created) found.path = path;
-      else found.create = nullptr, found.created = nullptr;
+      if (found.create && found.created)
+        found.path = path;
+      else
+        found.create = nullptr, found.created = nullptr;
       return found.create != nullptr;
     };
     // A JVM already in the process (a Java program that loaded the library, or a program linked
     // with libjvm) is the one to use: a second libjvm in one process cannot work.
     if (take(RTLD_DEFAULT, "the process's own libjvm")) return found;
     std::vector<std::string> candidates;
-    if (const char* home = std::getenv("JAVA_HOME"); home && *home) candidates.push_back(std::string(home) + "/lib/server/libjvm.so");
-    candidates.push_back("libjvm.so");  // through the library's run path (the JDK it was built with)
+    if (const char* home = std::getenv("JAVA_HOME"); home && *home)
+      candidates.push_back(std::string(home) + "/lib/server/libjvm.so");
+    // The directories this library's run path names (the JDK it was built with), looked up here:
+    // dlopen's own search may not start from this library (a sanitizer runtime intercepts it).
+    for (const std::string& directory : RunPathDirectories())
+      if (access((directory + "/libjvm.so").c_str(), F_OK) == 0) candidates.push_back(directory + "/libjvm.so");
     candidates.push_back("/usr/lib/jvm/default-java/lib/server/libjvm.so");
     std::string tried;
     for (const std::string& path : candidates) {
@@ -316,8 +341,9 @@ const VLXJBXDetail::Jvm& VLXJBXDetail::LoadJvm()
       const char* error = dlerror();
       tried += (tried.empty() ? "" : "; ") + path + " (" + (error ? error : "no JNI_CreateJavaVM in it") + ")";
     }
-    found.problem = "no Java virtual machine library (libjvm.so) could be loaded; set JAVA_HOME to a JDK 17. Tried: " +
-                    tried + (std::getenv("JAVA_HOME") ? "" : "; JAVA_HOME is not set");
+    found.problem =
+        "no Java virtual machine library (libjvm.so) could be loaded; set JAVA_HOME to a JDK 17. Tried: " + tried +
+        (std::getenv("JAVA_HOME") ? "" : "; JAVA_HOME is not set");
     return found;
   }();
   return jvm;
