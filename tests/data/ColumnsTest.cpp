@@ -212,6 +212,18 @@ TEST(Columns, EveryTypeCrossesBothWays)
   EXPECT_EQ(13, rows);
   EXPECT_EQ(VLX_S_OK, all.GetInteger(0, 3, second));
   EXPECT_EQ(kRows[1].integer, second);
+  // A list of instances longer than a column's first Java array (16) grows it, keeping the order.
+  VLXKDMColumns many;
+  VLXListValVLXKDMInstance forty, made;
+  for (int k = 0; k < 40; ++k) forty.Append(targets[k % 2]);
+  WriteBatch(many, 1);
+  ASSERT_EQ(VLX_S_OK, many.SetInstances(13, 0, ListOf<VLXListValVLXKDMInstance>({targets[1]})));
+  ASSERT_EQ(VLX_S_OK, many.SetInstances(13, 0, forty));
+  ASSERT_EQ(VLX_S_OK, many.CreateInstances(s.model, made));
+  VLXListValVLXKDMInstance back;
+  ASSERT_EQ(VLX_S_OK, ReadBatch(many).GetValues(made));
+  ASSERT_EQ(VLX_S_OK, many.GetInstances(13, 0, back));
+  EXPECT_TRUE(back == forty);
   // An empty batch creates nothing and reads nothing.
   VLXKDMColumns empty;
   VLXListValVLXKDMInstance nothing;
@@ -255,6 +267,17 @@ TEST(Columns, RefusalsNameTheCauseAndChangeNothing)
       {"the batch has no row 3 (it has 3)", [&] { return b.SetInteger(0, 3, 1); }},
       {"the batch has no column 14 (it has 14)", [&] { return b.SetInteger(14, 0, 1); }},
       {"not valid UTF-8 (truncated sequence)", [&] { return b.SetText(2, 0, U("ok\xC3")); }},
+      {"of element 2 of the list is not valid UTF-8",
+       [&] {
+         return b.SetTexts(9, 0, ListOf<VLXListOfVLXUnicodeString>({U("ok"), U("\xC3")}));
+       }},
+      {"the text has no bytes or a negative length", [&] { return b.SetText(2, 0, nullptr, 3); }},
+      {"the binary has no bytes or a negative length", [&] { return b.SetBinary(5, 0, nullptr, 2); }},
+      {"the type 9 is not an attribute type",
+       [&] {
+         long column = 0;
+         return b.AddColumn(U("x"), static_cast<AT::Type>(9), 0, column);
+       }},
       {"beyond the range of a Java date", [&] { return b.SetTime(3, 0, Seconds(LLONG_MAX / 100)); }},
       {"row 0 of column 0 ('integer') has no value", [&] { return b.GetInteger(0, 0, value); }},
       {"the list holds 1 instances for the batch's 3 rows",

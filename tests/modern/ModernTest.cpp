@@ -294,6 +294,29 @@ TEST(ModernColumns, BatchesWriteAndReadByType)
        std::vector<std::function<void()>>{[&] { (void)read.get<int>(i, 3); }, [&] { (void)read.get<double>(i, 2); },
                                           [&] { batch.set(i, 9, 1); }, [&] { batch.set(i, 0, 1.5); }})
     EXPECT_THROW(misuse(), Error);
+
+  // The other types, written to an instance and read back from it.
+  Columns other(1);
+  const std::size_t d = other.add_column("d", Type::floating), b = other.add_column("b", Type::boolean),
+                    y = other.add_column("y", Type::bytes), is = other.add_column("is", Type::integer, true),
+                    ds = other.add_column("ds", Type::floating, true), bs = other.add_column("bs", Type::boolean, true),
+                    ys = other.add_column("ys", Type::bytes, true), rs = other.add_column("rs", Type::reference, true);
+  other.set(d, 0, -0.0), other.set(b, 0, true), other.set(y, 0, B({0, 255})), other.set(is, 0, std::vector<int>{1, 2});
+  other.set(ds, 0, std::vector<double>{0.5}), other.set(bs, 0, std::vector<bool>{true, false});
+  other.set(ys, 0, std::vector<bytes>{B({7}), {}}), other.set(rs, 0, std::vector<Instance>{s.b, s.a});
+  other.write_to({s.a});
+  Columns back;
+  for (const char* name : {"d", "b", "y", "is", "ds", "bs", "ys", "rs"}) back.add_column(name);
+  back.read(std::vector<Instance>{s.a});
+  EXPECT_TRUE(Same(-0.0, back.get<double>(d, 0)));
+  EXPECT_TRUE(back.get<bool>(b, 0));
+  EXPECT_EQ(B({0, 255}), back.get<bytes>(y, 0));
+  EXPECT_EQ((std::vector<int>{1, 2}), back.get<std::vector<int>>(is, 0));
+  EXPECT_EQ((std::vector<double>{0.5}), back.get<std::vector<double>>(ds, 0));
+  EXPECT_EQ((std::vector<bool>{true, false}), back.get<std::vector<bool>>(bs, 0));
+  EXPECT_EQ((std::vector<bytes>{B({7}), {}}), back.get<std::vector<bytes>>(ys, 0));
+  EXPECT_EQ((std::vector<Instance>{s.b, s.a}), back.get<std::vector<Instance>>(rs, 0));
+  EXPECT_THROW(other.write_to({}), Error);
 }
 
 TEST(ModernExchange, ReplicaToJavaAndBack)
