@@ -87,7 +87,7 @@ bool RegisterModernBenchmarks(int instances, std::string& why)
     gModern = std::make_unique<ModernData>();
     gModern->count = instances;
     gModern->replica = corvexa::Replica::create("modern");
-    gModern->replica.define(corvexa::ClassSpec("Item").attribute("n", corvexa::Type::integer));
+    gModern->replica.define(corvexa::ClassDeclaration("Item").attribute("n", corvexa::Type::integer));
     gModern->model = gModern->replica.model("Item");
     for (int i = 0; i < instances; ++i) {
       gModern->modern.push_back(gModern->model.create());

@@ -35,10 +35,10 @@ try {
   std::cout << "P-2001 comes from " << hinge.get<corvexa::Instance>("supplier").get<std::string>("name") << '\n';
 
   // A class declared in C++, with a date kept to the millisecond.
-  inv.define(corvexa::ClassSpec("Delivery")
-                 .attribute(corvexa::AttributeSpec("part", corvexa::Type::reference).target("Part").mandatory())
-                 .attribute(corvexa::AttributeSpec("when", corvexa::Type::date).mandatory())
-                 .attribute(corvexa::AttributeSpec("counts", corvexa::Type::integer).multi_valued()));
+  inv.define(corvexa::ClassDeclaration("Delivery")
+                 .attribute(corvexa::AttributeDeclaration("part", corvexa::Type::reference).target("Part").mandatory())
+                 .attribute(corvexa::AttributeDeclaration("when", corvexa::Type::date).mandatory())
+                 .attribute(corvexa::AttributeDeclaration("counts", corvexa::Type::integer).multi_valued()));
   corvexa::Instance delivery = inv.model("Delivery").create();
   delivery.set("part", hinge);
   delivery.set("when", corvexa::time_point(std::chrono::milliseconds(1'700'000'000'123)));

@@ -31,15 +31,15 @@ struct Sample {
   Instance a, b;
   Sample()
   {
-    ClassSpec spec("Sample");
+    ClassDeclaration declaration("Sample");
     const std::pair<const char*, Type> types[] = {{"i", Type::integer},  {"d", Type::floating}, {"b", Type::boolean},
                                                   {"s", Type::text},     {"t", Type::date},     {"y", Type::bytes},
                                                   {"r", Type::reference}};
     for (const auto& [name, type] : types) {
-      spec.attribute(AttributeSpec(name, type).target("Sample"));
-      spec.attribute(AttributeSpec(std::string(name) + "s", type).multi_valued().target("Sample"));
+      declaration.attribute(AttributeDeclaration(name, type).target("Sample"));
+      declaration.attribute(AttributeDeclaration(std::string(name) + "s", type).multi_valued().target("Sample"));
     }
-    replica.define(spec);
+    replica.define(declaration);
     model = replica.model("Sample");
     a = model.create();
     b = model.create();
@@ -156,7 +156,7 @@ TEST(ModernValues, MisusesThrowNamingWhat)
       {"corvexa::Replica::name", [&] { (void)Replica().name(); }},
       {"corvexa::Model::create", [&] { (void)Model().create(); }},
       {"the type 9 is not a corvexa::Type",
-       [&] { s.replica.define(ClassSpec("Odd").attribute("x", static_cast<Type>(9))); }},
+       [&] { s.replica.define(ClassDeclaration("Odd").attribute("x", static_cast<Type>(9))); }},
   };
   for (const auto& [fragment, misuse] : cases) {
     SCOPED_TRACE(fragment);
@@ -177,7 +177,7 @@ TEST(ModernIteration, EmptyAndLargeSetsInOrder)
 {
   Sample s;
   Replica r = Replica::create();
-  r.define(ClassSpec("Empty").attribute("n", Type::integer));
+  r.define(ClassDeclaration("Empty").attribute("n", Type::integer));
   std::size_t seen = 0;
   for (Instance in : r.model("Empty").instances()) seen += bool(in);
   EXPECT_EQ(0u, seen);
@@ -195,13 +195,15 @@ TEST(ModernIteration, EmptyAndLargeSetsInOrder)
 TEST(ModernSchema, DeclaredClassesAndLayouts)
 {
   Replica r = Replica::create("shop");
-  r.define(ClassSpec("Supplier").attribute(AttributeSpec("name", Type::text).mandatory().unique().length(40)));
-  r.define(ClassSpec("Part")
+  r.define(
+      ClassDeclaration("Supplier").attribute(AttributeDeclaration("name", Type::text).mandatory().unique().length(40)));
+  r.define(ClassDeclaration("Part")
                .abstract()
                .comment("stock")
                .attribute("number", Type::text)
-               .attribute(AttributeSpec("supplier", Type::reference).target("Supplier")));
-  r.define(ClassSpec("Bolt").extends("Part").attribute(AttributeSpec("lengths", Type::integer).multi_valued()));
+               .attribute(AttributeDeclaration("supplier", Type::reference).target("Supplier")));
+  r.define(ClassDeclaration("Bolt").extends("Part").attribute(
+      AttributeDeclaration("lengths", Type::integer).multi_valued()));
   std::vector<std::string> layouts;
   for (const ClassDef& c : r.classes()) {
     std::string line = c.name() + ":";

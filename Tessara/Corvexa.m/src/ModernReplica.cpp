@@ -513,19 +513,19 @@ ModelHandle Replica::model(std::string_view class_name) const
   return ModelHandle(model);
 }
 
-ClassHandle Replica::define(const ClassSpec& spec)
+ClassHandle Replica::define(const ClassDeclaration& declaration)
 {
   const char* const operation = "corvexa::Replica::define";
-  const std::string_view name = spec.name();
+  const std::string_view name = declaration.name();
   VLXKDMClassDef cls;
   Check(cls.Build(Text(name)), operation, name);
-  if (!spec.super_name().empty()) Check(cls.SetSuperName(Text(spec.super_name())), operation, name);
-  if (spec.is_abstract()) Check(cls.SetAbstract(1), operation, name);
-  if (!spec.comment_text().empty()) Check(cls.SetQKAComment(Text(spec.comment_text())), operation, name);
+  if (!declaration.super_name().empty()) Check(cls.SetSuperName(Text(declaration.super_name())), operation, name);
+  if (declaration.is_abstract()) Check(cls.SetAbstract(1), operation, name);
+  if (!declaration.comment_text().empty()) Check(cls.SetQKAComment(Text(declaration.comment_text())), operation, name);
   VLXKDMAttributeDefList list;
   Check(cls.GetAttributes(list), operation, name);
-  for (const AttributeSpec& a : spec.attributes()) {
-    const std::string named = spec.name() + "." + a.name();
+  for (const AttributeDeclaration& a : declaration.attributes()) {
+    const std::string named = declaration.name() + "." + a.name();
     if (a.type() < Type::integer || a.type() > Type::reference)
       Refuse(operation, named, "the type " + std::to_string(static_cast<int>(a.type())) + " is not a corvexa::Type");
     VLXKDMAttributeDef def;

@@ -343,7 +343,7 @@ class CORVEXA_API Replica {
   // The class named name; throws when there is none.
   [[nodiscard]] ClassDef class_def(std::string_view name) const;
   // Adds a class (with an empty model) as declared; answers it.
-  ClassDef define(const ClassSpec& spec);
+  ClassDef define(const ClassDeclaration& declaration);
   [[nodiscard]] std::vector<Model> models() const;
   // The model of the class named class_name; throws when there is none.
   [[nodiscard]] Model model(std::string_view class_name) const;

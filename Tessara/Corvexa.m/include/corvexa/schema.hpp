@@ -1,9 +1,10 @@
 // Schema building in the modern interface: a class declared with its attributes.
 //
-//   replica.define(corvexa::ClassSpec("Part")
-//                      .attribute(corvexa::AttributeSpec("number",
-//                      corvexa::Type::text).mandatory().unique().length(12)) .attribute(corvexa::AttributeSpec("tags",
-//                      corvexa::Type::text).multi_valued()) .attribute(corvexa::AttributeSpec("supplier",
+//   replica.define(corvexa::ClassDeclaration("Part")
+//                      .attribute(corvexa::AttributeDeclaration("number",
+//                      corvexa::Type::text).mandatory().unique().length(12))
+//                      .attribute(corvexa::AttributeDeclaration("tags", corvexa::Type::text).multi_valued())
+//                      .attribute(corvexa::AttributeDeclaration("supplier",
 //                      corvexa::Type::reference).target("Supplier")));
 #pragma once
 
@@ -18,19 +19,19 @@ namespace corvexa {
 enum class Type { integer, floating, text, date, boolean, bytes, reference };
 
 // An attribute as declared.
-class AttributeSpec {
+class AttributeDeclaration {
  public:
-  AttributeSpec(std::string_view name, Type type) : _name(name), _type(type) {}
+  AttributeDeclaration(std::string_view name, Type type) : _name(name), _type(type) {}
 
   // Many values (a std::vector in get/set) rather than one.
-  AttributeSpec& multi_valued(bool on = true) { return _multi = on, *this; }
-  AttributeSpec& mandatory(bool on = true) { return _mandatory = on, *this; }
-  AttributeSpec& unique(bool on = true) { return _unique = on, *this; }
+  AttributeDeclaration& multi_valued(bool on = true) { return _multi = on, *this; }
+  AttributeDeclaration& mandatory(bool on = true) { return _mandatory = on, *this; }
+  AttributeDeclaration& unique(bool on = true) { return _unique = on, *this; }
   // The maximal length of a text (characters) or bytes value; 0: unlimited.
-  AttributeSpec& length(int maximum) { return _length = maximum, *this; }
+  AttributeDeclaration& length(int maximum) { return _length = maximum, *this; }
   // A class a reference may point to (repeat for several).
-  AttributeSpec& target(std::string_view class_name) { return _targets.emplace_back(class_name), *this; }
-  AttributeSpec& comment(std::string_view text) { return _comment = text, *this; }
+  AttributeDeclaration& target(std::string_view class_name) { return _targets.emplace_back(class_name), *this; }
+  AttributeDeclaration& comment(std::string_view text) { return _comment = text, *this; }
 
   const std::string& name() const { return _name; }
   Type type() const { return _type; }
@@ -53,28 +54,31 @@ class AttributeSpec {
 };
 
 // A class as declared: its name, the class it extends, and its own attributes in order.
-class ClassSpec {
+class ClassDeclaration {
  public:
-  explicit ClassSpec(std::string_view name) : _name(name) {}
+  explicit ClassDeclaration(std::string_view name) : _name(name) {}
 
-  ClassSpec& extends(std::string_view super_name) { return _super = super_name, *this; }
-  ClassSpec& abstract(bool on = true) { return _abstract = on, *this; }
-  ClassSpec& comment(std::string_view text) { return _comment = text, *this; }
-  ClassSpec& attribute(AttributeSpec spec) { return _attributes.push_back(std::move(spec)), *this; }
-  ClassSpec& attribute(std::string_view name, Type type) { return attribute(AttributeSpec(name, type)); }
+  ClassDeclaration& extends(std::string_view super_name) { return _super = super_name, *this; }
+  ClassDeclaration& abstract(bool on = true) { return _abstract = on, *this; }
+  ClassDeclaration& comment(std::string_view text) { return _comment = text, *this; }
+  ClassDeclaration& attribute(AttributeDeclaration declaration)
+  {
+    return _attributes.push_back(std::move(declaration)), *this;
+  }
+  ClassDeclaration& attribute(std::string_view name, Type type) { return attribute(AttributeDeclaration(name, type)); }
 
   const std::string& name() const { return _name; }
   const std::string& super_name() const { return _super; }
   bool is_abstract() const { return _abstract; }
   const std::string& comment_text() const { return _comment; }
-  const std::vector<AttributeSpec>& attributes() const { return _attributes; }
+  const std::vector<AttributeDeclaration>& attributes() const { return _attributes; }
 
  private:
   std::string _name;
   std::string _super;
   bool _abstract = false;
   std::string _comment;
-  std::vector<AttributeSpec> _attributes;
+  std::vector<AttributeDeclaration> _attributes;
 };
 
 }  // namespace corvexa
