@@ -21,6 +21,11 @@ namespace corvexa_tool {
 
 void Fail(int code, const std::string& message) { throw Failure{code, message}; }
 
+std::string Text(const VLXUnicodeString& s)
+{
+  return std::string(s.c_str(), static_cast<std::size_t>(s.GetLengthInByte()));
+}
+
 std::string LastError()
 {
   VLXError* e = VLXError::VLXGetLastError(0, nullptr);
@@ -160,16 +165,15 @@ const char* TypeName(int type)
 
 namespace {
 
-std::string Text(const VLXUnicodeString& s)
-{
-  return std::string(s.c_str(), static_cast<std::size_t>(s.GetLengthInByte()));
-}
+// Each call of the schema's readers in turn: the first that fails ends the tool with its own error.
+void Schema(long rc) { Check(rc, kOther, "reading the schema"); }
 
 std::vector<Attribute> OwnAttributes(VLXKDMClassDef& c)
 {
   VLXKDMAttributeDefList list;
   int count = 0;
-  Check(c.GetAttributes(list) | list.GetCount(count), kOther, "reading the schema");
+  Schema(c.GetAttributes(list));
+  Schema(list.GetCount(count));
   std::vector<Attribute> out;
   for (int p = 0; p < count; ++p) {
     VLXKDMAttributeDef a;
@@ -178,9 +182,13 @@ std::vector<Attribute> OwnAttributes(VLXKDMClassDef& c)
     VLXKDMAggregationType::Type aggregation = VLXKDMAggregationType::Shared;
     VLXBoolean multi = 0, mandatory = 0;
     VLXListOfVLXUnicodeString targets;
-    Check(list.GetItem(p, a) | a.GetAttributeName(name) | a.GetAttributeType(type) | a.IsMultiValuated(multi) |
-              a.IsMandatory(mandatory) | a.GetAggregationType(aggregation) | a.GetTargetNames(targets),
-          kOther, "reading the schema");
+    Schema(list.GetItem(p, a));
+    Schema(a.GetAttributeName(name));
+    Schema(a.GetAttributeType(type));
+    Schema(a.IsMultiValuated(multi));
+    Schema(a.IsMandatory(mandatory));
+    Schema(a.GetAggregationType(aggregation));
+    Schema(a.GetTargetNames(targets));
     Attribute attribute{Text(name), type, multi != 0, mandatory != 0, aggregation == VLXKDMAggregationType::Composition,
                         {}};
     for (int t = 1; t <= targets.Size(); ++t) attribute.targets.push_back(Text(targets[t]));
@@ -195,7 +203,8 @@ std::vector<ClassInfo> Classes(VLXKDMReplica& replica)
 {
   VLXKDMModelSet models;
   int count = 0;
-  Check(replica.GetModels(models) | models.GetCount(count), kOther, "reading the schema");
+  Schema(replica.GetModels(models));
+  Schema(models.GetCount(count));
   std::vector<ClassInfo> classes;
   for (int p = 0; p < count; ++p) {
     VLXKDMModel model;
@@ -203,9 +212,12 @@ std::vector<ClassInfo> Classes(VLXKDMReplica& replica)
     VLXKDMInstanceSet set;
     VLXUnicodeString name, superName;
     int instances = 0;
-    Check(models.GetItem(p, model) | model.GetClassDef(c) | c.GetClassName(name) | c.GetSuperName(superName) |
-              model.GetInstances(set) | set.GetCount(instances),
-          kOther, "reading the schema");
+    Schema(models.GetItem(p, model));
+    Schema(model.GetClassDef(c));
+    Schema(c.GetClassName(name));
+    Schema(c.GetSuperName(superName));
+    Schema(model.GetInstances(set));
+    Schema(set.GetCount(instances));
     classes.push_back(ClassInfo{Text(name), Text(superName), OwnAttributes(c), {}, instances});
   }
   for (ClassInfo& c : classes) {  // inherited attributes first, the root's first; chains are bounded

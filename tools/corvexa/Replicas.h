@@ -19,6 +19,8 @@ struct Failure {
   std::string message;
 };
 [[noreturn]] void Fail(int code, const std::string& message);
+// A text's UTF-8 bytes as a string.
+std::string Text(const VLXUnicodeString& s);
 // The thread's last error, as one line (empty when there is none).
 std::string LastError();
 // Fails with code and "what: the last error" when rc is a failure.

@@ -29,11 +29,6 @@ using namespace corvexa_tool;
 
 namespace {
 
-std::string Text(const VLXUnicodeString& s)
-{
-  return std::string(s.c_str(), static_cast<std::size_t>(s.GetLengthInByte()));
-}
-
 // ---- info --------------------------------------------------------------------------------------
 
 void Info(const std::vector<std::string>& files)
@@ -43,8 +38,8 @@ void Info(const std::vector<std::string>& files)
     struct stat st {};
     stat(file.c_str(), &st);
     VLXKDMReplica replica = Read(file, form);
-    VLXUnicodeString name, summary;
-    Check(replica.GetName(name) | replica.ToString(summary), kOther, file);
+    VLXUnicodeString summary;
+    Check(replica.ToString(summary), kOther, file);
     std::printf("%s: %s, %lld bytes\n  %s\n", file.c_str(), FormName(form), static_cast<long long>(st.st_size),
                 Text(summary).c_str());
     for (const ClassInfo& c : Classes(replica)) {
